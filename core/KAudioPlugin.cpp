@@ -1,0 +1,3 @@
+#include "core/KAudioPlugin.h"
+
+KAudioPlugin::~KAudioPlugin() = default;

@@ -1,0 +1,15 @@
+#pragma once
+
+// Marks the few symbols that leave the kernel library. Everything else is built with hidden
+// visibility, so a host sees only the entry points.
+#if defined(_WIN32)
+#  if defined(TORVANE_BUILDING_KERNEL)
+#    define TORVANE_API __declspec(dllexport)
+#  elif defined(TORVANE_STATIC)
+#    define TORVANE_API
+#  else
+#    define TORVANE_API __declspec(dllimport)
+#  endif
+#else
+#  define TORVANE_API __attribute__((visibility("default")))
+#endif

@@ -1,0 +1,13 @@
+#include "kernel/KGuard.h"
+
+#include "kernel/KFormat.h"
+#include "kernel/KTrace.h"
+
+void KReportSystemException(const KString& operation) noexcept {
+  try {
+    KTrace(KFormatText("SYSTEM EXCEPTION! {0}", operation));
+  } catch (...) {
+    // Formatting failed for want of memory; the operation name alone still says where.
+    KTrace(operation);
+  }
+}

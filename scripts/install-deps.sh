@@ -1,0 +1,10 @@
+#!/usr/bin/env bash
+# Installs every package the build, the tests and the benchmarks need (Debian 12).
+set -euo pipefail
+SUDO=""
+[ "$(id -u)" -eq 0 ] || SUDO="sudo"
+export DEBIAN_FRONTEND=noninteractive
+$SUDO apt-get update -q
+$SUDO apt-get install -y -q --no-install-recommends \
+  ca-certificates g++ cmake ninja-build pkg-config \
+  libgtest-dev libgmock-dev libbenchmark-dev

@@ -9,17 +9,17 @@
 
 namespace {
 // Both entries start here: the name's module, then the registries.
-KModule* PrepareModule(const KString& name) {
+KModule* PrepareModule(KRegistries& registries, const KString& name) {
   KModule* module = KModuleMap::Instance().Acquire(name);
-  KRegistries::Instance().EnsureBuilt();
+  registries.EnsureBuilt();
   return module;
 }
 }  // namespace
 
-KAudioPlugin* CreateTorvanePlugin(KString name) {
+KAudioPlugin* KCreatePlugin(KRegistries& registries, const KString& name) noexcept {
   try {
-    KModule* module = PrepareModule(name);
-    return KRegistries::Instance().Main().Create(name, module);
+    KModule* module = PrepareModule(registries, name);
+    return registries.Main().Create(name, module);
   } catch (const KException& failure) {
     try {
       KShowUserMessage(KFormatText("Could not create plugin {0}.\n\nError: {1}", name, failure.Message()));
@@ -32,10 +32,19 @@ KAudioPlugin* CreateTorvanePlugin(KString name) {
   return nullptr;
 }
 
+KAudioPlugin* CreateTorvanePlugin(KString name) {
+  try {
+    return KCreatePlugin(KRegistries::Instance(), name);
+  } catch (...) {
+    return nullptr;  // the product's registries could not even be allocated
+  }
+}
+
 const KStringList& GetTorvanePluginList() {
   try {
-    PrepareModule({});
-    return KRegistries::Instance().Main().Keys();
+    KRegistries& registries = KRegistries::Instance();
+    PrepareModule(registries, {});
+    return registries.Main().Keys();
   } catch (...) {
     static const KStringList empty;
     return empty;

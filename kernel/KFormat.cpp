@@ -1,5 +1,6 @@
 #include "kernel/KFormat.h"
 
+#include <algorithm>
 #include <charconv>
 #include <cmath>
 
@@ -85,9 +86,12 @@ KFormat::KFormat(const KString& pattern) {
         i += 2;
         continue;
       }
-      if (c != '{') {
-        staging.Put(c);
-        ++i;
+      if (c != '{') {  // a run of plain text goes over in one piece
+        int32_t end = i + 1;
+        while (end < length && at(end) != '{' && at(end) != '}') ++end;
+        staging.Flush();
+        literal_.AppendPart(pattern, i, end - i);
+        i = end;
         continue;
       }
       if (at(i + 1) == '{') {
@@ -136,19 +140,15 @@ KFormat& KFormat::Arg(const KString& text) {
   return *this;
 }
 
-// Pads an unsigned rendering (digits only) with the sign and fill of the current slot.
-KFormat& KFormat::Place(const char* text, int32_t length, bool negative) {
+// Pads a rendering that carries no sign with the sign and fill of the current slot. The
+// caller says whether the value is negative or positive; a value shown as zero is neither.
+KFormat& KFormat::Place(const char* text, int32_t length, bool negative, bool positive) {
   if (current_ >= kMaxSlots) {
     ++current_;
     return *this;
   }
   const Slot& slot = slots_[current_];
-  const bool zero = [&] {
-    for (int32_t i = 0; i < length; ++i)
-      if (text[i] >= '1' && text[i] <= '9') return false;
-    return true;
-  }();
-  const char sign = negative && !zero ? '-' : ((slot.flags & kPlusSign) && !zero && !negative ? '+' : 0);
+  const char sign = negative ? '-' : (positive && (slot.flags & kPlusSign) ? '+' : 0);
   const int32_t used = length + (sign ? 1 : 0);
   const int32_t width = slot.width < 0 ? -slot.width : slot.width;
   const int32_t pad = width > used ? width - used : 0;
@@ -169,29 +169,27 @@ KFormat& KFormat::Place(const char* text, int32_t length, bool negative) {
 }
 
 KFormat& KFormat::ArgSigned(int64_t value) {
-  const bool hexadecimal = current_ < kMaxSlots && (slots_[current_].flags & kHexadecimal);
   const uint64_t magnitude = value < 0 ? 0 - static_cast<uint64_t>(value) : static_cast<uint64_t>(value);
   char buffer[24];
   char* end = buffer + sizeof(buffer);
-  char* begin = WriteDigits(magnitude, hexadecimal, end);
-  return Place(begin, static_cast<int32_t>(end - begin), value < 0);
+  char* begin = WriteDigits(magnitude, CurrentFlags() & kHexadecimal, end);
+  return Place(begin, static_cast<int32_t>(end - begin), value < 0, value > 0);
 }
 
 KFormat& KFormat::ArgUnsigned(uint64_t value) {
-  const bool hexadecimal = current_ < kMaxSlots && (slots_[current_].flags & kHexadecimal);
   char buffer[24];
   char* end = buffer + sizeof(buffer);
-  char* begin = WriteDigits(value, hexadecimal, end);
-  return Place(begin, static_cast<int32_t>(end - begin), false);
+  char* begin = WriteDigits(value, CurrentFlags() & kHexadecimal, end);
+  return Place(begin, static_cast<int32_t>(end - begin), false, value != 0);
 }
 
 KFormat& KFormat::ArgFloat(double value) {
-  if (std::isnan(value)) return Place("nan", 3, false);
+  if (std::isnan(value)) return Place("nan", 3, false, false);
   const bool negative = std::signbit(value);
   const double magnitude = std::fabs(value);
-  if (std::isinf(magnitude)) return Place("inf", 3, negative);
+  if (std::isinf(magnitude)) return Place("inf", 3, negative, !negative);
   const int precision = current_ < kMaxSlots ? slots_[current_].precision : -1;
-  char buffer[400];  // the longest fixed rendering of a double is 309 digits and 99 decimals
+  char buffer[309 + 1 + 99];  // the longest fixed rendering: DBL_MAX's 309 digits, a point, 99 decimals
   const auto result =
       std::to_chars(buffer, buffer + sizeof(buffer), magnitude, std::chars_format::fixed, precision < 0 ? 6 : precision);
   char* end = result.ptr;
@@ -199,7 +197,8 @@ KFormat& KFormat::ArgFloat(double value) {
     while (end[-1] == '0') --end;
     if (end[-1] == '.') --end;
   }
-  return Place(buffer, static_cast<int32_t>(end - buffer), negative);
+  const bool shownAsZero = std::all_of(buffer, end, [](char c) { return c == '0' || c == '.'; });
+  return Place(buffer, static_cast<int32_t>(end - buffer), negative && !shownAsZero, !negative && !shownAsZero);
 }
 
 KString KFormat::Text() const {

@@ -20,7 +20,7 @@
 // removed (0.5 -> "0.5", 2.0 -> "2", 1/3 -> "0.333333"): enough for any value shown to a user
 // and free of binary noise such as 0.30000000000000004. Values are correctly rounded from
 // their exact binary value (exact ties to even, as printf does), and a result that rounds to
-// zero is written without a minus sign.
+// zero is written without a sign.
 class KFormat {
 public:
   static constexpr int kMaxSlots = 32;
@@ -62,7 +62,8 @@ private:
   TORVANE_API KFormat& ArgSigned(int64_t value);
   TORVANE_API KFormat& ArgUnsigned(uint64_t value);
   TORVANE_API KFormat& ArgFloat(double value);
-  KFormat& Place(const char* text, int32_t length, bool negative);
+  uint8_t CurrentFlags() const noexcept { return current_ < kMaxSlots ? slots_[current_].flags : 0; }
+  KFormat& Place(const char* text, int32_t length, bool negative, bool positive);
   void Store(KString rendering);
 
   KString literal_;

@@ -44,27 +44,31 @@ public:
 
   // Inserts at the key's sorted place; answers false, changing nothing, when the key exists.
   bool Insert(const KString& key, const V& value) {
-    if (count_ + 1 > 2 * buckets_.Count()) Rehash(2 * buckets_.Count());
-    KArray<KHashEntry<V>>& bucket = BucketOf(key);
+    const uint32_t hash = KJenkinsHash(key);
     bool found = false;
-    const int32_t at = Search(bucket, key, found);
+    int32_t at = Search(BucketAt(hash), key, found);
     if (found) return false;
-    bucket.Insert(at, KHashEntry<V>{key, value});
+    // Grow only for a key that is really added, so a refused duplicate leaves the index as it was.
+    if (count_ + 1 > 2 * buckets_.Count()) {
+      Rehash(2 * buckets_.Count());
+      at = Search(BucketAt(hash), key, found);
+    }
+    BucketAt(hash).Insert(at, KHashEntry<V>{key, value});
     ++count_;
     return true;
   }
 
   // The value stored under `key`, or null.
   const V* Find(const KString& key) const noexcept {
-    const KArray<KHashEntry<V>>& bucket = const_cast<KStringHashIndex*>(this)->BucketOf(key);
+    const KArray<KHashEntry<V>>& bucket = const_cast<KStringHashIndex*>(this)->BucketAt(KJenkinsHash(key));
     bool found = false;
     const int32_t at = Search(bucket, key, found);
     return found ? &bucket[at].value : nullptr;
   }
 
 private:
-  KArray<KHashEntry<V>>& BucketOf(const KString& key) noexcept {
-    return buckets_[static_cast<int32_t>(KJenkinsHash(key) & static_cast<uint32_t>(buckets_.Count() - 1))];
+  KArray<KHashEntry<V>>& BucketAt(uint32_t hash) noexcept {
+    return buckets_[static_cast<int32_t>(hash & static_cast<uint32_t>(buckets_.Count() - 1))];
   }
 
   // Bisection: the index of `key`, or the place where it would be inserted.

@@ -15,10 +15,12 @@ KModule* KModuleMap::Acquire(const KString& name) {
   std::lock_guard<std::mutex> lock(mutex_);
   if (KModule* const* found = modules_.Find(name)) return *found;
   auto module = std::make_unique<KModule>(name);
-  owned_.Reserve(owned_.Count() + 1);  // no failure after the index holds the pointer
-  modules_.Insert(name, module.get());
   owned_.Append(module.get());
-  return module.release();
+  // owned_ deletes the module from here on, so a failure to index it cannot leave a dangling
+  // pointer in the index.
+  KModule* made = module.release();
+  modules_.Insert(name, made);
+  return made;
 }
 
 KModule* KModuleMap::Find(const KString& name) const {

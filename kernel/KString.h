@@ -145,12 +145,11 @@ public:
   bool IsEmpty() const noexcept { return length_ == 0; }
   Storage GetStorage() const noexcept { return static_cast<Storage>(storage_); }
 
+  // Reads through Wide() rather than the inline array itself, so that a constant index beyond
+  // N (valid for a heap text) does not trip the compiler's array bounds check.
   char16_t CharAt(int32_t index) const noexcept {
-    switch (storage_) {
-      case kLiteral: return static_cast<unsigned char>(literal_[index]);
-      case kInline: return inline_[index];
-      default: return heap_[index];
-    }
+    if (storage_ == kLiteral) return static_cast<unsigned char>(literal_[index]);
+    return Wide()[index];
   }
 
   // Calls f(units, length) with either `const char*` (literal) or `const char16_t*` units, so
@@ -163,6 +162,17 @@ public:
 
   // Makes the string writable with room for `capacity` characters (copy on write).
   void Reserve(int32_t capacity) {
+    if (!HasRoom(capacity)) Grow(capacity);
+  }
+
+  // True when the string may be written in place up to `capacity` characters.
+  bool HasRoom(int32_t capacity) const noexcept {
+    if (storage_ == kInline) return capacity < N;
+    return storage_ == kHeap && KStringHeap::Count(heap_) < 2 && KStringHeap::Size(heap_) >= KStringHeap::BlockSize(capacity);
+  }
+
+private:
+  void Grow(int32_t capacity) {
     switch (storage_) {
       case kInline:
         if (capacity >= N) {
@@ -208,6 +218,7 @@ public:
     }
   }
 
+public:
   KStringT& Append(const KStringT& text) { return AppendUnits(text); }
   template <int M>
   KStringT& Append(const KStringT<M>& text) {

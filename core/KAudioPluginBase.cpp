@@ -1,0 +1,220 @@
+#include "core/KAudioPluginBase.h"
+
+#include <cmath>
+#include <limits>
+
+#include "core/KParameter.h"
+
+namespace {
+constexpr double kNoValue = std::numeric_limits<double>::quiet_NaN();
+
+// Value of a ramp at the current position (time 0 of the current sub-block).
+double RampValue(const ParameterRamp& ramp) noexcept {
+  const ParameterRamp::Point& p0 = ramp.points[0];
+  const ParameterRamp::Point& p1 = ramp.points[1];
+  if (p0.time > 0) return p0.value;  // the segment has not begun
+  const double length = static_cast<double>(p1.time) - static_cast<double>(p0.time);
+  if (length <= 0.0) return p1.value;
+  const double elapsed = p1.time < 0 ? length : -static_cast<double>(p0.time);
+  return p0.value + (p1.value - p0.value) * elapsed / length;
+}
+
+void Fill(ParameterRamp& ramp, int32_t parameter, std::span<const ParameterRamp::Point> points, bool fine) noexcept {
+  ramp.parameter = parameter;
+  for (size_t i = 0; i < points.size(); ++i) ramp.points[i] = points[i];
+  ramp.pointCount = static_cast<int8_t>(points.size());
+  ramp.fine = fine ? 1 : 0;
+}
+}  // namespace
+
+KAudioPluginBase::KAudioPluginBase(std::span<const KParameterInfo> table)
+    : records_(new ParameterRamp[kAudioRampCapacity + kPostedRampCapacity]),
+      overflowValues_(new std::atomic<double>[table.size()]) {
+  parameters_.Reserve(static_cast<int32_t>(table.size()));
+  for (size_t i = 0; i < table.size(); ++i) {
+    parameters_.Append(new Parameter(*this, static_cast<int32_t>(i), table[i]));
+    overflowValues_[i].store(kNoValue, std::memory_order_relaxed);
+  }
+  for (int32_t i = 0; i < kAudioRampCapacity; ++i) spare_.PushBack(&records_[i]);
+  for (int32_t i = kAudioRampCapacity; i < kAudioRampCapacity + kPostedRampCapacity; ++i) {
+    records_[i].posted = 1;
+    postedFree_.PushBack(&records_[i]);
+  }
+}
+
+KAudioPluginBase::~KAudioPluginBase() {
+  for (Parameter* parameter : parameters_) delete parameter;
+}
+
+KAudioPluginBase::Parameter* KAudioPluginBase::FindParameter(const KString& key) noexcept {
+  for (Parameter* parameter : parameters_)
+    if (parameter->Key() == key) return parameter;
+  return nullptr;
+}
+
+void KAudioPluginBase::Apply(int32_t parameter, double normalized) noexcept {
+  parameters_[parameter]->SetNormalized(normalized > 1.0 ? 1.0 : (normalized < 0.0 ? 0.0 : normalized));
+}
+void KAudioPluginBase::ApplyCurrent(ParameterRamp& ramp) noexcept { Apply(ramp.parameter, RampValue(ramp)); }
+void KAudioPluginBase::ApplyLast(ParameterRamp& ramp) noexcept {
+  Apply(ramp.parameter, ramp.points[ramp.pointCount - 1].value);
+}
+
+int32_t KAudioPluginBase::NextBreak(const ParameterRamp& ramp) noexcept {
+  return ramp.points[0].time > 0 ? ramp.points[0].time : ramp.points[1].time;
+}
+
+void KAudioPluginBase::Retire(ParameterRamp* ramp) noexcept {
+  active_.Remove(ramp);
+  (ramp->posted ? postedReturns_ : spare_).PushBack(ramp);
+}
+
+void KAudioPluginBase::RetireRampsOf(int32_t parameter) noexcept {
+  for (ParameterRamp* ramp = active_.Head(); ramp;) {
+    ParameterRamp* next = ramp->next;
+    if (ramp->parameter == parameter) Retire(ramp);
+    ramp = next;
+  }
+}
+
+bool KAudioPluginBase::AddRamp(int32_t parameter, std::span<const RampPoint> points, bool fine) noexcept {
+  if (parameter < 0 || parameter >= ParameterCount() || points.empty()) return false;
+  ParameterRamp* ramp = points.size() >= 2 && points.size() <= ParameterRamp::kMaxPoints ? spare_.PopFront() : nullptr;
+  RetireRampsOf(parameter);
+  if (!ramp) {
+    Apply(parameter, points.back().value);
+    return false;
+  }
+  Fill(*ramp, parameter, points, fine);
+  active_.PushBack(ramp);
+  rampsAdded_ = true;
+  return true;
+}
+
+void KAudioPluginBase::ResolveBlockEnd(int32_t blockLength) noexcept {
+  if (!rampsAdded_) return;
+  for (ParameterRamp* ramp = active_.Head(); ramp; ramp = ramp->next)
+    if (ramp->points[1].time == ParameterRamp::kBlockEnd) ramp->points[1].time = blockLength;
+}
+
+int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept {
+  int32_t limit = blockLength < subBlockCap ? blockLength : subBlockCap;
+  const bool jump = (stateFlags_.load(std::memory_order_acquire) & kJump) != 0;
+  if (!jump && !active_.IsEmpty()) {
+    ResolveBlockEnd(blockLength);
+    rampsAdded_ = false;
+    bool anyFine = false;
+    for (ParameterRamp* ramp = active_.Head(); ramp; ramp = ramp->next) {
+      const int32_t next = NextBreak(*ramp);
+      if (next < limit) limit = next;
+      anyFine |= ramp->fine != 0;
+    }
+    if (anyFine) {
+      subBlockCap = fineCap;
+      if (fineCap < limit) limit = fineCap;
+    }
+    for (ParameterRamp* ramp = active_.Head(); ramp; ramp = ramp->next) ApplyCurrent(*ramp);
+    remaining_ = limit < blockLength ? blockLength : 0;
+    return limit;
+  }
+  // Values must land at once: every ramp jumps to its end and retires. Both pools belong to
+  // the audio thread, so this needs no lock.
+  stateFlags_.fetch_and(~kJump, std::memory_order_acq_rel);
+  while (ParameterRamp* ramp = active_.Head()) {
+    ApplyLast(*ramp);
+    Retire(ramp);
+  }
+  remaining_ = 0;
+  rampsAdded_ = false;
+  return limit;
+}
+
+int32_t KAudioPluginBase::InterpolationProcess(int32_t processedLength, int32_t remainingLength) noexcept {
+  int32_t limit = remainingLength;
+  for (ParameterRamp* ramp = active_.Head(); ramp;) {
+    ParameterRamp* next = ramp->next;
+    for (int32_t i = 0; i < ramp->pointCount; ++i) ramp->points[i].time -= processedLength;
+    ApplyCurrent(*ramp);
+    bool retired = false;
+    bool passedCorner = false;
+    while (ramp->points[1].time < 1) {
+      if (ramp->pointCount < 3) {
+        ApplyCurrent(*ramp);
+        Retire(ramp);
+        retired = true;
+        break;
+      }
+      for (int32_t i = 1; i < ramp->pointCount; ++i) ramp->points[i - 1] = ramp->points[i];
+      --ramp->pointCount;
+      passedCorner = true;
+    }
+    if (!retired) {
+      // A corner passed inside the sub-block: the value now lies on the next segment.
+      if (passedCorner) ApplyCurrent(*ramp);
+      const int32_t breakPoint = NextBreak(*ramp);
+      if (breakPoint < limit) limit = breakPoint;
+    }
+    ramp = next;
+  }
+  remaining_ -= processedLength;
+  return limit;
+}
+
+void KAudioPluginBase::InterpolationFinish() noexcept {
+  for (ParameterRamp* ramp = active_.Head(); ramp;) {
+    ParameterRamp* next = ramp->next;
+    ApplyCurrent(*ramp);
+    if (ramp->pointCount < 3 && ramp->points[1].time < 1) Retire(ramp);
+    ramp = next;
+  }
+  remaining_ = 0;
+}
+
+void KAudioPluginBase::ApplyOverflowValues() noexcept {
+  for (int32_t p = 0; p < ParameterCount(); ++p) {
+    const double value = overflowValues_[p].exchange(kNoValue, std::memory_order_acq_rel);
+    if (std::isnan(value)) continue;
+    RetireRampsOf(p);
+    Apply(p, value);
+  }
+}
+
+void KAudioPluginBase::AcceptPostedRamps() noexcept {
+  if (overflowPending_.exchange(false, std::memory_order_acq_rel)) ApplyOverflowValues();
+  if (!rampMutex_.try_lock()) return;
+  postedFree_.Splice(postedReturns_);
+  while (ParameterRamp* ramp = posted_.PopFront()) {
+    RetireRampsOf(ramp->parameter);
+    active_.PushBack(ramp);
+    rampsAdded_ = true;
+  }
+  rampMutex_.unlock();
+}
+
+void KAudioPluginBase::PostRamp(int32_t parameter, std::span<const RampPoint> points, bool fine) {
+  if (parameter < 0 || parameter >= ParameterCount() || points.empty()) return;
+  if (points.size() < 2 || points.size() > ParameterRamp::kMaxPoints) {
+    PostValue(parameter, points.back().value, 1);
+    return;
+  }
+  std::lock_guard<std::mutex> lock(rampMutex_);
+  for (ParameterRamp* ramp = posted_.Head(); ramp; ramp = ramp->next) {
+    if (ramp->parameter == parameter) {  // not taken yet: the newer ramp replaces it
+      Fill(*ramp, parameter, points, fine);
+      return;
+    }
+  }
+  if (ParameterRamp* ramp = postedFree_.PopFront()) {
+    Fill(*ramp, parameter, points, fine);
+    posted_.PushBack(ramp);
+    return;
+  }
+  overflowValues_[parameter].store(points.back().value, std::memory_order_release);
+  overflowPending_.store(true, std::memory_order_release);
+}
+
+void KAudioPluginBase::PostValue(int32_t parameter, double normalized, int32_t glideSamples) {
+  if (parameter < 0 || parameter >= ParameterCount()) return;
+  const RampPoint points[2] = {{0, parameters_[parameter]->Normalized()}, {glideSamples > 1 ? glideSamples : 1, normalized}};
+  PostRamp(parameter, points, true);
+}

@@ -1,0 +1,126 @@
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <mutex>
+#include <span>
+
+#include "core/KParameterInfo.h"
+#include "core/KParameterRamp.h"
+#include "kernel/KArray.h"
+
+class KAudioPluginInterface;
+
+// The parameter side of every plug-in: the parameter table and the ramps that make host
+// automation sample-accurate. The audio is cut into sub-blocks at the ramps' break points, and
+// at every sub-block start each moving parameter holds its exact value.
+//
+// Threads: the Interpolation* operations and AddRamp run on the audio thread. Other threads
+// (host parameter calls, the editor) hand over ramps and values with PostRamp / PostValue; the
+// audio thread picks them up at the next block start (AcceptPostedRamps) without allocating.
+class KAudioPluginBase {
+public:
+  class Parameter;
+  using RampPoint = ParameterRamp::Point;
+
+  // Ramp records made at construction and reused for the life of the plug-in: the audio
+  // thread's own pool (host automation arriving inside the processing call) and the pool of
+  // the hand-over from other threads.
+  static constexpr int32_t kAudioRampCapacity = 128;
+  static constexpr int32_t kPostedRampCapacity = 64;
+  // Longest sub-block normally and while a fine ramp lives.
+  static constexpr int32_t kDefaultSubBlockCap = 1024;
+  static constexpr int32_t kDefaultFineSubBlockCap = 32;
+
+  explicit KAudioPluginBase(std::span<const KParameterInfo> table);
+  KAudioPluginBase(const KAudioPluginBase&) = delete;
+  KAudioPluginBase& operator=(const KAudioPluginBase&) = delete;
+  virtual ~KAudioPluginBase();
+
+  // ---- parameter table
+  int32_t ParameterCount() const noexcept { return parameters_.Count(); }
+  Parameter& GetParameter(int32_t index) noexcept { return *parameters_[index]; }
+  const Parameter& GetParameter(int32_t index) const noexcept { return *parameters_[index]; }
+  // The parameter with this key, or null.
+  Parameter* FindParameter(const KString& key) noexcept;
+
+  // ---- state flags (any thread)
+  static constexpr uint32_t kUpdatePending = 1u << 0;
+  static constexpr uint32_t kJump = 1u << 2;
+  void MarkUpdatePending() noexcept { stateFlags_.fetch_or(kUpdatePending, std::memory_order_release); }
+  // Makes the next block apply every ramp's final value at once (state load, reset).
+  void RequestJump() noexcept { stateFlags_.fetch_or(kJump, std::memory_order_release); }
+  // Clears the update-pending bit; answers whether it was set.
+  bool TakeUpdatePending() noexcept {
+    return (stateFlags_.fetch_and(~kUpdatePending, std::memory_order_acq_rel) & kUpdatePending) != 0;
+  }
+
+  // ---- ramps, audio thread
+  // Starts a ramp now (times relative to the current sub-block; point 1 may be
+  // ParameterRamp::kBlockEnd). Replaces any ramp of the same parameter. Answers false when the
+  // points are unusable (fewer than 2, more than 64, bad index) or the pool is empty, in which
+  // case the last point's value is applied at once so that the final value is never lost.
+  bool AddRamp(int32_t parameter, std::span<const RampPoint> points, bool fine) noexcept;
+  int32_t InterpolationPrepare(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept;
+  int32_t InterpolationProcess(int32_t processedLength, int32_t remainingLength) noexcept;
+  void InterpolationFinish() noexcept;
+  // Takes over what other threads posted (try-lock: when the lock is busy, the ramps wait for
+  // the next block). Called at every block start.
+  void AcceptPostedRamps() noexcept;
+  int32_t ActiveRampCount() const noexcept { return active_.Count(); }
+  int32_t SpareRampCount() const noexcept { return spare_.Count(); }
+
+  // ---- ramps and values from other threads
+  // A ramp that starts at the next block. A second post for the same parameter before the audio
+  // thread took the first replaces it. When every posted record is in use, the final value is
+  // kept on its own and applied at the next block start: nothing allocates, nothing is lost.
+  void PostRamp(int32_t parameter, std::span<const RampPoint> points, bool fine);
+  // Moves a parameter to `normalized` over `glideSamples` from its present value.
+  void PostValue(int32_t parameter, double normalized, int32_t glideSamples);
+
+  // ---- host side
+  KAudioPluginInterface* Interface() const noexcept { return interface_; }
+  void SetInterface(KAudioPluginInterface* host) noexcept { interface_ = host; }
+  // Above 0 while a value sent by the plug-in is on its way to the host (so that the host's
+  // echo of it is recognised).
+  std::atomic<int32_t>& AutomationSending() noexcept { return automationSending_; }
+
+protected:
+  int32_t Remaining() const noexcept { return remaining_; }
+  // Gives the ramps added since the last block that end "at the block end" the host block's
+  // length. The processing cycle calls it before it takes a long block in pieces, so that such
+  // a ramp spans the whole host block rather than its first piece.
+  void ResolveBlockEnd(int32_t blockLength) noexcept;
+
+private:
+  void ApplyCurrent(ParameterRamp& ramp) noexcept;
+  void ApplyLast(ParameterRamp& ramp) noexcept;
+  void Apply(int32_t parameter, double normalized) noexcept;
+  void Retire(ParameterRamp* ramp) noexcept;
+  void RetireRampsOf(int32_t parameter) noexcept;
+  void ApplyOverflowValues() noexcept;
+  static int32_t NextBreak(const ParameterRamp& ramp) noexcept;
+
+  KArray<Parameter*> parameters_;
+  std::unique_ptr<ParameterRamp[]> records_;
+
+  // Audio thread only.
+  KRampList active_;
+  KRampList spare_;
+  KRampList postedReturns_;  // retired posted records, given back at the next accept
+  int32_t remaining_ = 0;
+  bool rampsAdded_ = false;
+
+  // Guarded by rampMutex_.
+  std::mutex rampMutex_;
+  KRampList postedFree_;
+  KRampList posted_;
+  // Final values that found no free posted record, one slot per parameter.
+  std::unique_ptr<std::atomic<double>[]> overflowValues_;
+  std::atomic<bool> overflowPending_{false};
+
+  std::atomic<uint32_t> stateFlags_{kUpdatePending};  // derived values start unset
+  std::atomic<int32_t> automationSending_{0};
+  KAudioPluginInterface* interface_ = nullptr;
+};

@@ -1,0 +1,28 @@
+#include "core/KParameter.h"
+
+#include "hosts/KAudioPluginInterface.h"
+
+KParameterValue::KParameterValue(KAudioPluginBase& owner, const KValueKind& kind, double normalized) noexcept
+    : owner_(owner), kind_(kind), normalized_(normalized), working_(kind.ToWorking(normalized)) {}
+
+void KParameterValue::SetNormalized(double normalized) noexcept {
+  normalized = normalized > 0.0 ? (normalized < 1.0 ? normalized : 1.0) : 0.0;  // NaN becomes 0
+  if (normalized == normalized_.load(std::memory_order_relaxed)) return;
+  working_.store(kind_.ToWorking(normalized), std::memory_order_release);
+  normalized_.store(normalized, std::memory_order_release);
+  owner_.MarkUpdatePending();
+}
+
+KAudioPluginBase::Parameter::Parameter(KAudioPluginBase& owner, int32_t index, const KParameterInfo& info)
+    : owner_(owner), index_(index), info_(info), value_(owner, *info.kind, info.kind->ToNormalized(info.defaultValue)) {}
+
+bool KAudioPluginBase::Parameter::NormalizedFromText(const KString& text, double& normalized) const {
+  double working;
+  if (!info_.kind->FromText(text, working)) return false;
+  normalized = info_.kind->ToNormalized(working);
+  return true;
+}
+
+void KAudioPluginBase::Parameter::TouchAutomation(int32_t kind) {
+  if (KAudioPluginInterface* host = owner_.Interface()) host->GestureNotice(index_, kind);
+}

@@ -1,0 +1,67 @@
+#pragma once
+
+#include <atomic>
+
+#include "core/KAudioPluginBase.h"
+
+// The value object of a parameter: holds the normalised value and the working value derived
+// from it. Both are atomics, so any thread may read them; setting marks the plug-in's update
+// pending so that the audio thread recomputes what depends on it before the next sub-block.
+class KParameterValue {
+public:
+  KParameterValue(KAudioPluginBase& owner, const KValueKind& kind, double normalized) noexcept;
+  KParameterValue(const KParameterValue&) = delete;
+  KParameterValue& operator=(const KParameterValue&) = delete;
+  virtual ~KParameterValue() = default;
+
+  // Takes a normalised value (clamped to 0..1); an unchanged value marks nothing.
+  virtual void SetNormalized(double normalized) noexcept;
+  double Normalized() const noexcept { return normalized_.load(std::memory_order_acquire); }
+  double Working() const noexcept { return working_.load(std::memory_order_acquire); }
+
+private:
+  KAudioPluginBase& owner_;
+  const KValueKind& kind_;
+  std::atomic<double> normalized_;
+  std::atomic<double> working_;
+};
+
+class KAudioPluginBase::Parameter {
+public:
+  // Gesture notices a plug-in sends to its host around a user's edit.
+  static constexpr int32_t kTouch = 0;
+  static constexpr int32_t kRelease = 3;
+
+  Parameter(KAudioPluginBase& owner, int32_t index, const KParameterInfo& info);
+
+  int32_t Index() const noexcept { return index_; }
+  const KParameterInfo& Info() const noexcept { return info_; }
+  KString Key() const noexcept { return KString::Static(info_.key); }
+  KString Name() const noexcept { return KString::Static(info_.name); }
+  KString Unit() const noexcept { return info_.kind->Unit(); }
+  const KValueKind& Kind() const noexcept { return *info_.kind; }
+  int32_t Steps() const noexcept { return info_.kind->Steps(); }
+  bool IsAutomatable() const noexcept { return (info_.flags & KParameterInfo::kAutomatable) != 0; }
+
+  KParameterValue& Value() noexcept { return value_; }
+  double Normalized() const noexcept { return value_.Normalized(); }
+  double Working() const noexcept { return value_.Working(); }
+  double DefaultNormalized() const noexcept { return info_.kind->ToNormalized(info_.defaultValue); }
+  void SetNormalized(double normalized) noexcept { value_.SetNormalized(normalized); }
+  void SetWorking(double working) noexcept { value_.SetNormalized(info_.kind->ToNormalized(working)); }
+
+  // Display text of the present value, or of any normalised value (hosts ask both ways).
+  KString Text() const { return info_.kind->ToText(Working()); }
+  KString TextForNormalized(double normalized) const { return info_.kind->ToText(info_.kind->ToWorking(normalized)); }
+  // False when the text names no value of this parameter.
+  bool NormalizedFromText(const KString& text, double& normalized) const;
+
+  // Starts (kTouch) or ends (kRelease) a user gesture, forwarded to the host when there is one.
+  void TouchAutomation(int32_t kind);
+
+private:
+  KAudioPluginBase& owner_;
+  int32_t index_;
+  const KParameterInfo& info_;
+  KParameterValue value_;
+};

@@ -1,0 +1,239 @@
+#include "dsp/KDynamicsProcessor.h"
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+
+namespace {
+
+// Guards every division by a product or difference that may be near zero.
+constexpr double kTiny = 1e-10;
+// An envelope below this (−400 dB) is silence: the detector restarts from exact zero instead of
+// decaying on through the slow denormal range.
+constexpr double kSilent = 1e-20;
+constexpr double kLargest = std::numeric_limits<double>::max();
+
+double Linear(double decibels) noexcept { return std::exp(0.11512925464970228 * decibels); }
+
+// The one-pole coefficient of a time constant; 0 (instant) for a time too short to divide by.
+double Smoothing(double rate, double seconds) noexcept {
+  const double span = rate * seconds;
+  return std::abs(span) < kTiny ? 0.0 : std::exp(-1.0 / span);
+}
+
+// The slow averages divide in the other order, so that their coefficients are exactly
+// exp(−10/fs) and exp(−0.4/fs).
+KDynamicsProcessor::Pole Average(double rate, double seconds) noexcept {
+  const double coefficient = std::abs(rate * seconds) < kTiny ? 0.0 : std::exp(-(1.0 / seconds) / rate);
+  return {coefficient, 1.0 - coefficient};
+}
+
+}  // namespace
+
+void KDynamicsProcessor::Prepare(int32_t maxChannels, int32_t maxFrames) {
+  // Unprepared until every buffer is in place, should an allocation fail.
+  maxChannels_ = maxFrames_ = channels_ = 0;
+  if (maxChannels < 1 || maxFrames < 1) return;
+  const auto channels = static_cast<size_t>(maxChannels), frames = static_cast<size_t>(maxFrames);
+  const size_t filtered = std::min(channels, static_cast<size_t>(KSectionRunner::kMaxChannels));
+  p_.assign(channels, 0.0);
+  e_.assign(channels, 0.0);
+  envelope_.assign(channels * frames, 0.0f);
+  gains_.assign(channels * frames, 0.0f);
+  filtered_.assign(filtered * frames, 0.0f);
+  filteredRows_.resize(filtered);
+  for (size_t ch = 0; ch < filtered; ++ch) filteredRows_[ch] = filtered_.data() + ch * frames;
+  pieceIn_.assign(channels, nullptr);
+  pieceDetect_.assign(channels, nullptr);
+  pieceOut_.assign(channels, nullptr);
+  maxChannels_ = maxChannels;
+  maxFrames_ = maxFrames;
+  Reset();
+}
+
+void KDynamicsProcessor::Update(const KDynamicsSettings& settings) noexcept {
+  const double fs = settings.sampleRate;
+  gIn_ = Linear(settings.gainDb);
+  gOut_ = Linear(settings.outputGainDb);
+  attack_ = Smoothing(fs, settings.attack);
+  release_ = Smoothing(fs, settings.release);
+  meanSquare_.coefficient = Smoothing(fs, settings.rmsLength);
+  meanSquare_.complement = 1.0 - meanSquare_.coefficient;
+  shortAverage_ = Average(fs, 0.1);
+  longAverage_ = Average(fs, 2.5);
+
+  curve_.Configure({settings.threshold, settings.ratio, settings.kneeMode, settings.kneeSize, settings.maximize,
+                    settings.customShape, settings.shape, gIn_, gOut_});
+  idle_ = curve_.Chosen() == KTransferCurve::kIdle;
+  linked_ = settings.linkChannels;
+  detector_ = linked_ ? DetectLinked : DetectUnlinked;
+  sideChain_ = settings.sideChain;
+  DesignBandLimits(settings);
+  if (idle_) Reset();
+}
+
+// Each limit at its end of the range, or beyond what the rate can carry, leaves its filter off.
+// Frequency and rate reach the designer rounded to single precision: the detector's response
+// must match that rounding to the last bit.
+void KDynamicsProcessor::DesignBandLimits(const KDynamicsSettings& settings) noexcept {
+  highPassOn_ = lowPassOn_ = false;
+  if (settings.sideChainFilters) {
+    const double top = 0.499 * settings.sampleRate;
+    const double low = settings.sideChainMinFrequency, high = settings.sideChainMaxFrequency;
+    const double rate = static_cast<float>(settings.sampleRate);
+    highPassOn_ = low - 20.0 > kTiny && low <= top;
+    lowPassOn_ = high < 19999.9999999999 && high <= top;
+    if (highPassOn_) highPass_.Design(KFilterSection::kHighPass, 0.0, static_cast<float>(low), rate, 1.0);
+    if (lowPassOn_) lowPass_.Design(KFilterSection::kLowPass, 0.0, static_cast<float>(high), rate, 1.0);
+  }
+  KFilterSection cascade[2];
+  int32_t count = 0;
+  if (highPassOn_) cascade[count++] = highPass_;
+  if (lowPassOn_) cascade[count++] = lowPass_;
+  bands_.SetSections(cascade, count);
+}
+
+void KDynamicsProcessor::Process(int32_t n, const float* const* in, float* const* out, const float* const* sideChain,
+                                 int32_t channels) noexcept {
+  if (n <= 0 || channels <= 0) return;
+  if (idle_) {
+    Amplify(n, in, out, channels);
+    return;
+  }
+  channels = std::min(channels, maxChannels_);
+  if (channels == 0) return;
+  channels_ = channels;
+  const float* const* source = sideChain_ && sideChain ? sideChain : in;
+  const int32_t filtered = bands_.SectionCount() > 0 ? std::min(channels, KSectionRunner::kMaxChannels) : 0;
+  for (int32_t begin = 0; begin < n; begin += maxFrames_) {
+    const int32_t frames = std::min(n - begin, maxFrames_);
+    for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) {
+      pieceIn_[ch] = in[ch] + begin;
+      pieceOut_[ch] = out[ch] + begin;
+      pieceDetect_[ch] = source[ch] + begin;
+    }
+    if (filtered > 0) {
+      bands_.Process(pieceDetect_.data(), filteredRows_.data(), filtered, frames);
+      std::copy_n(filteredRows_.begin(), filtered, pieceDetect_.begin());
+    }
+    detector_(*this, channels, frames);
+    Settle(linked_ ? 1 : channels);
+  }
+}
+
+// One detector fed by the mean square of all channels; every channel gets its gain.
+void KDynamicsProcessor::DetectLinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept {
+  const float* const* x = self.pieceDetect_.data();
+  const float* const* in = self.pieceIn_.data();
+  float* const* out = self.pieceOut_.data();
+  float* envelope = self.envelope_.data();
+  float* gains = self.gains_.data();
+  KTransferCurve& curve = self.curve_;
+  const double gIn = self.gIn_, c = self.meanSquare_.coefficient, attack = self.attack_, release = self.release_;
+  // The mean over the channels rides on the smoothing's complement, in single precision.
+  const double share = self.meanSquare_.complement * (1.0f / static_cast<float>(channels));
+  double p = self.p_[0], e = self.e_[0];
+  for (int32_t i = 0; i < frames; ++i) {
+    double s = 0.0;
+    for (int32_t ch = 0; ch < channels; ++ch) {
+      const double v = gIn * x[ch][i];
+      s += v * v;
+    }
+    p = c * p + share * s;
+    const double r = std::sqrt(p);
+    e = r + (e < r ? attack : release) * (e - r);
+    const double g = curve.Gain(e);
+    envelope[i] = static_cast<float>(e);
+    gains[i] = static_cast<float>(g);
+    int32_t ch = 0;
+    for (; ch + 4 <= channels; ch += 4) {
+      out[ch][i] = static_cast<float>(g * in[ch][i]);
+      out[ch + 1][i] = static_cast<float>(g * in[ch + 1][i]);
+      out[ch + 2][i] = static_cast<float>(g * in[ch + 2][i]);
+      out[ch + 3][i] = static_cast<float>(g * in[ch + 3][i]);
+    }
+    for (; ch < channels; ++ch) out[ch][i] = static_cast<float>(g * in[ch][i]);
+  }
+  self.p_[0] = p;
+  self.e_[0] = e;
+}
+
+// A detector, an envelope row and a gain row per channel.
+void KDynamicsProcessor::DetectUnlinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept {
+  KTransferCurve& curve = self.curve_;
+  const double gIn = self.gIn_, c = self.meanSquare_.coefficient, share = self.meanSquare_.complement;
+  const double attack = self.attack_, release = self.release_;
+  for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) {
+    const float* x = self.pieceDetect_[ch];
+    const float* in = self.pieceIn_[ch];
+    float* out = self.pieceOut_[ch];
+    float* envelope = self.envelope_.data() + ch * static_cast<size_t>(self.maxFrames_);
+    float* gains = self.gains_.data() + ch * static_cast<size_t>(self.maxFrames_);
+    double p = self.p_[ch], e = self.e_[ch];
+    for (int32_t i = 0; i < frames; ++i) {
+      const double v = gIn * x[i];
+      p = c * p + share * (v * v);
+      const double r = std::sqrt(p);
+      e = r + (e < r ? attack : release) * (e - r);
+      const double g = curve.Gain(e);
+      envelope[i] = static_cast<float>(e);
+      gains[i] = static_cast<float>(g);
+      out[i] = static_cast<float>(g * in[i]);
+    }
+    self.p_[ch] = p;
+    self.e_[ch] = e;
+  }
+}
+
+// Ratio 1:1 without a custom shape: a plain gain, in place or copying.
+void KDynamicsProcessor::Amplify(int32_t n, const float* const* in, float* const* out, int32_t channels) const noexcept {
+  const auto factor = static_cast<float>(gIn_ * gOut_);
+  for (int32_t ch = 0; ch < channels; ++ch) {
+    const float* x = in[ch];
+    float* y = out[ch];
+    for (int32_t i = 0; i < n; ++i) y[i] = factor * x[i];
+  }
+}
+
+void KDynamicsProcessor::Decay(int32_t n) noexcept {
+  if (idle_) return;
+  const int32_t states = std::min(linked_ ? 1 : channels_, maxChannels_);
+  const double c = meanSquare_.coefficient;
+  for (size_t j = 0; j < static_cast<size_t>(states); ++j) {
+    // Without input every channel is silent alike: one that has died away restarts them all.
+    if (e_[j] < kSilent) {
+      Reset();
+      continue;
+    }
+    double p = p_[j], e = e_[j];
+    for (int32_t i = 0; i < n; ++i) {
+      p = c * p;
+      const double r = std::sqrt(p);
+      e = r + (e < r ? attack_ : release_) * (e - r);
+    }
+    p_[j] = p;
+    e_[j] = e;
+  }
+  Settle(states);
+}
+
+// Once per block: a detector that a NaN or infinity reached restarts instead of poisoning every
+// later block, and a mean square or envelope fallen silent becomes exact zero before it can reach
+// the denormal range. The mean square falls far faster than a slow release, so each goes alone.
+void KDynamicsProcessor::Settle(int32_t states) noexcept {
+  for (size_t j = 0; j < static_cast<size_t>(states); ++j) {
+    if (!(p_[j] <= kLargest && e_[j] <= kLargest)) {
+      p_[j] = e_[j] = 0.0;
+      curve_.ResetCache();
+    }
+    if (p_[j] < kSilent * kSilent) p_[j] = 0.0;
+    if (e_[j] < kSilent) e_[j] = 0.0;
+  }
+}
+
+void KDynamicsProcessor::Reset() noexcept {
+  std::fill(p_.begin(), p_.end(), 0.0);
+  std::fill(e_.begin(), e_.end(), 0.0);
+  curve_.ResetCache();
+  bands_.Reset();
+}

@@ -54,7 +54,7 @@ void KAudioPlugin::SetChannelMode(int32_t mode) noexcept {
 }
 
 void KAudioPlugin::ReportLatency(int32_t samples) noexcept {
-  latency_ = samples;
+  latency_.store(samples, std::memory_order_relaxed);
   if (KAudioPluginInterface* host = Interface()) host->RequestLatencyReport(KAudioPluginInterface::kLatencyIfChanged);
 }
 

@@ -68,9 +68,9 @@ public:
 
   // ---- latency
   // Samples the plug-in delays its output by (its own, at its processing rate).
-  int32_t Latency() const noexcept { return latency_; }
+  int32_t Latency() const noexcept { return latency_.load(std::memory_order_relaxed); }
   // The latency hosts see: the plug-in's own divided by its oversampling factor.
-  int32_t TotalLatency() const noexcept { return latency_ / oversampling_; }
+  int32_t TotalLatency() const noexcept { return Latency() / oversampling_.load(std::memory_order_relaxed); }
   // Tells the host, at its next idle, when the latency changed.
   void ReportLatency(int32_t samples) noexcept;
 
@@ -79,7 +79,8 @@ public:
   void ScheduleMIDIEvent(int32_t sampleOffset, KMIDIBytes bytes) noexcept;
   KTransport& Transport() noexcept { return transport_; }
   // One host block: `inputs` may be null (silence); `outputs` must hold OutputChannelCount()
-  // channels. Host buffers are read only; inputs and outputs may be the same buffers.
+  // channels. Host buffers are read only; inputs and outputs may be the same buffers. Without
+  // output buffers or samples nothing is processed, but the block's MIDI messages still arrive.
   void ProcessHostBlock(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
 
 protected:
@@ -90,7 +91,7 @@ protected:
   virtual void Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) = 0;
   // Clears the plug-in's own processing state.
   virtual void ResetState() {}
-  void SetOversampling(int32_t factor) noexcept { oversampling_ = factor > 1 ? factor : 1; }
+  void SetOversampling(int32_t factor) noexcept { oversampling_.store(factor > 1 ? factor : 1, std::memory_order_relaxed); }
 
 private:
   // Samples of the channel mode's input copies, which live on the stack of the processing call.
@@ -112,8 +113,9 @@ private:
   double sampleRate_ = 44100.0;
   int32_t subBlockCap_ = kDefaultSubBlockCap;
   int32_t fineSubBlockCap_ = kDefaultFineSubBlockCap;
-  int32_t latency_ = 0;
-  int32_t oversampling_ = 1;
+  // Set on the audio thread, read by the host interface's timer.
+  std::atomic<int32_t> latency_{0};
+  std::atomic<int32_t> oversampling_{1};
   std::atomic<int32_t> channelMode_{0};
   std::atomic<bool> meterReset_{false};
   std::atomic<uint64_t> lastProcessingTime_{0};

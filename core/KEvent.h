@@ -41,7 +41,9 @@ protected:
 // read (ReservePending beforehand keeps the append from allocating). The listener list belongs
 // to the thread that executes the event: adding and removing listeners, ExecuteImmediately and
 // ExecutePendingEvent all run there. Listeners are called outside the lock, so they may post to
-// this or any other event. Nothing may post once the event's destruction has begun.
+// this or any other event. A round of calls reads the listener count once: listeners added
+// during it wait for the next round, listeners removed during it are not called any more.
+// Nothing may post once the event's destruction has begun.
 template <class Argument>
 class KEvent : public KEventBase {
   static_assert(std::is_trivially_copyable_v<Argument> && sizeof(Argument) <= 2 * sizeof(uint64_t),
@@ -89,8 +91,8 @@ public:
     return result;
   }
 
-  // Queues the argument for a later ExecutePendingEvent. Posting the same value twice queues it
-  // twice.
+  // Queues the argument for a later ExecutePendingEvent; equal arguments are not coalesced. If
+  // the queue cannot grow, the argument is dropped with a trace line.
   void Post(Argument argument) noexcept {
     KGuard("KEvent::Post", [&] {
       std::lock_guard lock(pendingLock_);

@@ -10,7 +10,12 @@ class KLevelMeter {
 public:
   void Accumulate(const float* samples, int32_t n) noexcept {
     float peak = level_.load(std::memory_order_relaxed);
-    for (int32_t i = 0; i < n; ++i) peak = std::fmax(peak, std::fabs(samples[i]));
+    // Compare-and-select rather than fmax: the compiler turns it into packed maxima, and a NaN
+    // sample is skipped just the same.
+    for (int32_t i = 0; i < n; ++i) {
+      const float magnitude = std::fabs(samples[i]);
+      peak = magnitude > peak ? magnitude : peak;
+    }
     level_.store(peak, std::memory_order_relaxed);
     count_ += n;
     hold_ = true;

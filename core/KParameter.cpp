@@ -3,14 +3,11 @@
 #include "hosts/KAudioPluginInterface.h"
 
 KParameterValue::KParameterValue(KAudioPluginBase& owner, const KValueKind& kind, double normalized) noexcept
-    : owner_(owner), kind_(kind), normalized_(normalized), working_(kind.ToWorking(normalized)) {}
+    : owner_(owner), kind_(kind), normalized_(normalized) {}
 
 void KParameterValue::SetNormalized(double normalized) noexcept {
   normalized = normalized > 0.0 ? (normalized < 1.0 ? normalized : 1.0) : 0.0;  // NaN becomes 0
-  if (normalized == normalized_.load(std::memory_order_relaxed)) return;
-  working_.store(kind_.ToWorking(normalized), std::memory_order_release);
-  normalized_.store(normalized, std::memory_order_release);
-  owner_.MarkUpdatePending();
+  if (normalized_.exchange(normalized, std::memory_order_acq_rel) != normalized) owner_.MarkUpdatePending();
 }
 
 KAudioPluginBase::Parameter::Parameter(KAudioPluginBase& owner, int32_t index, const KParameterInfo& info)

@@ -4,8 +4,8 @@
 
 #include "core/KAudioPluginBase.h"
 
-// The value object of a parameter: holds the normalised value and the working value derived
-// from it. Both are atomics, so any thread may read them; setting marks the plug-in's update
+// The value object of a parameter: holds the normalised value (atomic, so any thread may read
+// it) and derives the working value from it; setting marks the plug-in's update
 // pending so that the audio thread recomputes what depends on it before the next sub-block.
 class KParameterValue {
 public:
@@ -17,13 +17,14 @@ public:
   // Takes a normalised value (clamped to 0..1); an unchanged value marks nothing.
   virtual void SetNormalized(double normalized) noexcept;
   double Normalized() const noexcept { return normalized_.load(std::memory_order_acquire); }
-  double Working() const noexcept { return working_.load(std::memory_order_acquire); }
+  // Derived on every read, so that it always belongs to the normalised value beside it even
+  // while two threads set the parameter at once.
+  double Working() const noexcept { return kind_.ToWorking(Normalized()); }
 
 private:
   KAudioPluginBase& owner_;
   const KValueKind& kind_;
   std::atomic<double> normalized_;
-  std::atomic<double> working_;
 };
 
 class KAudioPluginBase::Parameter {

@@ -1,6 +1,35 @@
 #include "kernel/KModule.h"
 
 #include <memory>
+#include <string_view>
+
+#include "kernel/platform/KPlatform.h"
+
+namespace {
+// The plug-in's name as one folder name, the same on every system (user data may be copied
+// between them). A name of dots alone would climb out of the family's folder.
+std::string FolderName(const KString& name) {
+  std::string folder = name.ToUtf8();
+  for (char& c : folder) {
+    const bool control = static_cast<unsigned char>(c) < 0x20 || c == 0x7F;
+    if (control || std::string_view("<>:\"/\\|?*").find(c) != std::string_view::npos) c = '_';
+  }
+  if (folder.find_first_not_of('.') == std::string::npos) folder = "_" + folder;
+  return folder;
+}
+}  // namespace
+
+std::string KModule::GetDataPath_User() const {
+  const std::string folder = KPlatform::SubfolderPath(GetDataPath_Shared(), FolderName(name_));
+  KPlatform::CreateFolders(folder);
+  return folder;
+}
+
+std::string KModule::GetDataPath_Shared() {
+  const std::string folder = KPlatform::SubfolderPath(KPlatform::UserDataHome(), "Torvane");
+  KPlatform::CreateFolders(folder);
+  return folder;
+}
 
 KModuleMap::~KModuleMap() {
   for (KModule* module : owned_) delete module;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <mutex>
+#include <string>
 
 #include "kernel/KHashIndex.h"
 
@@ -9,6 +10,16 @@ class KModule {
 public:
   explicit KModule(const KString& name) : name_(name) {}
   const KString& Name() const noexcept { return name_; }
+
+  // The user's data folder of this plug-in, "<user data home>/Torvane/<name>/" (see
+  // KPlatform::UserDataHome), created when missing. Characters that no file system of ours
+  // allows in a folder name (control characters and <>:"/\|?*) become "_", and a name of dots
+  // alone (or none) gets a "_" in front. Not cached, so the folder is recreated if removed
+  // while the plug-in runs. Throws KException when the folder cannot be found or created.
+  std::string GetDataPath_User() const;
+  // The folder shared by every plug-in of the family, "<user data home>/Torvane/", created
+  // when missing.
+  static std::string GetDataPath_Shared();
 
 private:
   KString name_;

@@ -395,10 +395,11 @@ private:
         KStringHeap::Retain(heap_);
         break;
       default:
-        if (other.length_ <= N - 1) {
+        // An inline text of a type no larger than this one always fits inline here.
+        if (M <= N || other.length_ <= N - 1) {
           storage_ = kInline;
           std::memcpy(inline_, other.inline_, sizeof(char16_t) * static_cast<size_t>(length_ + 1));
-        } else {  // longer than this type keeps inline
+        } else if constexpr (M > N) {  // longer than this type keeps inline
           storage_ = kHeap;
           heap_ = KStringHeap::Allocate(length_);
           std::memcpy(heap_, other.inline_, sizeof(char16_t) * static_cast<size_t>(length_ + 1));

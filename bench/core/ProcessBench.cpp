@@ -124,5 +124,5 @@ const bool kRegistered = [] {
 }();
 }  // namespace
 
-BENCHMARK(BM_OverheadPerBlock)->ArgName("block")->Arg(32)->Arg(64)->Arg(256)->Arg(1024)->Arg(4096);
+BENCHMARK(BM_OverheadPerBlock)->ArgName("block")->Arg(1)->Arg(8)->Arg(32)->Arg(64)->Arg(256)->Arg(1024)->Arg(4096);
 BENCHMARK(BM_OverheadPerSubBlock)->ArgName("subblocks")->Arg(1)->Arg(2)->Arg(4)->Arg(8)->Arg(16)->Arg(32)->Arg(63);

@@ -2,6 +2,10 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
 
 // Every call into the operating system goes through here, one implementation per system
 // (kernel/platform/<system>/). The rest of the kernel never includes an OS header.
@@ -21,5 +25,53 @@ void WriteTraceLine(const char* line, size_t length) noexcept;
 // Where diagnostic trace lines go, from the TORVANE_TRACE environment value ("stderr" or a
 // file path); false when tracing is not asked for.
 bool OpenTraceDestination() noexcept;
+
+// Files and folders. Paths are UTF-8; a folder path ends in the system's separator. Failures
+// throw KException with a sentence naming the path and the system's reason, e.g.
+// "Could not write the file '{0}' ({1})." (see each function).
+
+// The folder under which the user's application data lives: $XDG_DATA_HOME when it holds an
+// absolute path, else $HOME/.local/share; on Windows the roaming application-data folder
+// (%APPDATA%). Ends in the separator; not created here. "Could not find the user's data
+// folder: neither XDG_DATA_HOME nor HOME is set."
+std::string UserDataHome();
+
+// `folder` + `name` + separator: the path of a folder inside another.
+std::string SubfolderPath(const std::string& folder, const std::string& name);
+
+// Creates the folder and any missing parents; an existing folder is fine.
+// "Could not create the folder '{0}' ({1})."
+void CreateFolders(const std::string& path);
+
+// The whole content, or nothing when there is no such file. "Could not read the file '{0}' ({1})."
+std::optional<std::string> ReadFile(const std::string& path);
+
+// Replaces the file all at once: the content goes to a new file in the same folder, is flushed
+// to the disk, and only then renamed over `path`. Readers see the old or the new content,
+// never a mixture; after a failure the old file is untouched and no temporary file remains.
+// The folder must exist. "Could not write the file '{0}' ({1})."
+void WriteFileAtomically(const std::string& path, std::string_view contents);
+
+// Test seam: the next `count` atomic writes fail once their temporary file is written, as on a
+// full disk, so that tests can see what a failed write leaves behind.
+void InjectAtomicWriteFailures(int count) noexcept;
+
+// Moves a file, replacing one at `to`. "Could not rename the file '{0}' to '{1}' ({2})."
+void RenameFile(const std::string& from, const std::string& to);
+
+// Answers false when there was no such file. "Could not remove the file '{0}' ({1})."
+bool RemoveFile(const std::string& path);
+
+// Names of the regular files in the folder (hidden ones included, sub-folders not), sorted
+// by byte value; a missing folder holds none. "Could not list the folder '{0}' ({1})."
+std::vector<std::string> ListFiles(const std::string& folder);
+
+// A new, empty folder of the caller's own under the system's temporary folder.
+// "Could not create a temporary folder in '{0}' ({1})."
+std::string CreateTemporaryFolder();
+
+// Removes the folder with everything in it; a missing folder is fine.
+// "Could not remove the folder '{0}' ({1})."
+void RemoveFolderTree(const std::string& path);
 
 }  // namespace KPlatform

@@ -226,29 +226,33 @@ TEST_F(ProcessingCycleTest, MissingOutputsOrSamplesProcessNothingButStillDeliver
 
 TEST(ProcessingCycle, BlocksLongerThanTheLongestChunkBehaveAsOneBlock) {
   constexpr int32_t kLength = 2 * KAudioPlugin::kMaxChunk + 1808;
-  KRecordingPlugin plugin;
-  KBlockBuffers buffers(2, 2, kLength);
-  const KAudioPluginBase::RampPoint points[] = {{0, 0.0}, {ParameterRamp::kBlockEnd, 1.0}};
-  plugin.AddRamp(0, points, false);
-  Note(plugin, 5000, 60);
-  RunBlock(plugin, buffers, kLength);
+  // With a side-chain the channel mode's copies share their room among four channels.
+  for (const KAudioPlugin::Shape& shape : {KRecordingPlugin::kEffect, kWithSideChain}) {
+    SCOPED_TRACE(shape.inputBuses);
+    KRecordingPlugin plugin(1, shape);
+    plugin.SetChannelMode(KChannelMode::kMono);
+    KBlockBuffers buffers(plugin.InputChannelCount(), plugin.OutputChannelCount(), kLength);
+    const KAudioPluginBase::RampPoint points[] = {{0, 0.0}, {ParameterRamp::kBlockEnd, 1.0}};
+    plugin.AddRamp(0, points, false);
+    Note(plugin, 5000, 60);
+    RunBlock(plugin, buffers, kLength);
 
-  EXPECT_EQ(buffers.Out(0), buffers.In(0));
-  EXPECT_EQ(buffers.Out(1), buffers.In(1));
-  int32_t start = 0;
-  int32_t call = 0;
-  for (const Entry& entry : plugin.Log()) {
-    if (entry.kind == Entry::kNote) {
-      EXPECT_EQ(start, 5000);
+    for (int32_t c = 0; c < plugin.OutputChannelCount(); ++c) EXPECT_EQ(buffers.Out(c), buffers.In(c)) << c;
+    int32_t start = 0;
+    int32_t call = 0;
+    for (const Entry& entry : plugin.Log()) {
+      if (entry.kind == Entry::kNote) {
+        EXPECT_EQ(start, 5000);
+      }
+      if (entry.kind != Entry::kProcess) continue;
+      EXPECT_LE(entry.length, KAudioPluginBase::kDefaultSubBlockCap);
+      // The ramp runs across the whole host block, not to the end of a piece of it.
+      EXPECT_NEAR(plugin.Seen(call++, 0), static_cast<double>(start) / kLength, 1e-12) << "at " << start;
+      start += entry.length;
     }
-    if (entry.kind != Entry::kProcess) continue;
-    EXPECT_LE(entry.length, KAudioPluginBase::kDefaultSubBlockCap);
-    // The ramp runs across the whole host block, not to the end of a piece of it.
-    EXPECT_NEAR(plugin.Seen(call++, 0), static_cast<double>(start) / kLength, 1e-12) << "at " << start;
-    start += entry.length;
+    EXPECT_EQ(start, kLength);
+    EXPECT_EQ(plugin.GetParameter(0).Normalized(), 1.0);
   }
-  EXPECT_EQ(start, kLength);
-  EXPECT_EQ(plugin.GetParameter(0).Normalized(), 1.0);
 }
 
 #if defined(__SSE__)

@@ -1,25 +1,85 @@
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <time.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <atomic>
+#include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <filesystem>
 #include <string>
+#include <system_error>
 
+#include "kernel/KException.h"
+#include "kernel/KFormat.h"
 #include "kernel/KUtf8.h"
 #include "kernel/platform/KPlatform.h"
 
 namespace {
 std::atomic<int> gTraceDescriptor{-1};
 
-void WriteAll(int fd, const char* data, size_t length) noexcept {
-  while (length > 0) {
-    const ssize_t written = ::write(fd, data, length);
-    if (written <= 0) return;
-    data += written;
-    length -= static_cast<size_t>(written);
+std::atomic<int> gInjectedWriteFailures{0};
+std::atomic<uint32_t> gTemporaryCounter{0};
+
+KString FromPath(const std::string& path) { return KString::FromUtf8(path); }
+KString Reason(int error) { return KString::FromUtf8(std::generic_category().message(error)); }
+
+[[noreturn]] void FailOnPath(const KString& pattern, const std::string& path, int error) {
+  throw KException(KFormatText(pattern, FromPath(path), Reason(error)));
+}
+
+// The error of the first failing step, or 0; retries writes cut short by signals.
+int WriteWhole(int fd, std::string_view contents) noexcept {
+  while (!contents.empty()) {
+    const ssize_t written = ::write(fd, contents.data(), contents.size());
+    if (written < 0 && errno == EINTR) continue;
+    if (written <= 0) return written < 0 ? errno : EIO;
+    contents.remove_prefix(static_cast<size_t>(written));
   }
+  return 0;
+}
+
+// Diagnostics have nowhere to report their own failure.
+void WriteAll(int fd, const char* data, size_t length) noexcept { WriteWhole(fd, std::string_view(data, length)); }
+
+bool ConsumeInjectedFailure() noexcept {
+  int left = gInjectedWriteFailures.load();
+  while (left > 0 && !gInjectedWriteFailures.compare_exchange_weak(left, left - 1)) {
+  }
+  return left > 0;
+}
+
+// Where the file name begins in `path`: after the last separator.
+size_t NameStart(const std::string& path) noexcept {
+  const size_t slash = path.rfind('/');
+  return slash == std::string::npos ? 0 : slash + 1;
+}
+
+// A hidden sibling of `path` that no other writer uses: ".<name>.<pid>-<counter>.tmp". Created
+// exclusively, so a name left by a crashed process is skipped rather than reused.
+int OpenTemporarySibling(const std::string& path, std::string& temporary) {
+  const size_t start = NameStart(path);
+  for (int attempt = 0; attempt < 100; ++attempt) {
+    temporary = path.substr(0, start) + "." + path.substr(start) + "." + std::to_string(::getpid()) + "-" +
+                std::to_string(gTemporaryCounter.fetch_add(1)) + ".tmp";
+    const int fd = ::open(temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
+    if (fd >= 0 || errno != EEXIST) return fd;
+  }
+  errno = EEXIST;
+  return -1;
+}
+
+// Makes a finished rename in the folder of `path` durable. Best effort: the new content is
+// already in place, and a folder that cannot be synced is no reason to report a failed write.
+void SyncFolderOf(const std::string& path) {
+  const size_t start = NameStart(path);
+  const std::string folder = start == 0 ? std::string(".") : path.substr(0, start);
+  const int fd = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (fd < 0) return;
+  ::fsync(fd);
+  ::close(fd);
 }
 }  // namespace
 
@@ -58,4 +118,110 @@ bool KPlatform::OpenTraceDestination() noexcept {
   if (fd < 0) return false;
   gTraceDescriptor.store(fd, std::memory_order_release);
   return true;
+}
+
+std::string KPlatform::UserDataHome() {
+  // Relative values are invalid by the XDG rules and ignored, so that the data never depends
+  // on the host's working folder.
+  const char* xdg = std::getenv("XDG_DATA_HOME");
+  std::string home;
+  if (xdg && xdg[0] == '/') {
+    home = xdg;
+  } else {
+    const char* user = std::getenv("HOME");
+    if (!user || !*user) throw KException("Could not find the user's data folder: neither XDG_DATA_HOME nor HOME is set.");
+    home = std::string(user) + "/.local/share";
+  }
+  while (home.size() > 1 && home.back() == '/') home.pop_back();
+  return home == "/" ? home : home + "/";
+}
+
+std::string KPlatform::SubfolderPath(const std::string& folder, const std::string& name) { return folder + name + "/"; }
+
+void KPlatform::CreateFolders(const std::string& path) {
+  std::error_code error;
+  std::filesystem::create_directories(path, error);
+  if (error) FailOnPath("Could not create the folder '{0}' ({1}).", path, error.value());
+}
+
+std::optional<std::string> KPlatform::ReadFile(const std::string& path) {
+  const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+  if (fd < 0 && errno == ENOENT) return std::nullopt;
+  if (fd < 0) FailOnPath("Could not read the file '{0}' ({1}).", path, errno);
+  std::string contents;
+  struct stat status {};
+  if (::fstat(fd, &status) == 0 && status.st_size > 0) contents.reserve(static_cast<size_t>(status.st_size));
+  char buffer[65536];
+  for (;;) {
+    const ssize_t got = ::read(fd, buffer, sizeof(buffer));
+    if (got < 0 && errno == EINTR) continue;
+    if (got < 0) {
+      const int error = errno;
+      ::close(fd);
+      FailOnPath("Could not read the file '{0}' ({1}).", path, error);
+    }
+    if (got == 0) break;
+    contents.append(buffer, static_cast<size_t>(got));
+  }
+  ::close(fd);
+  return contents;
+}
+
+void KPlatform::WriteFileAtomically(const std::string& path, std::string_view contents) {
+  std::string temporary;
+  const int fd = OpenTemporarySibling(path, temporary);
+  if (fd < 0) FailOnPath("Could not write the file '{0}' ({1}).", path, errno);
+  int error = WriteWhole(fd, contents);
+  if (!error && ConsumeInjectedFailure()) error = ENOSPC;
+  if (!error && ::fsync(fd) != 0) error = errno;
+  if (::close(fd) != 0 && !error) error = errno;
+  if (!error && ::rename(temporary.c_str(), path.c_str()) != 0) error = errno;
+  if (error) {
+    ::unlink(temporary.c_str());
+    FailOnPath("Could not write the file '{0}' ({1}).", path, error);
+  }
+  SyncFolderOf(path);
+}
+
+void KPlatform::InjectAtomicWriteFailures(int count) noexcept { gInjectedWriteFailures.store(count); }
+
+void KPlatform::RenameFile(const std::string& from, const std::string& to) {
+  if (::rename(from.c_str(), to.c_str()) == 0) return;
+  const KString reason = Reason(errno);  // before anything else can change errno
+  throw KException(KFormatText("Could not rename the file '{0}' to '{1}' ({2}).", FromPath(from), FromPath(to), reason));
+}
+
+bool KPlatform::RemoveFile(const std::string& path) {
+  if (::unlink(path.c_str()) == 0) return true;
+  if (errno == ENOENT) return false;
+  FailOnPath("Could not remove the file '{0}' ({1}).", path, errno);
+}
+
+std::vector<std::string> KPlatform::ListFiles(const std::string& folder) {
+  std::vector<std::string> names;
+  std::error_code error;
+  std::filesystem::directory_iterator entry(folder, error);
+  if (error == std::errc::no_such_file_or_directory) return names;
+  for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error)) {
+    std::error_code ignored;  // an entry removed while listing is simply not a file any more
+    if (entry->is_regular_file(ignored)) names.push_back(entry->path().filename().string());
+  }
+  if (error) FailOnPath("Could not list the folder '{0}' ({1}).", folder, error.value());
+  std::sort(names.begin(), names.end());
+  return names;
+}
+
+std::string KPlatform::CreateTemporaryFolder() {
+  const char* base = std::getenv("TMPDIR");
+  std::string folder = base && *base ? base : "/tmp";
+  if (folder.back() != '/') folder += '/';
+  std::string pattern = folder + "torvane-XXXXXX";
+  if (!::mkdtemp(pattern.data())) FailOnPath("Could not create a temporary folder in '{0}' ({1}).", folder, errno);
+  return pattern + "/";
+}
+
+void KPlatform::RemoveFolderTree(const std::string& path) {
+  std::error_code error;
+  std::filesystem::remove_all(path, error);
+  if (error) FailOnPath("Could not remove the folder '{0}' ({1}).", path, error.value());
 }

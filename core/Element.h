@@ -5,6 +5,7 @@
 #include <type_traits>
 
 #include "kernel/KArray.h"
+#include "kernel/KExport.h"
 #include "kernel/KString.h"
 
 class Element;
@@ -28,7 +29,7 @@ struct KIsRelocatable<std::unique_ptr<Element>> : std::true_type {};  // a singl
 //
 // Children are held by pointer, so a reference to a child stays valid while siblings are added.
 // Copying copies the whole subtree; equality compares whole subtrees.
-class Element {
+class TORVANE_API Element {
 public:
   using Attribute = KXMLAttribute;
   class Iterator;
@@ -95,7 +96,7 @@ private:
 //   while (Element* controller = it.Next()) ...
 // Children appended during the walk are visited too. Next on an iterator that was never
 // started throws KException "XML item iterator has not been initialized.".
-class Element::Iterator {
+class TORVANE_API Element::Iterator {
 public:
   void Start(Element& parent, KString name = {}) noexcept;
   // The next matching child, or null after the last.

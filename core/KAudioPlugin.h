@@ -9,12 +9,13 @@
 #include "core/KMIDIProcessor.h"
 #include "core/KMIDIQueue.h"
 #include "core/KTransport.h"
+#include "kernel/KExport.h"
 #include "kernel/KString.h"
 
 // The base of every plug-in of the catalogue: parameters and ramps (KAudioPluginBase), MIDI
 // input (KMIDIProcessor) and the processing cycle that turns each host block into calls of the
 // plug-in's own Process, cut at ramp break points and, when asked, at MIDI events.
-class KAudioPlugin : public KAudioPluginBase, public KMIDIProcessor {
+class TORVANE_API KAudioPlugin : public KAudioPluginBase, public KMIDIProcessor {
 public:
   // What a plug-in is, as hosts see it.
   struct Shape {

@@ -9,6 +9,7 @@
 #include "core/KParameterInfo.h"
 #include "core/KParameterRamp.h"
 #include "kernel/KArray.h"
+#include "kernel/KExport.h"
 
 class KAudioPluginInterface;
 
@@ -19,7 +20,7 @@ class KAudioPluginInterface;
 // Threads: the Interpolation* operations and AddRamp run on the audio thread. Other threads
 // (host parameter calls, the editor) hand over ramps and values with PostRamp / PostValue; the
 // audio thread picks them up at the next block start (AcceptPostedRamps) without allocating.
-class KAudioPluginBase {
+class TORVANE_API KAudioPluginBase {
 public:
   class Parameter;
   using RampPoint = ParameterRamp::Point;

@@ -2,9 +2,11 @@
 
 #include <cstdint>
 
+#include "kernel/KExport.h"
+
 // A millisecond clock, injectable so that time rules (gesture ends, undo windows) are tested
 // without sleeping.
-class KClock {
+class TORVANE_API KClock {
 public:
   virtual ~KClock() = default;
   virtual uint64_t Milliseconds() const noexcept = 0;

@@ -4,6 +4,7 @@
 
 #include "core/KMIDIQueue.h"
 #include "core/KTransport.h"
+#include "kernel/KExport.h"
 
 // One decoded MIDI message, as the handlers of KMIDIProcessorBase receive it.
 struct KMIDIEvent {
@@ -22,7 +23,7 @@ struct KMIDIEvent {
 // The receiving side of MIDI input: a plug-in overrides the handlers it needs (the defaults
 // ignore the event). They run on the audio thread, inside the processing cycle; a KException
 // thrown by one ends only that event.
-class KMIDIProcessorBase {
+class TORVANE_API KMIDIProcessorBase {
 public:
   KMIDIProcessorBase() noexcept = default;
   KMIDIProcessorBase(const KMIDIProcessorBase&) = delete;
@@ -43,7 +44,7 @@ public:
 // Decodes queued MIDI messages into events for the handlers. Musical times are taken from the
 // transport of the current block, which the owner keeps up to date and which must outlive the
 // processor.
-class KMIDIProcessor : public KMIDIProcessorBase {
+class TORVANE_API KMIDIProcessor : public KMIDIProcessorBase {
 public:
   explicit KMIDIProcessor(const KTransport& transport) noexcept : transport_(transport) {}
 

@@ -4,12 +4,14 @@
 #include <atomic>
 #include <cstdint>
 
+#include "kernel/KExport.h"
+
 // One short MIDI message as a host delivers it: status, two data bytes and a fourth byte
 // (0 for ordinary three-byte messages).
 using KMIDIBytes = std::array<uint8_t, 4>;
 
 // Sees every incoming message before it is queued (a MIDI activity display, controller learn).
-class KMIDIMonitor {
+class TORVANE_API KMIDIMonitor {
 public:
   KMIDIMonitor() noexcept = default;
   KMIDIMonitor(const KMIDIMonitor&) = delete;
@@ -27,7 +29,7 @@ public:
 // Threading: the host adapter schedules and the processing cycle drains on the audio thread,
 // without a lock. The input switch and the monitor may be changed from any thread; a monitor
 // must outlive its installation plus the processing call that may still be using it.
-class KMIDIQueue {
+class TORVANE_API KMIDIQueue {
 public:
   // A block that brings this many messages is runaway input: the queue starts over.
   static constexpr int32_t kResetCount = 1025;

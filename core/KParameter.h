@@ -3,11 +3,12 @@
 #include <atomic>
 
 #include "core/KAudioPluginBase.h"
+#include "kernel/KExport.h"
 
 // The value object of a parameter: holds the normalised value (atomic, so any thread may read
 // it) and derives the working value from it; setting marks the plug-in's update
 // pending so that the audio thread recomputes what depends on it before the next sub-block.
-class KParameterValue {
+class TORVANE_API KParameterValue {
 public:
   KParameterValue(KAudioPluginBase& owner, const KValueKind& kind, double normalized) noexcept;
   KParameterValue(const KParameterValue&) = delete;
@@ -27,7 +28,7 @@ private:
   std::atomic<double> normalized_;
 };
 
-class KAudioPluginBase::Parameter {
+class TORVANE_API KAudioPluginBase::Parameter {
 public:
   // Gesture notices a plug-in sends to its host around a user's edit.
   static constexpr int32_t kTouch = 0;

@@ -3,6 +3,7 @@
 #include <string>
 
 #include "core/Element.h"
+#include "kernel/KExport.h"
 #include "kernel/KStringList.h"
 
 class KModule;
@@ -26,7 +27,7 @@ class KModule;
 //
 // Children of the root other than "Preset" are kept as they are; of several presets with one
 // name, the first counts.
-class KPresetStore {
+class TORVANE_API KPresetStore {
 public:
   // The files of `module`'s plug-in; creates its data folders (KException when it cannot).
   explicit KPresetStore(const KModule& module);

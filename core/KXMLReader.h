@@ -6,6 +6,7 @@
 
 #include "core/Element.h"
 #include "kernel/KArray.h"
+#include "kernel/KExport.h"
 #include "kernel/KString.h"
 
 // Builds a settings tree from XML text in UTF-8, with or without a byte-order mark (malformed
@@ -47,7 +48,7 @@
 //   No root element found.
 // where '{0}' holds up to 20 characters of the text from the point of failure: the offending
 // character, or the start of the construct that is malformed or unfinished.
-class KXMLReader {
+class TORVANE_API KXMLReader {
 public:
   static constexpr int32_t kExcerptCharacters = 20;
 

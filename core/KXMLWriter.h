@@ -3,6 +3,7 @@
 #include <string>
 
 #include "core/Element.h"
+#include "kernel/KExport.h"
 #include "kernel/KString.h"
 
 // Turns a settings tree into XML text.
@@ -37,7 +38,7 @@
 // Failures (KException): "Unsupported XML encoding. '{0}'", "Invalid XML name. '{0}'" (empty,
 // or a character a name may not hold), "XML name cannot be written in encoding {1}. '{0}'",
 // and "Elements nested more than 256 deep. '{0}'" with the name of the element too deep.
-class KXMLWriter {
+class TORVANE_API KXMLWriter {
 public:
   enum Layout { kIndented, kCompact };
 

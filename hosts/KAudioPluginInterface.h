@@ -6,6 +6,7 @@
 
 #include "core/KClock.h"
 #include "kernel/KArray.h"
+#include "kernel/KExport.h"
 #include "kernel/KString.h"
 
 class KAudioPlugin;
@@ -14,7 +15,7 @@ class KAudioPlugin;
 // derives from it and fills the virtual operations with its format's calls. The common logic
 // lives here: a parameter the plug-in sends stays "touched" until no value has come for more
 // than a second, so that the host sees a begin and an end around every burst of changes.
-class KAudioPluginInterface {
+class TORVANE_API KAudioPluginInterface {
 public:
   static constexpr uint64_t kGestureTimeoutMs = 1001;
   // Latency requests: report when changed, or report in any case.

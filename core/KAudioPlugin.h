@@ -92,6 +92,10 @@ protected:
   virtual void Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) = 0;
   // Clears the plug-in's own processing state.
   virtual void ResetState() {}
+  // The plug-in's own settings beyond its parameters (a compressor's transfer graph, say), in
+  // its section of the state document; both directions, as the flags say. Values equal to
+  // their defaults are not stored, and loading from an element without them restores defaults.
+  virtual void StorePluginSettings(Element& /*section*/, uint32_t /*flags*/) {}
   void SetOversampling(int32_t factor) noexcept { oversampling_.store(factor > 1 ? factor : 1, std::memory_order_relaxed); }
 
 private:

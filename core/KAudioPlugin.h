@@ -12,11 +12,17 @@
 #include "kernel/KExport.h"
 #include "kernel/KString.h"
 
+class Element;
+
 // The base of every plug-in of the catalogue: parameters and ramps (KAudioPluginBase), MIDI
 // input (KMIDIProcessor) and the processing cycle that turns each host block into calls of the
 // plug-in's own Process, cut at ramp break points and, when asked, at MIDI events.
 class TORVANE_API KAudioPlugin : public KAudioPluginBase, public KMIDIProcessor {
 public:
+  // Flag bits of the state routines, which serve both directions.
+  static constexpr uint32_t kStore = 1u << 0;           // set: store into the element; clear: load from it
+  static constexpr uint32_t kRemoveDefaults = 1u << 2;  // storing: drop attributes that went back to default
+
   // What a plug-in is, as hosts see it.
   struct Shape {
     int32_t inputBuses;   // 0 for an instrument; 2 when the second bus is a side-chain input

@@ -2,11 +2,12 @@
 
 #include <cstdint>
 
+#include "kernel/KExport.h"
 #include "kernel/KString.h"
 
 // The system's one exception class. The message is meant for the user: whole sentences
 // ending in a full stop. Thrown by value, caught by reference.
-class KException {
+class TORVANE_API KException {
 public:
   explicit KException(KString message, KString context = {}, int64_t code = 0) noexcept
       : context_(std::move(context)), message_(std::move(message)), code_(code) {}

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "kernel/KExport.h"
 #include "kernel/KHashIndex.h"
 #include "kernel/KStringList.h"
 
@@ -18,7 +19,7 @@ struct KPluginRecord {
 
 // A table from identifier to factory: hash index for exact names, records in registration
 // order for the prefix scan, and the keys in that order for callers that list them.
-class KPluginRegistry {
+class TORVANE_API KPluginRegistry {
 public:
   KPluginRegistry() = default;
   KPluginRegistry(const KPluginRegistry&) = delete;

@@ -4,6 +4,7 @@
 #include <mutex>
 
 #include "kernel/KCatalogue.h"
+#include "kernel/KExport.h"
 
 struct KFileType {
   KString description;
@@ -15,7 +16,7 @@ struct KIsRelocatable<KFileType> : std::true_type {};
 // The main plug-in registry, the effect-module registry, the file types and the pipeline host
 // names, built together from a catalogue on first use and read-only afterwards, so that
 // lookups take no lock.
-class KRegistries {
+class TORVANE_API KRegistries {
 public:
   // Module categories in the order the module registry lists them.
   static constexpr const char* kCategories[] = {"Dynamics",   "EQs & Filters", "Distortion", "Reverb & Delay",

@@ -7,9 +7,14 @@
 #include <string_view>
 #include <vector>
 
+#include "kernel/KExport.h"
+
 // Every call into the operating system goes through here, one implementation per system
 // (kernel/platform/<system>/). The rest of the kernel never includes an OS header.
 namespace KPlatform {
+
+// Whether the standard error stream is a terminal (where progress may be drawn).
+TORVANE_API bool IsErrorStreamTerminal() noexcept;
 
 // Milliseconds from a monotonic clock (the stamp of processing blocks and automation gestures).
 uint64_t MillisecondClock() noexcept;
@@ -57,10 +62,10 @@ void WriteFileAtomically(const std::string& path, std::string_view contents);
 void InjectAtomicWriteFailures(int count) noexcept;
 
 // Moves a file, replacing one at `to`. "Could not rename the file '{0}' to '{1}' ({2})."
-void RenameFile(const std::string& from, const std::string& to);
+TORVANE_API void RenameFile(const std::string& from, const std::string& to);
 
 // Answers false when there was no such file. "Could not remove the file '{0}' ({1})."
-bool RemoveFile(const std::string& path);
+TORVANE_API bool RemoveFile(const std::string& path);
 
 // Names of the regular files in the folder (hidden ones included, sub-folders not), sorted
 // by byte value; a missing folder holds none. "Could not list the folder '{0}' ({1})."

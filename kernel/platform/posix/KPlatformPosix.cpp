@@ -83,6 +83,8 @@ void SyncFolderOf(const std::string& path) {
 }
 }  // namespace
 
+bool KPlatform::IsErrorStreamTerminal() noexcept { return ::isatty(STDERR_FILENO) == 1; }
+
 uint64_t KPlatform::MillisecondClock() noexcept {
   timespec now{};
   clock_gettime(CLOCK_MONOTONIC, &now);

@@ -1,0 +1,49 @@
+#include "tools/KCliArguments.h"
+
+#include <algorithm>
+
+#include "kernel/KException.h"
+
+void KCliFail(const std::string& message) { throw KException(KString::FromUtf8(message)); }
+
+KCliArguments::KCliArguments(std::span<char* const> words, std::string_view command,
+                             std::initializer_list<std::string_view> withValue, std::initializer_list<std::string_view> flags) {
+  auto named = [](std::initializer_list<std::string_view> names, std::string_view name) {
+    return std::find(names.begin(), names.end(), name) != names.end();
+  };
+  for (size_t i = 0; i < words.size(); ++i) {
+    const std::string_view word = words[i];
+    if (word.size() < 3 || word.substr(0, 2) != "--") {
+      positional_.emplace_back(word);
+      continue;
+    }
+    std::string_view name = word.substr(2);
+    std::optional<std::string> value;
+    if (const size_t equals = name.find('='); equals != std::string_view::npos) {
+      value = std::string(name.substr(equals + 1));
+      name = name.substr(0, equals);
+    }
+    if (named(flags, name)) {
+      if (value) KCliFail("The option '--" + std::string(name) + "' takes no value.");
+      options_.push_back({std::string(name), {}});
+    } else if (named(withValue, name)) {
+      if (!value) {
+        if (i + 1 >= words.size()) KCliFail("The option '--" + std::string(name) + "' needs a value.");
+        value = words[++i];
+      }
+      options_.push_back({std::string(name), *value});
+    } else {
+      KCliFail("Unknown option '--" + std::string(name) + "' for '" + std::string(command) + "'.");
+    }
+  }
+}
+
+bool KCliArguments::Has(std::string_view name) const noexcept {
+  return std::any_of(options_.begin(), options_.end(), [&](const Option& o) { return o.name == name; });
+}
+
+std::optional<std::string> KCliArguments::Last(std::string_view name) const {
+  for (auto o = options_.rbegin(); o != options_.rend(); ++o)
+    if (o->name == name) return o->value;
+  return std::nullopt;
+}

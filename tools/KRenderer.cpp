@@ -1,0 +1,147 @@
+#include "tools/KRenderer.h"
+
+#include <algorithm>
+#include <chrono>
+#include <cmath>
+#include <cstdio>
+#include <random>
+
+#include "tools/KCliArguments.h"
+
+namespace {
+
+constexpr int32_t kMaxBlock = 512;
+
+// Planar channel buffers for one block, filled from an interleaved source (silence past its end).
+class BlockBuffers {
+public:
+  BlockBuffers(int32_t channels, int32_t frames) : planes_(static_cast<size_t>(channels), std::vector<float>(static_cast<size_t>(frames))) {
+    for (auto& plane : planes_) pointers_.push_back(plane.data());
+  }
+  float* const* Pointers() noexcept { return pointers_.data(); }
+  std::vector<float>& Plane(int32_t channel) noexcept { return planes_[static_cast<size_t>(channel)]; }
+  int32_t Channels() const noexcept { return static_cast<int32_t>(planes_.size()); }
+
+  // Reads n frames of `source` into the planes; a source with fewer channels repeats its last.
+  void Fill(KAudioSource& source, int32_t n, std::vector<float>& scratch) {
+    const int32_t sourceChannels = source.Channels();
+    scratch.resize(static_cast<size_t>(n * sourceChannels));
+    const int64_t read = source.Read(scratch.data(), n);
+    for (int32_t c = 0; c < Channels(); ++c) {
+      const int32_t from = std::min(c, sourceChannels - 1);
+      float* plane = pointers_[static_cast<size_t>(c)];
+      for (int64_t i = 0; i < read; ++i) plane[i] = scratch[static_cast<size_t>(i * sourceChannels + from)];
+      std::fill(plane + read, plane + n, 0.0f);
+    }
+  }
+
+private:
+  std::vector<std::vector<float>> planes_;
+  std::vector<float*> pointers_;
+};
+
+// Value of a lane at a sample position, in the normalised domain.
+double LaneValue(const KAutomationLane& lane, double seconds) {
+  const auto& p = lane.points;
+  if (seconds <= p.front().seconds) return p.front().normalized;
+  for (size_t k = 1; k < p.size(); ++k) {
+    if (seconds < p[k].seconds) {
+      const double w = (seconds - p[k - 1].seconds) / (p[k].seconds - p[k - 1].seconds);
+      return p[k - 1].normalized + (p[k].normalized - p[k - 1].normalized) * w;
+    }
+  }
+  return p.back().normalized;
+}
+
+// The lane over one block as a ramp: its value at the block start, every break point inside
+// the block, and its value at the block end.
+void AddBlockRamp(KAudioPlugin& plugin, const KAutomationLane& lane, int64_t start, int32_t n, double rate) {
+  KAudioPluginBase::RampPoint points[ParameterRamp::kMaxPoints];
+  int32_t count = 0;
+  points[count++] = {0, LaneValue(lane, static_cast<double>(start) / rate)};
+  for (const KAutomationLane::Point& point : lane.points) {
+    const double at = point.seconds * rate - static_cast<double>(start);
+    if (at > 0.0 && at < n && count < ParameterRamp::kMaxPoints - 1) points[count++] = {static_cast<int32_t>(std::lround(at)), point.normalized};
+  }
+  points[count++] = {n, LaneValue(lane, static_cast<double>(start + n) / rate)};
+  plugin.AddRamp(lane.parameter, std::span(points, static_cast<size_t>(count)), false);
+}
+
+class Progress {
+public:
+  explicit Progress(bool enabled) : enabled_(enabled), begun_(std::chrono::steady_clock::now()) {}
+  void Show(double fraction) {
+    if (!enabled_) return;
+    const auto now = std::chrono::steady_clock::now();
+    if (now - begun_ < std::chrono::seconds(1) || now - shown_ < std::chrono::milliseconds(100)) return;
+    shown_ = now;
+    const int filled = static_cast<int>(fraction * 40.0);
+    std::fprintf(stderr, "\r[%-40.*s] %3d%%", filled, "########################################", static_cast<int>(fraction * 100.0));
+    drawn_ = true;
+  }
+  ~Progress() {
+    if (drawn_) std::fprintf(stderr, "\r%60s\r", "");
+  }
+
+private:
+  bool enabled_;
+  bool drawn_ = false;
+  std::chrono::steady_clock::time_point begun_, shown_;
+};
+
+void Measure(const float* samples, int32_t n, double& peak, double& sumOfSquares) {
+  for (int32_t i = 0; i < n; ++i) {
+    peak = std::max(peak, static_cast<double>(std::fabs(samples[i])));
+    sumOfSquares += static_cast<double>(samples[i]) * samples[i];
+  }
+}
+
+}  // namespace
+
+KRenderSummary KRender(KAudioPlugin& plugin, KAudioSource& input, KAudioFileWriter& output, const KRenderOptions& options) {
+  const double rate = input.SampleRate();
+  const int32_t inputs = plugin.InputChannelCount();
+  const int32_t outputs = plugin.OutputChannelCount();
+  const int32_t mainInputs = plugin.GetShape().inputBuses > 0 ? plugin.ChannelsPerBus() : 0;
+  const int64_t latency = plugin.TotalLatency();
+  const int64_t frames = input.Frames() + static_cast<int64_t>(std::llround(options.tailSeconds * rate));
+
+  BlockBuffers in(std::max(inputs, 1), kMaxBlock), out(outputs, kMaxBlock), sideChain(inputs - mainInputs, kMaxBlock);
+  std::vector<float> scratch, interleaved(static_cast<size_t>(kMaxBlock * outputs));
+  std::mt19937 randomSizes(20261121u);
+  std::uniform_int_distribution<int32_t> anySize(1, kMaxBlock);
+  Progress progress(options.showProgress);
+  KRenderSummary summary;
+  double inputSquares = 0.0, outputSquares = 0.0;
+
+  const auto begun = std::chrono::steady_clock::now();
+  for (int64_t position = 0; position < frames + latency;) {
+    const int32_t n = static_cast<int32_t>(std::min<int64_t>(options.blockSize > 0 ? options.blockSize : anySize(randomSizes), frames + latency - position));
+    in.Fill(input, n, scratch);
+    for (int32_t c = 0; c < mainInputs; ++c) Measure(in.Plane(c).data(), n, summary.inputPeak, inputSquares);
+    if (options.sideChain) {
+      sideChain.Fill(*options.sideChain, n, scratch);
+      for (int32_t c = 0; c < sideChain.Channels(); ++c) std::copy_n(sideChain.Plane(c).data(), n, in.Plane(mainInputs + c).data());
+    }
+    for (const KAutomationLane& lane : options.automation) AddBlockRamp(plugin, lane, position, n, rate);
+    plugin.ProcessHostBlock(inputs > 0 ? in.Pointers() : nullptr, out.Pointers(), n);
+
+    // Drop the first `latency` frames so that the output lines up with the input.
+    const int64_t skip = std::clamp<int64_t>(latency - position, 0, n);
+    const int32_t keep = static_cast<int32_t>(n - skip);
+    for (int32_t c = 0; c < outputs; ++c) {
+      const float* plane = out.Plane(c).data() + skip;
+      Measure(plane, keep, summary.outputPeak, outputSquares);
+      for (int32_t i = 0; i < keep; ++i) interleaved[static_cast<size_t>(i * outputs + c)] = plane[i];
+    }
+    output.Write(interleaved.data(), keep);
+    position += n;
+    progress.Show(static_cast<double>(position) / static_cast<double>(frames + latency));
+  }
+  const double elapsed = std::chrono::duration<double>(std::chrono::steady_clock::now() - begun).count();
+  summary.seconds = static_cast<double>(frames) / rate;
+  summary.inputRms = std::sqrt(inputSquares / std::max<double>(1.0, static_cast<double>(frames) * std::max(mainInputs, 1)));
+  summary.outputRms = std::sqrt(outputSquares / std::max<double>(1.0, static_cast<double>(frames) * outputs));
+  summary.realtimeFactor = elapsed > 0.0 ? summary.seconds / elapsed : 0.0;
+  return summary;
+}

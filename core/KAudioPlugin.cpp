@@ -5,6 +5,7 @@
 
 #include "core/KChannelMode.h"
 #include "core/KDenormals.h"
+#include "core/KParameter.h"
 #include "hosts/KAudioPluginInterface.h"
 #include "kernel/KGuard.h"
 #include "kernel/platform/KPlatform.h"
@@ -18,6 +19,8 @@ alignas(16) const float kSilence[KAudioPlugin::kMaxChunk] = {};
 KAudioPlugin::KAudioPlugin(std::span<const KParameterInfo> parameters, const Shape& shape)
     : KAudioPluginBase(parameters), KMIDIProcessor(transport_), shape_(shape) {
   KMIDIProcessor::SetSampleRate(sampleRate_);
+  locked_.Reserve(ParameterCount());
+  for (int32_t i = 0; i < ParameterCount(); ++i) locked_.Append(false);
 }
 
 KAudioPlugin::~KAudioPlugin() = default;
@@ -71,7 +74,12 @@ void KAudioPlugin::ProcessHostBlock(const float* const* inputs, float* const* ou
   bool hasOutputs = outputs != nullptr;
   for (int32_t c = 0; hasOutputs && c < outputCount; ++c) hasOutputs = outputs[c] != nullptr;
   // A host that hands no buffer (or no samples) gets nothing written.
-  if (hasOutputs && sampleCount > 0) {
+  if (hasOutputs && sampleCount > 0 && IsBypassed()) {
+    PassThrough(inputs, outputs, sampleCount);
+    resumeFromBypass_ = true;
+  } else if (hasOutputs && sampleCount > 0) {
+    // Ramps waited while the plug-in rested: their values land at once rather than late.
+    if (std::exchange(resumeFromBypass_, false)) RequestJump();
     ResolveBlockEnd(sampleCount);
     const int32_t chunk = ChunkLength();
     for (int32_t start = 0; start < sampleCount; start += chunk)
@@ -81,6 +89,24 @@ void KAudioPlugin::ProcessHostBlock(const float* const* inputs, float* const* ou
   // stamped past the block's end (a host's mistake): no note hangs, none is carried over.
   ProcessMIDIQueue(midi_, INT32_MAX);
   midi_.Clear();
+}
+
+void KAudioPlugin::PassThrough(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept {
+  // Only the main bus passes: a side-chain is no output, an instrument's output is silent.
+  const int32_t passed = shape_.inputBuses > 0 ? channelsPerBus_ : 0;
+  for (int32_t c = 0; c < OutputChannelCount(); ++c) {
+    const float* in = inputs && c < passed ? inputs[c] : nullptr;
+    if (!in) std::fill_n(outputs[c], sampleCount, 0.0f);
+    else if (in != outputs[c]) std::copy_n(in, sampleCount, outputs[c]);
+  }
+}
+
+void KAudioPlugin::ProcessMIDIController(const KMIDIEvent& event) {
+  // Pitch bend runs from -1 to just below 1; a parameter takes its whole range.
+  const double value = event.number == KMIDIEvent::kPitchBend ? (event.value + 1.0) * 0.5 : event.value;
+  controllers_.ForEachListener(event.number, event.channel, [&](int32_t parameter) {
+    if (parameter < ParameterCount()) GetParameter(parameter).SetNormalized(value);
+  });
 }
 
 int32_t KAudioPlugin::ChunkLength() const noexcept {

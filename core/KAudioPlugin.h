@@ -3,25 +3,36 @@
 #include <atomic>
 #include <cstdint>
 #include <span>
+#include <string>
+#include <string_view>
 
+#include "core/Element.h"
 #include "core/KAudioPluginBase.h"
+#include "core/KControllerMap.h"
+#include "core/KGlobalSettings.h"
 #include "core/KLevelMeter.h"
 #include "core/KMIDIProcessor.h"
 #include "core/KMIDIQueue.h"
 #include "core/KTransport.h"
+#include "core/KUndoHistory.h"
 #include "kernel/KExport.h"
 #include "kernel/KString.h"
+#include "kernel/KStringList.h"
 
-class Element;
+class KModule;
+class KPresetStore;
 
 // The base of every plug-in of the catalogue: parameters and ramps (KAudioPluginBase), MIDI
 // input (KMIDIProcessor) and the processing cycle that turns each host block into calls of the
-// plug-in's own Process, cut at ramp break points and, when asked, at MIDI events.
-class TORVANE_API KAudioPlugin : public KAudioPluginBase, public KMIDIProcessor {
+// plug-in's own Process, cut at ramp break points and, when asked, at MIDI events; and the
+// plug-in's state: the document hosts save with a project, presets and the undo history.
+class TORVANE_API KAudioPlugin : public KAudioPluginBase, public KMIDIProcessor, public KUndoTarget {
 public:
   // Flag bits of the state routines, which serve both directions.
   static constexpr uint32_t kStore = 1u << 0;           // set: store into the element; clear: load from it
   static constexpr uint32_t kRemoveDefaults = 1u << 2;  // storing: drop attributes that went back to default
+  // The root element of a state document.
+  static constexpr const char* kStateRoot = "TorvaneState";
 
   // What a plug-in is, as hosts see it.
   struct Shape {
@@ -46,6 +57,10 @@ public:
   // The name under which the instance was created, exactly as the caller gave it.
   const KString& Identifier() const noexcept { return identifier_; }
   void SetIdentifier(const KString& identifier) { identifier_ = identifier; }
+  // The module whose user data folder holds the presets: the one the registry handed over at
+  // creation, else the module of the identifier. KException for an instance that has neither.
+  void SetModule(KModule* module) noexcept { module_ = module; }
+  KModule& Module() const;
 
   // ---- set-up (not while processing)
   const Shape& GetShape() const noexcept { return shape_; }
@@ -63,6 +78,10 @@ public:
   // ---- settings any thread may change
   void SetChannelMode(int32_t mode) noexcept;
   int32_t ChannelMode() const noexcept { return channelMode_.load(std::memory_order_relaxed); }
+  // Bypassed, the main input goes out unchanged and undelayed (silence for an instrument) and
+  // the plug-in's processing rests; parameter changes meanwhile land at once on return.
+  void SetBypass(bool bypass) noexcept { bypass_.store(bypass, std::memory_order_relaxed); }
+  bool IsBypassed() const noexcept { return bypass_.load(std::memory_order_relaxed); }
   void SetMeterReset(bool reset) noexcept { meterReset_.store(reset, std::memory_order_relaxed); }
   const KLevelMeter& GetMeter(Meter meter) const noexcept { return meters_[meter]; }
   KLevelMeter& GetMeter(Meter meter) noexcept { return meters_[meter]; }
@@ -89,6 +108,89 @@ public:
   // channels. Host buffers are read only; inputs and outputs may be the same buffers. Without
   // output buffers or samples nothing is processed, but the block's MIDI messages still arrive.
   void ProcessHostBlock(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
+  // An assigned controller moves its parameters (see Controllers()); pitch bend is taken as
+  // 0..1 from its full range. Plug-ins that handle controllers themselves call this too.
+  void ProcessMIDIController(const KMIDIEvent& event) override;
+
+  // ---- state document (user-interface thread)
+  // Layout (each section holds only what differs from its defaults):
+  //   <TorvaneState Plugin="identifier" Version="..." global settings...>
+  //     <ProgramChange .../>                      program-change settings
+  //     <Parameters key="working value" .../>     shortest text that reads back exactly
+  //     <PluginSettings .../>                     the plug-in's own (StorePluginSettings)
+  //     <MultiParameters/> <LFOs/> <Arpeggiator/> kept as found, see StoreMultiParameters
+  //     <ParamLock key="1" .../>
+  //     <Controllers flags...><NoteControllers/><Controller Number= Channel= Parameter=/>...</Controllers>
+  //     <ActivePreset Name="..." Current="1"/>
+  //   </TorvaneState>
+  // Stores every section into `root` (named kStateRoot here). kRemoveDefaults in `flags`
+  // cleans a root that holds an earlier state of values that went back to their defaults.
+  void StoreState(Element& root, uint32_t flags = 0);
+  // The state as compact UTF-8 XML text, as every host carries it.
+  std::string WriteState();
+  // Loads a whole state: every value returns to its default and then takes what the document
+  // holds; the values land at once at the next block. A root of another name is refused with a
+  // KException before anything changes.
+  void LoadState(Element root);
+  // All or nothing: the whole text is read first, and a KException from reading leaves the
+  // plug-in exactly as it was.
+  void ReadState(std::string_view text);
+
+  // The section routines. Each serves both directions as `flags` says (kStore,
+  // kRemoveDefaults), with the element of its section.
+  // On the root: the global settings, Version (only stored) and the channel mode first.
+  void StoreGlobal(Element& section, uint32_t flags);
+  // Modulators and the arpeggiator belong to subsystems this product does not have yet. What a
+  // document brings under "MultiParameters", "LFOs" and "Arpeggiator" (and "NoteControllers"
+  // in "Controllers") is kept as found and written back unchanged, so that a state from a
+  // richer version survives a round trip through this one.
+  void StoreMultiParameters(Element& section, uint32_t flags);
+  void StoreLFO(Element& section, uint32_t flags);
+  void StoreArp(Element& section, uint32_t flags);
+  // One "1" attribute per locked parameter key.
+  void StoreParamLock(Element& section, uint32_t flags);
+  void StoreControllers(Element& section, uint32_t flags);
+  void StoreActivePresets(Element& section, uint32_t flags);
+
+  // ---- settings kept with the state (user-interface thread)
+  KGlobalSettings& GlobalSettings() noexcept { return globals_; }
+  // A locked parameter keeps its value when a preset loads.
+  void SetParameterLocked(int32_t index, bool locked) noexcept { locked_[index] = locked; }
+  bool IsParameterLocked(int32_t index) const noexcept { return locked_[index]; }
+  KControllerMap& Controllers() noexcept { return controllers_; }
+
+  // ---- presets, in "presets.xml" of Module()'s user data folder (KException on failure)
+  void SavePreset(const KString& name);
+  // Loads a preset's sound: the parameters but the locked ones, the plug-in's own settings, the
+  // kept modulator sections and, unless DoNotLoadFromPresets is on, the controller
+  // assignments. The instance's global settings and parameter locks stay. One undo step.
+  void LoadPreset(const KString& name);
+  KStringList ListPresets() const;
+  void RenamePreset(const KString& from, const KString& to);
+  void DeletePreset(const KString& name);
+  // The preset the settings came from (empty: none), and whether they are still its settings:
+  // no change was recorded for undo since it was loaded or saved.
+  const KString& ActivePresetName() const noexcept { return activePreset_.name; }
+  bool IsActivePresetCurrent() const noexcept { return activePreset_.current; }
+
+  // ---- undo (user-interface thread); the editor reports every change it makes
+  // `value` is the parameter's normalised value from before the change.
+  void UndoStore(int32_t index, double value) noexcept;
+  // Before a change of the whole settings (randomising, say).
+  void UndoStoreSettings() noexcept;
+  void Undo() noexcept;
+  void Redo() noexcept;
+  bool CanUndo() const noexcept { return undo_.CanUndo(); }
+  bool CanRedo() const noexcept { return undo_.CanRedo(); }
+
+  // KUndoTarget: the history sees normalised values and the whole state document.
+  int32_t GetParameterCount() const override { return ParameterCount(); }
+  double GetParameterValue(int32_t index) const override;
+  void SetParameterValue(int32_t index, double value) override;
+  void StoreSettings(Element& settings) override { StoreState(settings); }
+  void LoadSettings(const Element& settings) override { LoadState(settings); }
+  // The editor, when there is one, reads CanUndo and CanRedo as it draws.
+  void UpdateUndoButtons(bool /*canUndo*/, bool /*canRedo*/) override {}
 
 protected:
   // Recomputes what depends on parameters; called on the audio thread before a sub-block when
@@ -105,6 +207,24 @@ protected:
   void SetOversampling(int32_t factor) noexcept { oversampling_.store(factor > 1 ? factor : 1, std::memory_order_relaxed); }
 
 private:
+  struct ActivePreset {
+    KString name;
+    bool current = false;
+  };
+  // Which sections a load touches: all of them, or a preset's sound only.
+  enum class Scope { kWholeState, kPresetSound };
+
+  // Every section in document order, both directions.
+  void StoreSections(Element& root, uint32_t flags, Scope scope);
+  void StoreParameters(Element& section, uint32_t flags, Scope scope);
+  // KException, before anything changes, for a tree that is not a plug-in state.
+  static void RequireStateRoot(const Element& root);
+  int32_t DefaultChannelMode() const noexcept;
+  // The global current preset follows the active one: its name and its place in the list.
+  void FollowActivePreset(const KPresetStore& store);
+  void TellHostSettingsChanged() noexcept;
+  void PassThrough(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
+
   // Samples of the channel mode's input copies, which live on the stack of the processing call.
   static constexpr int32_t kScratchSamples = 2 * kMaxChunk;
   // The longest piece of a host block processed at once: kMaxChunk, shorter for plug-ins with
@@ -132,4 +252,18 @@ private:
   std::atomic<uint64_t> lastProcessingTime_{0};
   // The channel mode of the current chunk, read once so that routing and restoring agree.
   int32_t chunkMode_ = 0;
+  std::atomic<bool> bypass_{false};
+  bool resumeFromBypass_ = false;  // audio thread
+
+  // State beyond the parameters, user-interface thread unless noted.
+  KModule* module_ = nullptr;
+  KGlobalSettings globals_;
+  KArray<bool> locked_;
+  KControllerMap controllers_;  // read by the audio thread
+  Element multiParameters_;
+  Element lfos_;
+  Element arpeggiator_;
+  Element noteControllers_;
+  ActivePreset activePreset_;
+  KUndoHistory undo_{*this};
 };

@@ -45,5 +45,6 @@ KAudioPlugin* KPluginRegistry::Create(const KString& name, KModule* context) con
   std::unique_ptr<KAudioPlugin> plugin(record->factory(context, record));
   if (!plugin) return nullptr;
   plugin->SetIdentifier(name);
+  plugin->SetModule(context);  // its presets live in the module's data folder
   return plugin.release();
 }

@@ -7,6 +7,6 @@ bash scripts/install-deps.sh
 cmake -S . -B build/release -G Ninja -DCMAKE_BUILD_TYPE=Release -DTORVANE_TESTS=OFF -DTORVANE_BENCHMARKS=OFF
 cmake --build build/release
 if [ $# -eq 0 ]; then
-  set -- render KUtilityPlugin demo-processed.wav --set width=150
+  set -- render KCompressorPlugin demo-compressed.wav
 fi
 ./build/release/tools/torvane "$@"

@@ -3,8 +3,12 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <fstream>
+#include <sstream>
 #include <vector>
 
+#include "core/Element.h"
+#include "core/KXMLWriter.h"
 #include "kernel/KEntryPoints.h"
 #include "kernel/KException.h"
 #include "kernel/KFormat.h"
@@ -91,4 +95,29 @@ void KCliPlugin::Set(const std::string& assignment) {
   if (equals == std::string::npos || equals == 0) KCliFail("--set takes KEY=VALUE, not '" + assignment + "'.");
   KAudioPluginBase::Parameter& parameter = Find(assignment.substr(0, equals));
   parameter.SetWorking(WorkingValue(parameter, assignment.substr(equals + 1)));
+}
+
+void KCliPlugin::LoadPreset(const std::string& path) {
+  std::ifstream file(path, std::ios::binary);
+  if (!file) KCliFail("Cannot read the preset file '" + path + "'.");
+  std::ostringstream text;
+  text << file.rdbuf();
+  try {
+    plugin_->ReadState(text.str());
+  } catch (const KException& failure) {
+    KCliFail("The preset file '" + path + "' cannot be loaded: " + failure.Message().ToUtf8());
+  }
+}
+
+void KCliPlugin::ApplySettings(const KCliArguments& arguments) {
+  for (const KCliArguments::Option& option : arguments.Options()) {
+    if (option.name == "set") Set(option.value);
+    else if (option.name == "preset") LoadPreset(option.value);
+  }
+}
+
+std::string KCliPlugin::StateText() {
+  Element root(KString::Static(KAudioPlugin::kStateRoot));
+  plugin_->StoreState(root);
+  return KXMLWriter::Write(root);
 }

@@ -22,6 +22,14 @@ public:
   // "KEY=VALUE": VALUE in the parameter's working units (a plain number) or as its display
   // text ("Soft", "off", "5 ms"). Takes effect at once, without a glide.
   void Set(const std::string& assignment);
+  // A state document (as `torvane state` prints it) from a file; the reader's message when
+  // the text is malformed, and the plug-in unchanged then.
+  void LoadPreset(const std::string& path);
+  // The --set and --preset options, in the order given, so that a later one overrides.
+  void ApplySettings(const class KCliArguments& arguments);
+  // The state document as `torvane state` prints it.
+  std::string StateText();
+
   // The parameter with this key, or an error naming the close matches.
   KAudioPluginBase::Parameter& Find(const std::string& key);
   // A working value given on the command line, checked against the parameter's range.

@@ -15,3 +15,5 @@ std::span<const KCommand> KCommands();
 int KRunList(std::span<char* const> words);
 int KRunInfo(std::span<char* const> words);
 int KRunRender(std::span<char* const> words);
+int KRunState(std::span<char* const> words);
+int KRunPresets(std::span<char* const> words);

@@ -51,7 +51,7 @@ std::string Decibels(double linear) {
 }  // namespace
 
 int KRunRender(std::span<char* const> words) {
-  const KCliArguments arguments(words, "render", {"set", "automate", "block", "tail", "sidechain", "format"}, {});
+  const KCliArguments arguments(words, "render", {"set", "preset", "automate", "block", "tail", "sidechain", "format"}, {});
   const auto& positional = arguments.Positional();
   if (positional.size() < 2 || positional.size() > 3) KCliFail("'render' takes PLUGIN [INPUT] OUTPUT.");
   KCliPlugin session(positional[0]);
@@ -67,13 +67,12 @@ int KRunRender(std::span<char* const> words) {
     KCliFail(plugin.Identifier().ToUtf8() + " does not run at the sample rate of " + inputName + " (" +
              KFormatText("{0}", input->SampleRate()).ToUtf8() + " Hz).");
 
+  session.ApplySettings(arguments);
   KRenderOptions options;
   KSampleFormat format = KSampleFormat::kDefault;
   std::unique_ptr<KAudioFileReader> sideChain;
   for (const KCliArguments::Option& option : arguments.Options()) {
-    if (option.name == "set") {
-      session.Set(option.value);
-    } else if (option.name == "automate") {
+    if (option.name == "automate") {
       options.automation.push_back(ParseLane(session, option.value));
     } else if (option.name == "block") {
       options.blockSize = option.value == "random" ? 0 : static_cast<int32_t>(NumberOf(option.value, "a block size"));

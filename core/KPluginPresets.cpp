@@ -1,0 +1,85 @@
+// The plug-in's presets and its undo history: what the editor offers around the state.
+#include "core/KAudioPlugin.h"
+#include "core/KParameter.h"
+#include "core/KPresetStore.h"
+#include "hosts/KAudioPluginInterface.h"
+#include "kernel/KException.h"
+#include "kernel/KGuard.h"
+#include "kernel/KModule.h"
+
+KModule& KAudioPlugin::Module() const {
+  if (module_) return *module_;
+  if (identifier_.IsEmpty()) throw KException("This plug-in has no name, so it has no folder for presets.");
+  return *KModuleMap::Instance().Acquire(identifier_);
+}
+
+void KAudioPlugin::FollowActivePreset(const KPresetStore& store) {
+  globals_.preset = activePreset_.name;
+  globals_.presetIndex = activePreset_.name.IsEmpty() ? -1 : store.ListNames().IndexOf(activePreset_.name);
+}
+
+void KAudioPlugin::TellHostSettingsChanged() noexcept {
+  KGuard("KAudioPlugin::TellHostSettingsChanged", [this] {
+    if (KAudioPluginInterface* host = Interface()) host->NotifyPresetChanged();
+  });
+}
+
+void KAudioPlugin::SavePreset(const KString& name) {
+  KPresetStore store(Module());
+  Element state;
+  StoreState(state);
+  store.Store(name, state);
+  activePreset_ = {name, true};
+  FollowActivePreset(store);
+}
+
+void KAudioPlugin::LoadPreset(const KString& name) {
+  KPresetStore store(Module());
+  Element preset = store.Load(name);  // a preset that cannot be read changes nothing
+  RequireStateRoot(preset);
+  undo_.UndoStoreSettings();
+  StoreSections(preset, 0, Scope::kPresetSound);
+  RequestJump();
+  activePreset_ = {name, true};
+  FollowActivePreset(store);
+  TellHostSettingsChanged();
+}
+
+KStringList KAudioPlugin::ListPresets() const { return KPresetStore(Module()).ListNames(); }
+
+void KAudioPlugin::RenamePreset(const KString& from, const KString& to) {
+  KPresetStore store(Module());
+  store.Rename(from, to);
+  if (activePreset_.name == from) activePreset_.name = to;
+  FollowActivePreset(store);
+}
+
+void KAudioPlugin::DeletePreset(const KString& name) {
+  KPresetStore store(Module());
+  store.Delete(name);
+  if (activePreset_.name == name) activePreset_ = {};
+  FollowActivePreset(store);
+}
+
+double KAudioPlugin::GetParameterValue(int32_t index) const { return GetParameter(index).Normalized(); }
+void KAudioPlugin::SetParameterValue(int32_t index, double value) { GetParameter(index).SetNormalized(value); }
+
+void KAudioPlugin::UndoStore(int32_t index, double value) noexcept {
+  undo_.UndoStore(index, value);
+  activePreset_.current = false;
+}
+
+void KAudioPlugin::UndoStoreSettings() noexcept {
+  undo_.UndoStoreSettings();  // the snapshot still says the preset was current
+  activePreset_.current = false;
+}
+
+void KAudioPlugin::Undo() noexcept {
+  undo_.Undo();
+  TellHostSettingsChanged();
+}
+
+void KAudioPlugin::Redo() noexcept {
+  undo_.Redo();
+  TellHostSettingsChanged();
+}

@@ -1,0 +1,189 @@
+#include "plugins/warmer/KSampleWarmer.h"
+
+#include <algorithm>
+#include <cmath>
+
+#include "core/KParameter.h"
+
+namespace {
+constexpr const char* kShapeNames[] = {"Soft clip", "Tanh", "Tube"};
+static_assert(std::size(kShapeNames) == KSampleWarmer::kShapeCount);
+
+const KDecibelKind kDriveKind(0.0, 36.0);
+const KListKind kShapeKind(kShapeNames);
+const KLinearKind kToneKind(-100.0, 100.0, "%", "{0.0}");
+const KDecibelKind kOutputKind(-24.0, 12.0);
+const KLinearKind kMixKind(0.0, 100.0, "%", "{0.0}");
+constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
+
+constexpr KParameterInfo kParameters[] = {
+    {"drive", "Drive", &kDriveKind, 6.0, kAutomatable},
+    {"shape", "Shape", &kShapeKind, KSampleWarmer::kTube, kAutomatable},
+    {"tone", "Tone", &kToneKind, 0.0, kAutomatable},
+    {"outputgain", "Output gain", &kOutputKind, 0.0, kAutomatable},
+    {"mix", "Dry/wet", &kMixKind, 100.0, kAutomatable},
+};
+static_assert(std::size(kParameters) == KSampleWarmer::kParameterCount);
+
+constexpr KAudioPlugin::Shape kPluginShape{1, 1, false, false, false};
+
+// A gentle slope: the tilt's shelves blend over several octaves about the pivot.
+constexpr double kTiltQ = 0.5;
+// The tube curve's bias: the positive half saturates sooner than the negative one, which adds
+// even harmonics and a level-dependent DC offset (removed behind the curve).
+constexpr double kTubeBias = 0.25;
+
+double Linear(double decibels) { return std::exp(0.11512925464970228 * decibels); }
+
+// x − 4x³/27 up to |x| = 1.5, where it meets ±1 with zero slope.
+void SoftClip(double* samples, int32_t count) noexcept {
+  for (int32_t i = 0; i < count; ++i) {
+    const double x = std::clamp(samples[i], -1.5, 1.5);
+    samples[i] = x - (4.0 / 27.0) * x * x * x;
+  }
+}
+
+void Tanh(double* samples, int32_t count) noexcept {
+  for (int32_t i = 0; i < count; ++i) samples[i] = std::tanh(samples[i]);
+}
+
+// tanh moved off centre, shifted back through the origin and scaled to a slope of 1 there;
+// it ends at +0.80 and −1.32.
+void Tube(double* samples, int32_t count) noexcept {
+  const double offset = std::tanh(kTubeBias);
+  const double scale = 1.0 / (1.0 - offset * offset);
+  for (int32_t i = 0; i < count; ++i) samples[i] = (std::tanh(samples[i] + kTubeBias) - offset) * scale;
+}
+}  // namespace
+
+KSampleWarmer::Curve KSampleWarmer::CurveOf(int32_t shape) noexcept {
+  constexpr Curve kCurves[] = {&SoftClip, &Tanh, &Tube};
+  return kCurves[std::clamp(shape, 0, kShapeCount - 1)];
+}
+
+int32_t KSampleWarmer::OversamplingFor(double sampleRate) noexcept { return sampleRate < 88200.0 ? 4 : 2; }
+
+KSampleWarmer::KSampleWarmer() : KAudioPlugin(kParameters, kPluginShape) { Configure(); }
+
+KAudioPlugin* KSampleWarmer::Create(KModule*, const KPluginRecord*) { return new KSampleWarmer; }
+
+bool KSampleWarmer::SetSampleRate(double sampleRate) {
+  if (!KAudioPlugin::SetSampleRate(sampleRate)) return false;
+  Configure();
+  return true;
+}
+
+void KSampleWarmer::Configure() noexcept {
+  const int32_t factor = OversamplingFor(SampleRate());
+  for (KHalfBandOversampler& oversampler : oversamplers_) oversampler.SetFactor(factor);
+  latency_ = KHalfBandOversampler::LatencyFor(factor);
+  ClearDelay();
+  filters_.Reset();
+  jump_ = true;
+  // The core counts latency at the processing rate and divides by the factor for hosts.
+  SetOversampling(factor);
+  ReportLatency(latency_ * factor);
+}
+
+void KSampleWarmer::ClearDelay() noexcept {
+  for (auto& channel : delay_) std::fill(std::begin(channel), std::end(channel), 0.0f);
+  delayAt_ = 0;
+}
+
+void KSampleWarmer::ResetState() {
+  for (KHalfBandOversampler& oversampler : oversamplers_) oversampler.Reset();
+  filters_.Reset();
+  ClearDelay();
+  jump_ = true;
+}
+
+void KSampleWarmer::Glide::Aim(double to, int32_t samples, bool jump) noexcept {
+  target = to;
+  if (jump) {
+    value = to;
+    left = 0;
+  } else {
+    left = samples;
+    step = (to - value) / samples;
+  }
+}
+
+void KSampleWarmer::Glide::Fill(double* values, int32_t count) noexcept {
+  const int32_t gliding = std::min(left, count);
+  for (int32_t i = 0; i < gliding; ++i) values[i] = value += step;
+  left -= gliding;
+  if (left == 0) value = target;  // no rounding drift past the glide
+  std::fill(values + gliding, values + count, value);
+}
+
+void KSampleWarmer::ProcessUpdate() {
+  const double rate = SampleRate();
+  const int32_t glide = std::max(1, static_cast<int32_t>(rate * kGlideSeconds));
+  drive_.Aim(Linear(GetParameter(kDrive).Working()), glide, jump_);
+  output_.Aim(Linear(GetParameter(kOutputGain).Working()), glide, jump_);
+  mix_.Aim(GetParameter(kMix).Working() / 100.0, glide, jump_);
+  jump_ = false;
+
+  const int32_t shape = static_cast<int32_t>(std::lround(GetParameter(kShape).Working()));
+  curve_ = CurveOf(shape);
+  // At very low rates the pivot stays well below the Nyquist frequency.
+  const double pivot = std::min(kTiltHz, 0.25 * rate);
+  const double tilt = kTiltDb * GetParameter(kTone).Working() / 100.0;
+  sections_[0].Design(KFilterSection::kLowShelf, -tilt, pivot, rate, kTiltQ);
+  sections_[1].Design(KFilterSection::kHighShelf, tilt, pivot, rate, kTiltQ);
+  sections_[2].Design(KFilterSection::kBilinearHighPass, 0.0, kDCBlockerHz, rate, 1.0);
+  // Only the asymmetric curve makes DC; the others keep their low end untouched.
+  filters_.SetSections(sections_, shape == kTube ? 3 : 2);
+}
+
+void KSampleWarmer::Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) {
+  const int32_t channels = std::min(ChannelsPerBus(), kChannels);
+  const float* in[kChannels];
+  float* out[kChannels];
+  for (int32_t done = 0; done < sampleCount; done += kPiece) {
+    for (int32_t c = 0; c < channels; ++c) {
+      in[c] = inputs[c] + done;
+      out[c] = outputs[c] + done;
+    }
+    ProcessPiece(in, out, channels, std::min(kPiece, sampleCount - done));
+  }
+}
+
+void KSampleWarmer::ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels,
+                                 int32_t frames) noexcept {
+  drive_.Fill(driveGain_, frames);
+  output_.Fill(outputGain_, frames);
+  mix_.Fill(wetShare_, frames);
+  const int32_t factor = oversamplers_[0].Factor();
+  constexpr int32_t kMask = kDelaySize - 1;
+
+  // Every channel's input is read before any output is written: hosts may hand the same
+  // buffers for both.
+  for (int32_t c = 0; c < channels; ++c) {
+    const float* input = inputs[c];
+    float* line = delay_[c];
+    for (int32_t i = 0, at = delayAt_; i < frames; ++i, at = (at + 1) & kMask) {
+      const float x = std::isfinite(input[i]) ? input[i] : 0.0f;
+      line[at] = x;
+      dry_[c][i] = line[(at - latency_) & kMask];
+      base_[i] = x * driveGain_[i];
+    }
+    oversamplers_[c].Up(base_, high_, frames);
+    curve_(high_, factor * frames);
+    oversamplers_[c].Down(high_, base_, frames);
+    for (int32_t i = 0; i < frames; ++i) wet_[c][i] = static_cast<float>(base_[i]);
+  }
+  delayAt_ = (delayAt_ + frames) & kMask;
+
+  float* wet[kChannels] = {wet_[0], wet_[1]};
+  const float* wetIn[kChannels] = {wet_[0], wet_[1]};
+  filters_.Process(wetIn, wet, channels, frames);
+
+  for (int32_t c = 0; c < channels; ++c) {
+    float* output = outputs[c];
+    for (int32_t i = 0; i < frames; ++i) {
+      const double share = wetShare_[i];
+      output[i] = static_cast<float>(outputGain_[i] * ((1.0 - share) * dry_[c][i] + share * wet_[c][i]));
+    }
+  }
+}

@@ -1,11 +1,13 @@
 #!/usr/bin/env bash
 # Installs every package the build, the tests and the benchmarks need (Debian 12).
+# With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in.
 set -euo pipefail
 SUDO=""
 [ "$(id -u)" -eq 0 ] || SUDO="sudo"
 export DEBIAN_FRONTEND=noninteractive
+packages=(ca-certificates g++ cmake ninja-build pkg-config
+  libgtest-dev libgmock-dev libbenchmark-dev libsndfile1-dev
+  clang libclang-rt-14-dev)
+[ "${1:-}" = "--hosts" ] && packages+=(ardour)
 $SUDO apt-get update -q
-$SUDO apt-get install -y -q --no-install-recommends \
-  ca-certificates g++ cmake ninja-build pkg-config \
-  libgtest-dev libgmock-dev libbenchmark-dev libsndfile1-dev \
-  clang libclang-rt-14-dev
+$SUDO apt-get install -y -q --no-install-recommends "${packages[@]}"

@@ -4,7 +4,7 @@
 # ThreadSanitizer.
 set -euo pipefail
 cd "$(dirname "$0")/.."
-bash scripts/install-deps.sh
+bash scripts/install-deps.sh --hosts
 jobs=$(nproc)
 
 # run_suite NAME "CTEST ARGS" CMAKE ARGS...

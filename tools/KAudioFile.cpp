@@ -81,8 +81,11 @@ KAudioFileWriter::KAudioFileWriter(const std::string& path, KSampleFormat format
 }
 
 KAudioFileWriter::~KAudioFileWriter() {
-  if (!file_) return;
-  Close();
+  if (file_) Close();
+  if (!committed_) RemoveTemporary();
+}
+
+void KAudioFileWriter::RemoveTemporary() noexcept {
   try {
     KPlatform::RemoveFile(temporary_);
   } catch (...) {
@@ -102,5 +105,6 @@ void KAudioFileWriter::Write(const float* interleaved, int64_t frames) {
 
 void KAudioFileWriter::Commit() {
   Close();
-  KPlatform::RenameFile(temporary_, path_);
+  KPlatform::RenameFile(temporary_, path_);  // when this throws, the destructor removes the temporary file
+  committed_ = true;
 }

@@ -49,8 +49,10 @@ public:
 
 private:
   void Close() noexcept;
+  void RemoveTemporary() noexcept;
 
   std::string path_;
   std::string temporary_;
   sf_private_tag* file_ = nullptr;
+  bool committed_ = false;  // the temporary file has become the output
 };

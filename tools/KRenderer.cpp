@@ -22,12 +22,13 @@ public:
   std::vector<float>& Plane(int32_t channel) noexcept { return planes_[static_cast<size_t>(channel)]; }
   int32_t Channels() const noexcept { return static_cast<int32_t>(planes_.size()); }
 
-  // Reads n frames of `source` into the planes; a source with fewer channels repeats its last.
-  void Fill(KAudioSource& source, int32_t n, std::vector<float>& scratch) {
+  // Reads n frames of `source` into the first `channels` planes; a source with fewer channels
+  // repeats its last. The other planes are left as they are.
+  void Fill(KAudioSource& source, int32_t n, std::vector<float>& scratch, int32_t channels) {
     const int32_t sourceChannels = source.Channels();
     scratch.resize(static_cast<size_t>(n * sourceChannels));
     const int64_t read = source.Read(scratch.data(), n);
-    for (int32_t c = 0; c < Channels(); ++c) {
+    for (int32_t c = 0; c < channels; ++c) {
       const int32_t from = std::min(c, sourceChannels - 1);
       float* plane = pointers_[static_cast<size_t>(c)];
       for (int64_t i = 0; i < read; ++i) plane[i] = scratch[static_cast<size_t>(i * sourceChannels + from)];
@@ -64,7 +65,8 @@ void AddBlockRamp(KAudioPlugin& plugin, const KAutomationLane& lane, int64_t sta
     if (at > 0.0 && at < n && count < ParameterRamp::kMaxPoints - 1) points[count++] = {static_cast<int32_t>(std::lround(at)), point.normalized};
   }
   points[count++] = {n, LaneValue(lane, static_cast<double>(start + n) / rate)};
-  plugin.AddRamp(lane.parameter, std::span(points, static_cast<size_t>(count)), false);
+  // Fine sub-blocks: the rendered automation does not depend on the block size.
+  plugin.AddRamp(lane.parameter, std::span(points, static_cast<size_t>(count)), true);
 }
 
 class Progress {
@@ -117,10 +119,11 @@ KRenderSummary KRender(KAudioPlugin& plugin, KAudioSource& input, KAudioFileWrit
   const auto begun = std::chrono::steady_clock::now();
   for (int64_t position = 0; position < frames + latency;) {
     const int32_t n = static_cast<int32_t>(std::min<int64_t>(options.blockSize > 0 ? options.blockSize : anySize(randomSizes), frames + latency - position));
-    in.Fill(input, n, scratch);
+    // The side-chain bus stays silent unless a side-chain file feeds it.
+    in.Fill(input, n, scratch, mainInputs);
     for (int32_t c = 0; c < mainInputs; ++c) Measure(in.Plane(c).data(), n, summary.inputPeak, inputSquares);
     if (options.sideChain) {
-      sideChain.Fill(*options.sideChain, n, scratch);
+      sideChain.Fill(*options.sideChain, n, scratch, sideChain.Channels());
       for (int32_t c = 0; c < sideChain.Channels(); ++c) std::copy_n(sideChain.Plane(c).data(), n, in.Plane(mainInputs + c).data());
     }
     for (const KAutomationLane& lane : options.automation) AddBlockRamp(plugin, lane, position, n, rate);

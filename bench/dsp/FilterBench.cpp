@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <vector>
 
+#include "bench/SampleCounters.h"
 #include "dsp/KFilterSection.h"
 #include "dsp/KSectionRunner.h"
 
@@ -41,9 +42,10 @@ struct Blocks {
 
 void Report(benchmark::State& state, int32_t channels) {
   state.SetItemsProcessed(state.iterations() * kBlock * channels);  // samples of one channel
+  KCountPerSampleChannel(state, static_cast<int64_t>(kBlock) * channels);
 }
 
-void BM_Runner(benchmark::State& state) {
+void BM_SectionRunner(benchmark::State& state) {
   const auto channels = static_cast<int32_t>(state.range(0)), count = static_cast<int32_t>(state.range(1));
   const std::vector<KFilterSection> sections = Equalizer(count);
   KSectionRunner runner;
@@ -71,7 +73,7 @@ struct PlainBiquad {
   }
 };
 
-void BM_PlainReference(benchmark::State& state) {
+void BM_SectionReference(benchmark::State& state) {
   const auto channels = static_cast<int32_t>(state.range(0)), count = static_cast<int32_t>(state.range(1));
   std::vector<std::vector<PlainBiquad>> filters(static_cast<size_t>(channels));
   for (auto& bands : filters) {
@@ -98,8 +100,8 @@ void Shapes(benchmark::internal::Benchmark* b) {
   }
   b->ArgNames({"channels", "sections"});
 }
-BENCHMARK(BM_Runner)->Apply(Shapes);
-BENCHMARK(BM_PlainReference)->Apply(Shapes);
+BENCHMARK(BM_SectionRunner)->Apply(Shapes);
+BENCHMARK(BM_SectionReference)->Apply(Shapes);
 
 // One design per iteration at a frequency that moves, so that nothing is folded away.
 void BM_Design(benchmark::State& state) {

@@ -2,13 +2,17 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstddef>
 #include <cstdint>
+#include <utility>
 #include <vector>
 
+#include "bench/SampleCounters.h"
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
 #include "dsp/KDynamicsProcessor.h"
 #include "dsp/KFilterSection.h"
+#include "dsp/KHalfBandOversampler.h"
 #include "plugins/compressor/KCompressorPlugin.h"
 #include "plugins/equalizer/KEqualizerPlugin.h"
 #include "plugins/warmer/KSampleWarmer.h"
@@ -213,30 +217,109 @@ void BM_WarmerHostBlock(benchmark::State& state) {
     benchmark::ClobberMemory();
   }
   Report(state, kLength);
+  KCountPerSampleChannel(state, 2 * kLength);
 }
 BENCHMARK(BM_WarmerHostBlock)->ArgName("shape")->DenseRange(0, KSampleWarmer::kShapeCount - 1);
 
-// The plain way: the same drive and curve at the base rate, in a direct loop, without
-// oversampling, tone or mix.
-void BM_WarmerReference(benchmark::State& state) {
-  constexpr int32_t kLength = 512;
-  const KSampleWarmer::Curve curve = KSampleWarmer::CurveOf(static_cast<int32_t>(state.range(0)));
+// One doubling's half-band low-pass as its full FIR of 4·pairs − 1 taps, zeros and all, designed
+// as KHalfBandOversampler designs it: a Kaiser-windowed sinc with the taps beside the centre's 1/2
+// scaled to sum to 1/4; `gain` 2 makes the interpolator's taps.
+std::vector<double> FullHalfBand(int32_t pairs, double beta, double gain) {
+  const auto bessel = [](double x) {  // I0, by its power series
+    double sum = 1.0, term = 1.0;
+    for (int k = 1; k < 100 && term > 1e-17 * sum; ++k) sum += term *= (x / (2.0 * k)) * (x / (2.0 * k));
+    return sum;
+  };
+  std::vector<double> taps(static_cast<size_t>(4 * pairs - 1));
+  const auto centre = static_cast<size_t>(2 * pairs - 1);
+  double sum = 0.0;
+  for (int32_t j = 0; j < pairs; ++j) {
+    const double offset = 2.0 * j + 1.0, r = offset / (2.0 * pairs);
+    const double window = bessel(beta * std::sqrt(1.0 - r * r)) / bessel(beta);
+    const double tap = (j % 2 == 0 ? 1.0 : -1.0) / (3.141592653589793 * offset) * window;
+    taps[centre + 2 * j + 1] = taps[centre - 2 * j - 1] = tap;
+    sum += tap;
+  }
+  for (double& tap : taps) tap = tap * (0.25 / sum) * gain;
+  taps[centre] = gain * 0.5;
+  return taps;
+}
+
+// A full FIR computing every output; the last taps − 1 samples of the stream wait before each block.
+struct KPlainFir {
+  KPlainFir(std::vector<double> h, size_t longest) : taps(std::move(h)), line(taps.size() - 1 + longest) {}
+  void Run(const double* in, double* out, size_t n) {  // `out` may be `in`
+    const size_t past = taps.size() - 1;
+    std::copy(in, in + n, line.begin() + static_cast<std::ptrdiff_t>(past));
+    for (size_t i = 0; i < n; ++i) {
+      double y = 0.0;
+      for (size_t k = 0; k <= past; ++k) y += taps[k] * line[i + past - k];
+      out[i] = y;
+    }
+    std::copy_n(line.begin() + static_cast<std::ptrdiff_t>(n), past, line.begin());
+  }
+  std::vector<double> taps, line;
+};
+
+// One channel of the saturator at 4x written plainly: each doubling zero-stuffs and runs its full
+// FIR over every sample; the curve is looked up by shape for every sample and run on it alone;
+// each halving runs its full FIR for every sample and keeps every second output (the phases
+// KHalfBandOversampler takes at 4x: the inner halving keeps the first of each pair, the outer
+// one the second, which makes the round trip a whole number of base samples).
+struct KPlainSaturator {
+  static constexpr double kOuterBeta = 8.44, kInnerBeta = 10.09;  // KHalfBandOversampler's windows
+  explicit KPlainSaturator(size_t longest)
+      : outerUp(FullHalfBand(KHalfBandOversampler::kOuterPairs, kOuterBeta, 2.0), 2 * longest),
+        innerUp(FullHalfBand(KHalfBandOversampler::kInnerPairs, kInnerBeta, 2.0), 4 * longest),
+        innerDown(FullHalfBand(KHalfBandOversampler::kInnerPairs, kInnerBeta, 1.0), 4 * longest),
+        outerDown(FullHalfBand(KHalfBandOversampler::kOuterPairs, kOuterBeta, 1.0), 2 * longest),
+        middle(2 * longest), high(4 * longest) {}
+  void Run(const float* in, float* out, size_t n, double drive, int32_t shape) {
+    for (size_t i = 0; i < 2 * n; ++i) middle[i] = i % 2 == 0 ? drive * in[i / 2] : 0.0;
+    outerUp.Run(middle.data(), middle.data(), 2 * n);
+    for (size_t i = 0; i < 4 * n; ++i) high[i] = i % 2 == 0 ? middle[i / 2] : 0.0;
+    innerUp.Run(high.data(), high.data(), 4 * n);
+    for (size_t i = 0; i < 4 * n; ++i) KSampleWarmer::CurveOf(shape)(&high[i], 1);
+    innerDown.Run(high.data(), high.data(), 4 * n);
+    for (size_t i = 0; i < 2 * n; ++i) middle[i] = high[2 * i];
+    outerDown.Run(middle.data(), middle.data(), 2 * n);
+    for (size_t i = 0; i < n; ++i) out[i] = static_cast<float>(middle[2 * i]);
+  }
+  KPlainFir outerUp, innerUp, innerDown, outerDown;
+  std::vector<double> middle, high;
+};
+
+// Drive, the curve at 4x through KHalfBandOversampler and back, per shape: the saturator's own
+// arithmetic (KSampleWarmer::ProcessPiece without tilt, delay and mix) beside KPlainSaturator, a
+// block of each in turn. "max_difference" is the largest difference between their outputs.
+void BM_WarmerOversampled(benchmark::State& state) {
+  constexpr int32_t kLength = 512, kFactor = 4;
+  const auto shape = static_cast<int32_t>(state.range(0));
+  const KSampleWarmer::Curve curve = KSampleWarmer::CurveOf(shape);
   const double drive = std::pow(10.0, 12.0 / 20.0);
   const KSignal signal;
-  KStereoOut out(kLength);
+  KStereoOut hot(kLength), plain(kLength);
+  KHalfBandOversampler oversamplers[2] = {KHalfBandOversampler(kFactor), KHalfBandOversampler(kFactor)};
+  KPlainSaturator plainChannels[2] = {KPlainSaturator(kLength), KPlainSaturator(kLength)};
+  double base[kLength], high[kFactor * kLength];
   const float* in[4];
-  double samples[kLength];
-  int64_t k = 0;
-  for (auto _ : state) {
-    signal.Block(k++, kLength, in);
-    for (size_t c = 0; c < 2; ++c) {
-      for (int32_t i = 0; i < kLength; ++i) samples[i] = drive * in[c][i];
-      curve(samples, kLength);
-      for (int32_t i = 0; i < kLength; ++i) out.outputs[c][i] = static_cast<float>(samples[i]);
-    }
-    benchmark::ClobberMemory();
-  }
-  Report(state, kLength);
+  KTimePair(
+      state, 2 * kLength,
+      [&](int64_t k) {
+        signal.Block(k, kLength, in);
+        for (size_t c = 0; c < 2; ++c) {
+          for (int32_t i = 0; i < kLength; ++i) base[i] = drive * in[c][i];
+          oversamplers[c].Up(base, high, kLength);
+          curve(high, kFactor * kLength);
+          oversamplers[c].Down(high, base, kLength);
+          for (int32_t i = 0; i < kLength; ++i) hot.outputs[c][i] = static_cast<float>(base[i]);
+        }
+      },
+      [&](int64_t k) {
+        signal.Block(k, kLength, in);
+        for (size_t c = 0; c < 2; ++c) plainChannels[c].Run(in[c], plain.outputs[c], kLength, drive, shape);
+      });
+  state.counters["max_difference"] = KLargestDifference(hot.outputs, plain.outputs, 2, kLength);
 }
-BENCHMARK(BM_WarmerReference)->ArgName("shape")->DenseRange(0, KSampleWarmer::kShapeCount - 1);
+BENCHMARK(BM_WarmerOversampled)->ArgName("shape")->DenseRange(0, KSampleWarmer::kShapeCount - 1)->UseManualTime();
 }  // namespace

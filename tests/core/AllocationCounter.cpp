@@ -4,8 +4,8 @@
 #include <cstdlib>
 #include <new>
 
-// Linked with -Wl,--wrap for each of these: calls from our objects arrive at __wrap_*, which
-// reach the C library (or a sanitizer's allocator) through __real_*.
+// Linked with -Wl,--wrap for the malloc family: calls from our objects arrive at __wrap_*,
+// which reach the C library (or a sanitizer's allocator) through __real_*.
 extern "C" {
 void* __real_malloc(size_t size);
 void* __real_calloc(size_t count, size_t size);
@@ -21,24 +21,12 @@ void KCountAllocation() noexcept {
 }
 
 KAllocationCounter::KAllocationCounter() noexcept : outer_(tInnermost) { tInnermost = this; }
-
 KAllocationCounter::~KAllocationCounter() { tInnermost = outer_; }
 
 extern "C" {
-void* __wrap_malloc(size_t size) {
-  KCountAllocation();
-  return __real_malloc(size);
-}
-
-void* __wrap_calloc(size_t count, size_t size) {
-  KCountAllocation();
-  return __real_calloc(count, size);
-}
-
-void* __wrap_realloc(void* block, size_t size) {
-  KCountAllocation();
-  return __real_realloc(block, size);
-}
+void* __wrap_malloc(size_t size) { KCountAllocation(); return __real_malloc(size); }
+void* __wrap_calloc(size_t count, size_t size) { KCountAllocation(); return __real_calloc(count, size); }
+void* __wrap_realloc(void* block, size_t size) { KCountAllocation(); return __real_realloc(block, size); }
 }
 
 // The array and nothrow forms of the standard library forward to these two.
@@ -47,7 +35,6 @@ void* operator new(size_t size) {
   if (void* block = __real_malloc(size == 0 ? 1 : size)) return block;
   throw std::bad_alloc();
 }
-
 void* operator new(size_t size, std::align_val_t alignment) {
   KCountAllocation();
   const auto align = static_cast<size_t>(alignment);
@@ -55,7 +42,6 @@ void* operator new(size_t size, std::align_val_t alignment) {
   if (void* block = std::aligned_alloc(align, rounded == 0 ? align : rounded)) return block;
   throw std::bad_alloc();
 }
-
 void operator delete(void* block) noexcept { std::free(block); }
 void operator delete(void* block, size_t) noexcept { std::free(block); }
 void operator delete(void* block, std::align_val_t) noexcept { std::free(block); }

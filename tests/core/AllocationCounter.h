@@ -2,9 +2,8 @@
 
 #include <cstdint>
 
-// Counts the heap allocations made on the calling thread while it lives: operator new in every
-// form, and malloc, calloc and realloc called from our own code (the test binary links them
-// through wrappers). Counters nest; every live counter of the thread sees each allocation.
+// Counts the allocations of the calling thread while it lives: operator new, and the malloc family
+// called from our code (linked through wrappers). Counters nest; every live one sees each.
 class KAllocationCounter {
 public:
   KAllocationCounter() noexcept;

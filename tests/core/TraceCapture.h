@@ -3,6 +3,7 @@
 #include <string>
 #include <vector>
 
+#include "kernel/KException.h"
 #include "kernel/KTrace.h"
 
 // Collects the trace sink's lines while it lives, for tests that run on one thread.
@@ -23,3 +24,14 @@ private:
 
   KTraceHook previous_;
 };
+
+// The message of the KException that `body` throws, or "(no failure)".
+template <class Body>
+std::string KFailureOf(Body&& body) {
+  try {
+    body();
+  } catch (const KException& e) {
+    return e.Message().ToUtf8();
+  }
+  return "(no failure)";
+}

@@ -32,6 +32,7 @@ TEST(TransferCurve, DefaultsDeriveTheLineAndKnee) {
 TEST(TransferCurve, KneesMaximizeAndThresholdOne) {
   KTransferCurve sizeZero = Make(kSoft, false, {.kneeSize = 0.0}), hard = Make(kHard);
   KTransferCurve flat = Make(kSoft, true, {.threshold = 1.0, .inputGain = 2.0, .outputGain = 0.75});
+  EXPECT_EQ(sizeZero.Chosen(), KTransferCurve::kHard);
   for (int32_t knee : {kHard, kLinear, kSoft}) {
     KTransferCurve curve = Make(knee, false, {.inputGain = 1.25}), lifted = Make(knee, true, {.inputGain = 1.25});
     const double m = lifted.MakeUp(), h = 1e-7;

@@ -1,5 +1,4 @@
-// Whole-file storage and the user's data folders. Every test works in a fresh temporary folder;
-// XDG_DATA_HOME and HOME are restored afterwards.
+// Whole-file storage and the user's data folders, in a fresh temporary folder each time.
 #include <gtest/gtest.h>
 
 #include <cstdlib>

@@ -56,8 +56,11 @@ TEST(KStringT, LiteralsAreReferencedShortTextsInlineLongOnesOnTheHeap) {
 TEST(KStringT, HeapBlocksRoundToPowersOfTwoAndCountReferences) {
   for (int32_t c = 0; c <= 3000; ++c) ASSERT_EQ(KStringHeap::BlockSize(c), static_cast<int32_t>(std::bit_ceil(2u * c + 10))) << c;
   EXPECT_EQ(Header(Text(124), kSize), 512);
-  KString grown;  // one character at a time: literal, inline, then a heap block that doubles
-  for (int32_t i = 0; i < 1000; ++i) grown.Append(static_cast<char16_t>('a' + i % 26));
+  KString grown;  // one character at a time: inline up to 59, then a heap block that doubles
+  for (int32_t i = 0; i < 1000; ++i) {
+    grown.Append(static_cast<char16_t>('a' + i % 26));
+    ASSERT_EQ(grown.GetStorage(), i < 59 ? KString::kInline : KString::kHeap) << i;
+  }
   EXPECT_EQ(grown.ToUtf8(), Letters(1000));
   EXPECT_EQ(Header(grown, kSize), 2048);
   const KString copy = grown;

@@ -1,0 +1,347 @@
+#include "hosts/vst3/KAudioPluginVST3Adapter.h"
+
+#include <utility>
+
+#include "hosts/vst3/KVST3ClassId.h"
+#include "hosts/vst3/KVST3ProcessInput.h"
+#include "hosts/vst3/KVST3Util.h"
+
+using namespace KVST3;
+
+namespace {
+constexpr int32_t kRootUnit = UnitInfo::kRootUnitId;
+}  // namespace
+
+KAudioPluginVST3Adapter::KAudioPluginVST3Adapter(std::unique_ptr<KAudioPlugin> plugin)
+    : KAudioPluginInterface(*plugin, "VST3"), plugin_(std::move(plugin)), table_(*plugin_), buses_(*plugin_), host_(*this) {
+  plugin_->SetInterface(this);
+}
+
+KAudioPluginVST3Adapter::~KAudioPluginVST3Adapter() {
+  host_.Detach();
+  plugin_->SetInterface(nullptr);
+}
+
+// ---- FUnknown, IPluginBase
+
+TResult KAudioPluginVST3Adapter::QueryInterface(const char* iid, void** object) {
+  if (!object) return kInvalidArgument;
+  void* found = nullptr;
+  if (FUnknown::kIID.Is(iid) || IPluginBase::kIID.Is(iid) || IComponent::kIID.Is(iid)) found = static_cast<IComponent*>(this);
+  else if (IAudioProcessor::kIID.Is(iid)) found = static_cast<IAudioProcessor*>(this);
+  else if (IProcessContextRequirements::kIID.Is(iid)) found = static_cast<IProcessContextRequirements*>(this);
+  else if (IEditController::kIID.Is(iid)) found = static_cast<IEditController*>(this);
+  else if (IMidiMapping::kIID.Is(iid)) found = static_cast<IMidiMapping*>(this);
+  else if (IUnitInfo::kIID.Is(iid)) found = static_cast<IUnitInfo*>(this);
+  *object = found;
+  if (!found) return kNoInterface;
+  AddRef();
+  return kResultOk;
+}
+
+uint32_t KAudioPluginVST3Adapter::AddRef() { return references_.fetch_add(1, std::memory_order_relaxed) + 1; }
+
+uint32_t KAudioPluginVST3Adapter::Release() {
+  const uint32_t left = references_.fetch_sub(1, std::memory_order_acq_rel) - 1;
+  if (left == 0) delete this;
+  return left;
+}
+
+TResult KAudioPluginVST3Adapter::Initialize(FUnknown* context) {
+  return KGuarded("KAudioPluginVST3Adapter::Initialize", kResultFalse, [&] {
+    // A host that initializes the processor and the controller gets one object set up once.
+    if (initializations_ == 0) {
+      host_.Attach(context);
+      buses_.Build();
+      table_.Build();
+    }
+    ++initializations_;
+    return kResultOk;
+  });
+}
+
+TResult KAudioPluginVST3Adapter::Terminate() {
+  return KGuarded("KAudioPluginVST3Adapter::Terminate", kResultFalse, [&] {
+    if (initializations_ == 0) return kResultFalse;
+    if (--initializations_ == 0) host_.Detach();
+    return kResultOk;
+  });
+}
+
+// ---- IComponent
+
+TResult KAudioPluginVST3Adapter::GetControllerClassId(char* classId) {
+  return KGuarded("KAudioPluginVST3Adapter::GetControllerClassId", kResultFalse, [&] {
+    if (!classId) return kInvalidArgument;
+    // The controller is this same class: a host that insists on a controller object of its own
+    // makes a second instance, which takes the component's state through SetComponentState.
+    KClassIdOf(plugin_->Identifier().ToUtf8()).CopyTo(classId);
+    return kResultTrue;
+  });
+}
+
+TResult KAudioPluginVST3Adapter::SetIoMode(int32_t) { return kNotImplemented; }
+
+int32_t KAudioPluginVST3Adapter::GetBusCount(int32_t type, int32_t direction) {
+  return KGuarded("KAudioPluginVST3Adapter::GetBusCount", 0, [&] { return buses_.Count(type, direction); });
+}
+
+TResult KAudioPluginVST3Adapter::GetBusInfo(int32_t type, int32_t direction, int32_t index, BusInfo& info) {
+  return KGuarded("KAudioPluginVST3Adapter::GetBusInfo", kResultFalse,
+                  [&] { return buses_.Describe(type, direction, index, info) ? kResultTrue : kInvalidArgument; });
+}
+
+TResult KAudioPluginVST3Adapter::GetRoutingInfo(RoutingInfo&, RoutingInfo&) { return kNotImplemented; }
+
+TResult KAudioPluginVST3Adapter::ActivateBus(int32_t type, int32_t direction, int32_t index, TBool state) {
+  return KGuarded("KAudioPluginVST3Adapter::ActivateBus", kResultFalse,
+                  [&] { return buses_.Activate(type, direction, index, state != 0) ? kResultTrue : kInvalidArgument; });
+}
+
+TResult KAudioPluginVST3Adapter::SetActive(TBool state) {
+  return KGuarded("KAudioPluginVST3Adapter::SetActive", kResultFalse, [&] {
+    if (state) {
+      plugin_->Reset();
+      // A latency that changed while inactive is told before the host asks for it.
+      Idle();
+    }
+    return kResultOk;
+  });
+}
+
+TResult KAudioPluginVST3Adapter::LoadComponentState(IBStream* state) {
+  return KGuarded("KAudioPluginVST3Adapter::SetState", kResultFalse, [&] {
+    if (!state) return kInvalidArgument;
+    plugin_->ReadState(KReadAll(*state));  // all or nothing
+    return kResultOk;
+  });
+}
+
+TResult KAudioPluginVST3Adapter::StoreComponentState(IBStream* state) {
+  return KGuarded("KAudioPluginVST3Adapter::GetState", kResultFalse, [&] {
+    if (!state) return kInvalidArgument;
+    return KWriteAll(*state, plugin_->WriteState()) ? kResultOk : kResultFalse;
+  });
+}
+
+// ---- IAudioProcessor
+
+TResult KAudioPluginVST3Adapter::SetBusArrangements(SpeakerArrangement* inputs, int32_t inputCount, SpeakerArrangement* outputs,
+                                                    int32_t outputCount) {
+  return KGuarded("KAudioPluginVST3Adapter::SetBusArrangements", kResultFalse,
+                  [&] { return buses_.Arrange(inputs, inputCount, outputs, outputCount) ? kResultTrue : kResultFalse; });
+}
+
+TResult KAudioPluginVST3Adapter::GetBusArrangement(int32_t direction, int32_t index, SpeakerArrangement& arrangement) {
+  return KGuarded("KAudioPluginVST3Adapter::GetBusArrangement", kResultFalse,
+                  [&] { return buses_.Arrangement(direction, index, arrangement) ? kResultTrue : kInvalidArgument; });
+}
+
+TResult KAudioPluginVST3Adapter::CanProcessSampleSize(int32_t symbolicSampleSize) {
+  return symbolicSampleSize == kSample32 ? kResultTrue : kResultFalse;
+}
+
+uint32_t KAudioPluginVST3Adapter::GetLatencySamples() {
+  return KGuarded("KAudioPluginVST3Adapter::GetLatencySamples", 0u,
+                  [&] { return static_cast<uint32_t>(plugin_->TotalLatency() > 0 ? plugin_->TotalLatency() : 0); });
+}
+
+TResult KAudioPluginVST3Adapter::SetupProcessing(ProcessSetup& setup) {
+  return KGuarded("KAudioPluginVST3Adapter::SetupProcessing", kResultFalse, [&] {
+    if (setup.symbolicSampleSize != kSample32 || setup.maxSamplesPerBlock < 0) return kResultFalse;
+    if (!plugin_->SetSampleRate(setup.sampleRate)) return kResultFalse;
+    // The plug-in takes blocks of any length; the block size only sizes the place where
+    // outputs the host leaves out are written.
+    if (setup.maxSamplesPerBlock > discardLength_) {
+      discard_.reset(new float[static_cast<size_t>(setup.maxSamplesPerBlock)]);
+      discardLength_ = setup.maxSamplesPerBlock;
+    }
+    SetOffline(setup.processMode == kOffline);
+    return kResultOk;
+  });
+}
+
+TResult KAudioPluginVST3Adapter::SetProcessing(TBool) { return kResultOk; }
+
+TResult KAudioPluginVST3Adapter::Process(ProcessData& data) {
+  return KGuarded("KAudioPluginVST3Adapter::Process", kResultFalse, [&] {
+    if (data.symbolicSampleSize != kSample32) return kResultFalse;
+    KAudioPlugin& plugin = *plugin_;
+    const bool offline = data.processMode == kOffline;
+    SetOffline(offline);
+    KReadTransport(data.processContext, offline, plugin.Transport());
+    // Parameter changes first: a controller and a note at the same offset arrive in that order.
+    KApplyParameterChanges(data.inputParameterChanges, data.numSamples, plugin, table_);
+    KDeliverEvents(data.inputEvents, plugin);
+
+    const float* inputs[KAudioPlugin::kMaxChannels] = {};
+    float* outputs[KAudioPlugin::kMaxChannels] = {};
+    const bool mapped = buses_.MapBuffers(data, inputs, outputs, discard_.get(), discardLength_);
+    processing_ = &data;
+    midiOut_.BeginBlock();
+    plugin.ProcessHostBlock(inputs, mapped ? outputs : nullptr, data.numSamples);
+    midiOut_.EndBlock();
+    processing_ = nullptr;
+    if (mapped) KBusLayout::MarkSilence(data);
+    midiOut_.Flush(data.outputEvents);
+    return kResultOk;
+  });
+}
+
+// The plug-ins do not say how long they ring after the input stops: the host keeps calling.
+uint32_t KAudioPluginVST3Adapter::GetTailSamples() { return kInfiniteTail; }
+
+uint32_t KAudioPluginVST3Adapter::GetProcessContextRequirements() {
+  return kNeedProjectTimeMusic | kNeedBarPositionMusic | kNeedCycleMusic | kNeedTempo | kNeedTimeSignature | kNeedTransportState;
+}
+
+// ---- IEditController
+
+TResult KAudioPluginVST3Adapter::SetComponentState(IBStream* state) { return LoadComponentState(state); }
+
+// The component state carries everything; the controller has nothing of its own to keep.
+TResult KAudioPluginVST3Adapter::LoadControllerState(IBStream*) { return kResultOk; }
+TResult KAudioPluginVST3Adapter::StoreControllerState(IBStream*) { return kResultOk; }
+
+int32_t KAudioPluginVST3Adapter::GetParameterCount() {
+  return KGuarded("KAudioPluginVST3Adapter::GetParameterCount", 0, [&] { return table_.Count(); });
+}
+
+TResult KAudioPluginVST3Adapter::GetParameterInfo(int32_t index, ParameterInfo& info) {
+  return KGuarded("KAudioPluginVST3Adapter::GetParameterInfo", kResultFalse,
+                  [&] { return table_.Describe(index, info) ? kResultOk : kInvalidArgument; });
+}
+
+TResult KAudioPluginVST3Adapter::GetParamStringByValue(ParamID id, double normalized, String128 text) {
+  return KGuarded("KAudioPluginVST3Adapter::GetParamStringByValue", kResultFalse, [&] {
+    KString value;
+    if (!text || !table_.Text(id, normalized, value)) return kInvalidArgument;
+    KCopyText(value, text, 128);
+    return kResultOk;
+  });
+}
+
+TResult KAudioPluginVST3Adapter::GetParamValueByString(ParamID id, TChar* text, double& normalized) {
+  return KGuarded("KAudioPluginVST3Adapter::GetParamValueByString", kResultFalse, [&] {
+    return text && table_.Value(id, KTextOf(text, 128), normalized) ? kResultOk : kResultFalse;
+  });
+}
+
+double KAudioPluginVST3Adapter::NormalizedParamToPlain(ParamID id, double normalized) {
+  return KGuarded("KAudioPluginVST3Adapter::NormalizedParamToPlain", normalized, [&] { return table_.ToPlain(id, normalized); });
+}
+
+double KAudioPluginVST3Adapter::PlainParamToNormalized(ParamID id, double plain) {
+  return KGuarded("KAudioPluginVST3Adapter::PlainParamToNormalized", 0.0, [&] { return table_.ToNormalized(id, plain); });
+}
+
+double KAudioPluginVST3Adapter::GetParamNormalized(ParamID id) {
+  return KGuarded("KAudioPluginVST3Adapter::GetParamNormalized", 0.0, [&] { return table_.Normalized(id); });
+}
+
+TResult KAudioPluginVST3Adapter::SetParamNormalized(ParamID id, double normalized) {
+  return KGuarded("KAudioPluginVST3Adapter::SetParamNormalized", kResultFalse,
+                  [&] { return table_.SetNormalized(id, normalized) ? kResultOk : kInvalidArgument; });
+}
+
+TResult KAudioPluginVST3Adapter::SetComponentHandler(IComponentHandler* handler) {
+  host_.SetComponentHandler(handler);
+  return kResultOk;
+}
+
+IPlugView* KAudioPluginVST3Adapter::CreateView(FIDString) { return nullptr; }
+
+// ---- IMidiMapping
+
+TResult KAudioPluginVST3Adapter::GetMidiControllerAssignment(int32_t busIndex, int16_t channel, int16_t controller, ParamID& id) {
+  return KGuarded("KAudioPluginVST3Adapter::GetMidiControllerAssignment", kResultFalse, [&] {
+    if (busIndex != 0 || buses_.Count(kEvent, kInput) == 0) return kResultFalse;
+    return table_.ControllerId(channel, controller, id) ? kResultTrue : kResultFalse;
+  });
+}
+
+// ---- IUnitInfo
+
+KStringList KAudioPluginVST3Adapter::PresetNames() const {
+  try {
+    return plugin_->ListPresets();
+  } catch (const KException&) {
+    return {};  // no preset folder: no programs
+  }
+}
+
+int32_t KAudioPluginVST3Adapter::GetUnitCount() { return 1; }
+
+TResult KAudioPluginVST3Adapter::GetUnitInfo(int32_t unitIndex, UnitInfo& info) {
+  return KGuarded("KAudioPluginVST3Adapter::GetUnitInfo", kResultFalse, [&] {
+    if (unitIndex != 0) return kInvalidArgument;
+    info = UnitInfo{kRootUnit, UnitInfo::kNoParentUnitId, {}, KParameterTable::kPresetList};
+    KCopyText("Root", info.name, 128);
+    return kResultOk;
+  });
+}
+
+int32_t KAudioPluginVST3Adapter::GetProgramListCount() { return 1; }
+
+TResult KAudioPluginVST3Adapter::GetProgramListInfo(int32_t listIndex, ProgramListInfo& info) {
+  return KGuarded("KAudioPluginVST3Adapter::GetProgramListInfo", kResultFalse, [&] {
+    if (listIndex != 0) return kInvalidArgument;
+    info = ProgramListInfo{KParameterTable::kPresetList, {}, PresetNames().Count()};
+    KCopyText("Presets", info.name, 128);
+    return kResultOk;
+  });
+}
+
+TResult KAudioPluginVST3Adapter::GetProgramName(int32_t listId, int32_t programIndex, String128 name) {
+  return KGuarded("KAudioPluginVST3Adapter::GetProgramName", kResultFalse, [&] {
+    const KStringList names = listId == KParameterTable::kPresetList ? PresetNames() : KStringList();
+    if (!name || programIndex < 0 || programIndex >= names.Count()) return kInvalidArgument;
+    KCopyText(names[programIndex], name, 128);
+    return kResultOk;
+  });
+}
+
+TResult KAudioPluginVST3Adapter::GetProgramInfo(int32_t, int32_t, const char*, String128) { return kNotImplemented; }
+TResult KAudioPluginVST3Adapter::HasProgramPitchNames(int32_t, int32_t) { return kResultFalse; }
+TResult KAudioPluginVST3Adapter::GetProgramPitchName(int32_t, int32_t, int16_t, String128) { return kResultFalse; }
+int32_t KAudioPluginVST3Adapter::GetSelectedUnit() { return kRootUnit; }
+TResult KAudioPluginVST3Adapter::SelectUnit(int32_t unitId) { return unitId == kRootUnit ? kResultTrue : kInvalidArgument; }
+
+TResult KAudioPluginVST3Adapter::GetUnitByBus(int32_t type, int32_t direction, int32_t busIndex, int32_t, int32_t& unitId) {
+  if (busIndex < 0 || busIndex >= GetBusCount(type, direction)) return kInvalidArgument;
+  unitId = kRootUnit;
+  return kResultTrue;
+}
+
+TResult KAudioPluginVST3Adapter::SetUnitProgramData(int32_t, int32_t, IBStream*) { return kNotImplemented; }
+
+// ---- KAudioPluginInterface
+
+void KAudioPluginVST3Adapter::BeginGesture(int32_t index) { host_.BeginEdit(static_cast<ParamID>(index)); }
+
+void KAudioPluginVST3Adapter::SendAutomationValue(int32_t index, double normalized) {
+  host_.PerformEdit(static_cast<ParamID>(index), normalized);
+}
+
+// The component handler belongs to the user-interface thread; from inside processing a value
+// goes out with the block's output parameter changes instead.
+void KAudioPluginVST3Adapter::SendAutomationValueFromProcess(int32_t index, double normalized) {
+  if (!processing_ || !processing_->outputParameterChanges) return;
+  int32_t queueIndex = 0, pointIndex = 0;
+  const auto id = static_cast<ParamID>(index);
+  if (IParamValueQueue* queue = processing_->outputParameterChanges->AddParameterData(id, queueIndex))
+    queue->AddPoint(0, normalized, pointIndex);
+}
+
+void KAudioPluginVST3Adapter::EndGesture(int32_t index) { host_.EndEdit(static_cast<ParamID>(index)); }
+
+void KAudioPluginVST3Adapter::SendMIDIEvent(int32_t sampleOffset, const uint8_t bytes[4]) { midiOut_.Append(sampleOffset, bytes); }
+
+void KAudioPluginVST3Adapter::ReportLatency(int32_t) { host_.Restart(kLatencyChanged); }
+
+void KAudioPluginVST3Adapter::UpdateParameterNames() { host_.Restart(kParamTitlesChanged); }
+
+void KAudioPluginVST3Adapter::NotifyPresetChanged() { host_.Restart(kParamValuesChanged); }
+
+// No editor yet, so nothing to resize.
+bool KAudioPluginVST3Adapter::ResizeEditor(int32_t, int32_t) { return false; }

@@ -1,0 +1,164 @@
+// The built bundles driven as a host drives them; the adapter in this process around test plug-ins.
+#include "core/KAudioPlugin.h"
+#include "hosts/vst3/KAudioPluginVST3Adapter.h"
+#include "hosts/vst3/KVST3ClassId.h"
+#include "kernel/KEntryPoints.h"
+#include "plugins/utility/KUtilityPlugin.h"
+#include "tests/core/AllocationCounter.h"
+#include "tests/core/RecordingPlugin.h"
+#include "tests/hosts/VST3Host.h"
+
+using namespace KVST3Test;
+
+namespace {
+// A key's bundle: the key without its "K" and without a trailing "Plugin".
+std::string BundleName(std::string key) { return key.ends_with("Plugin") ? key.substr(1, key.size() - 7) : key.substr(1); }
+ParamID Parameters(const char* key) { return static_cast<ParamID>(std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(KString::Static(key)))->ParameterCount()); }
+FUnknown* Adapt(KAudioPlugin* plugin) { return static_cast<IComponent*>(new KAudioPluginVST3Adapter(std::unique_ptr<KAudioPlugin>(plugin))); }
+}  // namespace
+
+TEST(VST3Bundles, EveryCataloguePluginHasABundleThatDescribesAndMakesIt) {
+  for (const KString& key : GetTorvanePluginList()) {
+    const std::string name = BundleName(key.ToUtf8());
+    KBundle bundle(name);
+    PFactoryInfo factory{}; PClassInfoW info{};
+    IPluginFactory3* factory3 = Query<IPluginFactory3>(bundle.factory);
+    ASSERT_TRUE(factory3) << name;
+    EXPECT_EQ(bundle.factory->GetFactoryInfo(&factory) | factory3->GetClassInfoUnicode(0, &info), kResultOk);
+    factory3->Release();
+    EXPECT_TRUE(KClassIdOf(key.ToUtf8()).Is(info.cid)) << name;
+    EXPECT_EQ(std::tuple(std::string(factory.vendor), bundle.factory->CountClasses(), std::string(info.category), std::string(info.subCategories).substr(0, 3),
+                         std::u16string(info.name), std::u16string(info.version)),
+              std::tuple("Torvane", 1, "Audio Module Class", "Fx|", std::u16string(name.begin(), name.end()), u"" TORVANE_VERSION));
+    KInstance made(bundle.Create());
+  }
+}
+
+// Two bundles at once, each with its own kernel. The compressor's buses and parameters; its state
+// restores another instance exactly (a broken one changes nothing); texts; audio through both.
+TEST(VST3Bundles, TwoBundlesAtOnceCompressorBusesParametersStateTextsAndAudio) {
+  KBundle compressor("Compressor"), equalizer("Equalizer");
+  KHost host;
+  KInstance source(compressor.Create()), target(compressor.Create()), filter(equalizer.Create());
+  for (KInstance* instance : {&source, &target, &filter}) instance->Start(host);
+  struct Bus { int32_t direction, index; std::u16string name; int32_t type; uint32_t flags; };
+  for (const Bus& bus : {Bus{kInput, 0, u"Input", kMain, 1}, Bus{kInput, 1, u"Sidechain", kAux, 0}, Bus{kOutput, 0, u"Output", kMain, 1}}) {
+    BusInfo info{};
+    ASSERT_EQ(source.component->GetBusInfo(kAudio, bus.direction, bus.index, info), kResultTrue);
+    EXPECT_EQ(std::tuple(std::u16string(info.name), info.busType, info.flags, info.channelCount), std::tuple(bus.name, bus.type, bus.flags, 2));
+  }
+  // An effect: its own parameters, bypass, program, then 130 controllers of channel 0.
+  const ParamID n = Parameters("KCompressorPlugin");
+  const int32_t count = source.controller->GetParameterCount();
+  ASSERT_EQ(count, static_cast<int32_t>(n) + 2 + 130);
+  struct Row { int32_t index; ParamID id; std::u16string title; int32_t steps, flags; };
+  for (const Row& row : {Row{count - 132, 32767, u"Bypass", 1, 0x10001}, Row{count - 131, 32766, u"Program", 128, 0x8001}, Row{count - 1, 10129, u"MIDI CC 129", 0, 0}}) {
+    ParameterInfo info{};
+    ASSERT_EQ(source.controller->GetParameterInfo(row.index, info), kResultOk);
+    EXPECT_EQ(std::tuple(info.id, std::u16string(info.title), info.stepCount, info.flags), std::tuple(row.id, row.title, row.steps, row.flags));
+  }
+  // Mono or stereo, the same on every bus (the host asks while inactive), and 32-bit samples only.
+  SpeakerArrangement mono[] = {SpeakerArrangements::kMono, SpeakerArrangements::kMono}, stereo[] = {3, 3};
+  ProcessSetup doubles{kRealtime, kSample64, kBlock, 48000.0};
+  IAudioProcessor* p = target.processor;
+  EXPECT_EQ((std::tuple{target.component->SetActive(0), p->SetBusArrangements(mono, 2, mono, 1), p->SetBusArrangements(mono, 2, stereo, 1), p->SetBusArrangements(stereo, 1, stereo, 1)}),
+            std::tuple(kResultOk, kResultTrue, kResultFalse, kResultFalse));
+  EXPECT_EQ((std::tuple{p->CanProcessSampleSize(kSample64), p->SetupProcessing(doubles), p->SetBusArrangements(stereo, 2, stereo, 1), target.component->SetActive(1)}),
+            std::tuple(kResultFalse, kResultFalse, kResultTrue, kResultOk));
+  for (ParamID id = 0; id < n; ++id) source.controller->SetParamNormalized(id, 0.05 + 0.09 * (id * 7 % 11));
+  const std::string state = source.State();
+  KStream whole, broken;
+  whole.bytes = state, broken.bytes = state.substr(0, state.size() / 2);
+  EXPECT_EQ((std::pair{target.component->SetState(&whole), target.State()}), std::pair(kResultOk, state));
+  EXPECT_EQ((std::pair{target.component->SetState(&broken), target.State()}), std::pair(kResultFalse, state));
+  struct Text { ParamID id; double normalized; std::u16string text; };
+  std::vector<Text> texts = {{32767, 1.0, u"On"}, {32767, 0.2, u"Off"}, {32766, 5 / 128.0, u"5"}, {10007, 1.0, u"127"}, {10129, 0.5, u"8192"}};
+  for (ParamID id = 0; id < n; ++id) texts.push_back({id, target.controller->GetParamNormalized(id), source.Text(id, source.controller->GetParamNormalized(id))});
+  for (double value = 0.0; Text& t : texts) {
+    EXPECT_EQ(target.Text(t.id, t.normalized), t.text);
+    ASSERT_EQ(target.controller->GetParamValueByString(t.id, t.text.data(), value), kResultOk) << t.id;
+    EXPECT_EQ(target.Text(t.id, value), t.text);
+  }
+  KBlock bypassed(2, 1), silent(2, 1), filtered(1, 1);
+  bypassed.Change(32767, {{0, 1.0}});  // bypassed, the main input passes unchanged
+  for (size_t c = 0; c < 4; ++c) std::fill(silent.planes[c].begin(), silent.planes[c].end(), 0.0f);
+  for (auto [instance, block] : {std::pair{&source, &bypassed}, std::pair{&source, &silent}, std::pair{&filter, &filtered}})
+    ASSERT_EQ(instance->processor->Process(block->data), kResultOk);
+  EXPECT_EQ(std::pair(bypassed.Out(0), bypassed.Out(1)), std::pair(bypassed.planes[0], bypassed.planes[1]));
+  EXPECT_EQ(std::pair(bypassed.buses[2].silenceFlags, silent.buses[2].silenceFlags), std::pair(uint64_t{0}, uint64_t{3}));
+  EXPECT_GT(*std::max_element(filtered.Out(0).begin(), filtered.Out(0).end()), 0.1f);
+  for (KInstance* instance : {&source, &target, &filter}) instance->Stop();
+}
+
+TEST(VST3Adapter, AnInstrumentHas2080ControllersAnEffect130And10267IsController7OnChannel3) {
+  for (const KAudioPlugin::Shape shape : {KAudioPlugin::Shape{0, 1, true, false, true}, KRecordingPlugin::kEffect}) {
+    const bool instrument = shape.inputBuses == 0;
+    auto* plugin = new KRecordingPlugin(4, shape, KRecordingPlugin::kChannelNumber);
+    plugin->Controllers().Assign({7, 2, 1});  // controller 7 on channel 3 (counted from 1) moves parameter 1
+    plugin->Controllers().SetSingleChannel(true);
+    KHost host;
+    KInstance instance(Adapt(plugin));
+    instance.Start(host);
+    ParameterInfo info{};
+    ASSERT_EQ(instance.controller->GetParameterCount(), 4 + 2 + (instrument ? 2080 : 130));
+    ASSERT_EQ(instance.controller->GetParameterInfo(6 + 7 + (instrument ? 260 : 0), info), kResultOk);
+    EXPECT_EQ(std::u16string(info.title), instrument ? u"MIDI CC 7 channel 3" : u"MIDI CC 7");
+    for (const auto& [id, moved] : {std::pair{10000u + 7 + 130 * 3, 0.0}, std::pair{10000u + 7 + 130 * 2, instrument ? 1.0 : 0.0}}) {
+      KBlock block(shape.inputBuses, 1);
+      block.Change(id, {{0, 1.0}});
+      ASSERT_EQ(instance.processor->Process(block.data), kResultOk);
+      EXPECT_EQ(plugin->GetParameter(1).Normalized(), moved) << id;
+    }
+  }
+}
+
+TEST(VST3Adapter, QueuePointsRampThePluginAsTheCommandLineHostDoes) {
+  KUtilityPlugin direct;
+  KHost host;
+  KInstance instance(Adapt(new KUtilityPlugin));
+  instance.Start(host);
+  ASSERT_TRUE(direct.SetSampleRate(48000.0));
+  direct.Reset();
+  KBlock automated(1, 1), reference(1, 1), constant(1, 1);
+  // The first block after a reset lands every value at once: one block each before the ramp.
+  ASSERT_EQ(instance.processor->Process(constant.data), kResultOk);
+  direct.ProcessHostBlock(reference.channels.data(), reference.channels.data() + 2, kBlock);
+  const KAudioPluginBase::RampPoint ramp[] = {{0, 0.2}, {100, 0.9}, {300, 0.4}};
+  direct.AddRamp(KUtilityPlugin::kGain, ramp, true);  // fine, as the command-line host adds its ramps
+  direct.ProcessHostBlock(reference.channels.data(), reference.channels.data() + 2, kBlock);
+  automated.Change(KUtilityPlugin::kGain, {{0, 0.2}, {100, 0.9}, {300, 0.4}});
+  ASSERT_EQ(instance.processor->Process(automated.data), kResultOk);
+  EXPECT_EQ(std::pair(automated.Out(0), automated.Out(1)), std::pair(reference.Out(0), reference.Out(1)));
+  EXPECT_NE(constant.Out(0), automated.Out(0));  // the ramp did move the gain
+}
+
+TEST(VST3Adapter, ProcessDeliversNotesControllersTransportAndLatencyWithoutAllocating) {
+  using C = ProcessContext;
+  auto* plugin = new KRecordingPlugin(4);
+  KHost host;
+  KInstance instance(Adapt(plugin));
+  instance.Start(host);
+  KBlock block(1, 1);
+  block.Change(0, {{0, 0.1}, {100, 0.5}, {300, 0.9}});
+  block.Change(10007, {{50, 0.5}});
+  block.events.list = {Event{0, 10, 0.0, 0, Event::kNoteOnEvent, {.noteOn = {0, 60, 0.0f, 0.8f, 0, -1}}},
+                       Event{0, 20, 0.0, 0, Event::kNoteOffEvent, {.noteOff = {0, 60, 0.0f, -1, 0.0f}}}};
+  auto fields = [](const KTransport& t) { return std::tuple(t.tempo, t.songPosition, t.barStart, t.samplePosition, t.numerator, t.denominator, t.cycleStart, t.cycleEnd, t.flags); };
+  // Transport: 6/8 snaps the bar start to half quarters; ignored: tempo 1, an empty cycle, numerator 0, unflagged bars.
+  struct Row { uint32_t state; double tempo; int32_t numerator; KTransport expected; };
+  for (const Row& row : {Row{C::kTempoValid | C::kBarPositionValid | C::kTimeSigValid | C::kCycleValid | C::kPlaying, 1.0, 6, {-1.0, -1.0, 7.5, 96000, 6, 8, -1.0, -1.0, 1}},
+                         Row{C::kTempoValid | C::kTimeSigValid | C::kProjectTimeMusicValid, 120.0, 0, {120.0, 2.0, -1.0, 96000, 4, 4, -1.0, -1.0, 0}}}) {
+    block.context = {row.state, 48000.0, 96000, 0, 0, 2.0, 7.4, 4.0, 4.0, row.tempo, row.numerator, 8, {}, 0, {}, 0};
+    KAllocationCounter counter;
+    ASSERT_EQ(instance.processor->Process(block.data), kResultOk);
+    EXPECT_EQ(counter.Count(), 0);
+    EXPECT_EQ(fields(plugin->Transport()), fields(row.expected));
+  }
+  std::vector<std::pair<int32_t, int32_t>> notes;
+  for (const KRecordingPlugin::Entry& e : plugin->Log()) if (e.kind == KRecordingPlugin::Entry::kNote) notes.emplace_back(e.length, e.note);
+  EXPECT_EQ(notes, (std::vector<std::pair<int32_t, int32_t>>{{10, 60}, {20, 60}, {10, 60}, {20, 60}}));  // one pair per block
+  EXPECT_EQ(std::pair(plugin->GetParameter(0).Normalized(), instance.controller->GetParamNormalized(10007)), std::pair(0.9, 0.5));
+  plugin->ReportLatency(64);
+  static_cast<KAudioPluginVST3Adapter*>(instance.component)->Idle();  // what the host's run loop calls
+  EXPECT_EQ(std::pair(host.restarts, instance.processor->GetLatencySamples()), std::pair(std::vector<int32_t>{kLatencyChanged}, 64u));
+}

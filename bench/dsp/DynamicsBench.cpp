@@ -62,7 +62,7 @@ double PlainGain(const KDynamicsSettings& s, double d) {
     default: {  // the arc tangent to the identity at s0 and to the line at s1
       if (d <= s0 || d >= s1) break;
       const double q = ((s0 - y1) * m + (s0 - s1)) / (m - 1.0), x = d - (s0 + q);
-      return g * (std::sqrt(2.0 * q * q - x * x) + s0 - q) / d * 1.001;
+      return g * (std::sqrt(2.0 * q * q - x * x) + s0 - q) / d;
     }
   }
   return d <= s0 ? g : g * (b + m * d) / d;

@@ -283,7 +283,7 @@ struct KPlainSaturator {
     innerDown.Run(high.data(), high.data(), 4 * n);
     for (size_t i = 0; i < 2 * n; ++i) middle[i] = high[2 * i];
     outerDown.Run(middle.data(), middle.data(), 2 * n);
-    for (size_t i = 0; i < n; ++i) out[i] = static_cast<float>(middle[2 * i]);
+    for (size_t i = 0; i < n; ++i) out[i] = static_cast<float>(middle[2 * i + 1]);
   }
   KPlainFir outerUp, innerUp, innerDown, outerDown;
   std::vector<double> middle, high;

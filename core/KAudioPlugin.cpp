@@ -56,6 +56,11 @@ void KAudioPlugin::SetChannelMode(int32_t mode) noexcept {
   MarkUpdatePending();
 }
 
+void KAudioPlugin::SetBypassFromUser(bool bypass) {
+  SetBypass(bypass);
+  if (KAudioPluginInterface* host = Interface()) host->SendBypassAutomation(bypass);
+}
+
 void KAudioPlugin::ReportLatency(int32_t samples) noexcept {
   latency_.store(samples, std::memory_order_relaxed);
   if (KAudioPluginInterface* host = Interface()) host->RequestLatencyReport(KAudioPluginInterface::kLatencyIfChanged);

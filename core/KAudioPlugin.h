@@ -22,6 +22,14 @@
 class KModule;
 class KPresetStore;
 
+// The mixer channel a plug-in sits on, as far as its host tells it (not every host does).
+struct KChannelContext {
+  KString name;
+  uint32_t color = 0;  // 0xAARRGGBB as the host gives it; meaningful only with hasColor
+  bool hasColor = false;
+  KString location;  // where on the channel the plug-in sits, in the host's words
+};
+
 // The base of every plug-in of the catalogue: parameters and ramps (KAudioPluginBase), MIDI
 // input (KMIDIProcessor) and the processing cycle that turns each host block into calls of the
 // plug-in's own Process, cut at ramp break points and, when asked, at MIDI events; and the
@@ -82,6 +90,9 @@ public:
   // the plug-in's processing rests; parameter changes meanwhile land at once on return.
   void SetBypass(bool bypass) noexcept { bypass_.store(bypass, std::memory_order_relaxed); }
   bool IsBypassed() const noexcept { return bypass_.load(std::memory_order_relaxed); }
+  // The bypass switched by the user in the editor (user-interface thread): sets it and, when a
+  // host is attached, tells the host so that its bypass follows.
+  void SetBypassFromUser(bool bypass);
   void SetMeterReset(bool reset) noexcept { meterReset_.store(reset, std::memory_order_relaxed); }
   const KLevelMeter& GetMeter(Meter meter) const noexcept { return meters_[meter]; }
   KLevelMeter& GetMeter(Meter meter) noexcept { return meters_[meter]; }
@@ -158,6 +169,10 @@ public:
   void SetParameterLocked(int32_t index, bool locked) noexcept { locked_[index] = locked; }
   bool IsParameterLocked(int32_t index) const noexcept { return locked_[index]; }
   KControllerMap& Controllers() noexcept { return controllers_; }
+
+  // ---- the host's channel (user-interface thread only; not kept with the state)
+  void SetChannelContext(const KChannelContext& context) { channelContext_ = context; }
+  const KChannelContext& ChannelContext() const noexcept { return channelContext_; }
 
   // ---- presets, in "presets.xml" of Module()'s user data folder (KException on failure)
   void SavePreset(const KString& name);
@@ -265,5 +280,6 @@ private:
   Element arpeggiator_;
   Element noteControllers_;
   ActivePreset activePreset_;
+  KChannelContext channelContext_;
   KUndoHistory undo_{*this};
 };

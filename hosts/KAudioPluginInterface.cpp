@@ -92,6 +92,12 @@ void KAudioPluginInterface::SendAllAutomation() {
   LowerSendingCounter();
 }
 
+void KAudioPluginInterface::SendBypassAutomation(bool bypass) {
+  RaiseSendingCounter();
+  SendBypassValue(bypass);
+  LowerSendingCounter();
+}
+
 void KAudioPluginInterface::Idle() {
   EndQuietGestures();
   ReportLatencyIfRequested();

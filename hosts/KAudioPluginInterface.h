@@ -44,11 +44,17 @@ public:
   virtual void NotifyPresetChanged() = 0;
   // Answers whether the host accepted the new editor size.
   virtual bool ResizeEditor(int32_t width, int32_t height) = 0;
+  // The plug-in's bypass to the host. Appended so that every slot before it keeps its place;
+  // a host format without a bypass parameter leaves it empty.
+  virtual void SendBypassValue(bool /*bypass*/) {}
 
   // One parameter's new normalised value to the host, inside a gesture.
   void SendAutomation(int32_t index, double normalized);
   // Every automatable parameter's present value.
   void SendAllAutomation();
+  // The plug-in's own bypass switch to the host (user-interface thread), counted as a send so
+  // that the host's echo of it passes for what it is.
+  void SendBypassAutomation(bool bypass);
   // Runs on the interface's timer: ends gestures that went quiet, reports a changed latency.
   void Idle();
   // Any thread. Until the next idle, requests add up: "always" is never weakened to "if changed".

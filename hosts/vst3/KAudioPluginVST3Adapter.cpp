@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "hosts/vst3/KVST3ChannelContext.h"
 #include "hosts/vst3/KVST3ClassId.h"
 #include "hosts/vst3/KVST3ProcessInput.h"
 #include "hosts/vst3/KVST3Util.h"
@@ -31,8 +32,10 @@ TResult KAudioPluginVST3Adapter::QueryInterface(const char* iid, void** object) 
   else if (IAudioProcessor::kIID.Is(iid)) found = static_cast<IAudioProcessor*>(this);
   else if (IProcessContextRequirements::kIID.Is(iid)) found = static_cast<IProcessContextRequirements*>(this);
   else if (IEditController::kIID.Is(iid)) found = static_cast<IEditController*>(this);
+  else if (IEditController2::kIID.Is(iid)) found = static_cast<IEditController2*>(this);
   else if (IMidiMapping::kIID.Is(iid)) found = static_cast<IMidiMapping*>(this);
   else if (IUnitInfo::kIID.Is(iid)) found = static_cast<IUnitInfo*>(this);
+  else if (ChannelContext::IInfoListener::kIID.Is(iid)) found = static_cast<ChannelContext::IInfoListener*>(this);
   *object = found;
   if (!found) return kNoInterface;
   AddRef();
@@ -251,6 +254,18 @@ TResult KAudioPluginVST3Adapter::SetComponentHandler(IComponentHandler* handler)
 
 IPlugView* KAudioPluginVST3Adapter::CreateView(FIDString) { return nullptr; }
 
+// ---- IEditController2
+
+TResult KAudioPluginVST3Adapter::SetKnobMode(int32_t mode) {
+  if (mode < kCircularMode || mode > kLinearMode) return kResultFalse;
+  knobMode_ = mode;
+  return kResultTrue;
+}
+
+// No editor yet, so neither help nor an about box to open.
+TResult KAudioPluginVST3Adapter::OpenHelp(TBool) { return kResultFalse; }
+TResult KAudioPluginVST3Adapter::OpenAboutBox(TBool) { return kResultFalse; }
+
 // ---- IMidiMapping
 
 TResult KAudioPluginVST3Adapter::GetMidiControllerAssignment(int32_t busIndex, int16_t channel, int16_t controller, ParamID& id) {
@@ -315,6 +330,18 @@ TResult KAudioPluginVST3Adapter::GetUnitByBus(int32_t type, int32_t direction, i
 
 TResult KAudioPluginVST3Adapter::SetUnitProgramData(int32_t, int32_t, IBStream*) { return kNotImplemented; }
 
+// ---- ChannelContext::IInfoListener
+
+TResult KAudioPluginVST3Adapter::SetChannelContextInfos(IAttributeList* list) {
+  return KGuarded("KAudioPluginVST3Adapter::SetChannelContextInfos", kResultFalse, [&] {
+    if (!list) return kInvalidArgument;
+    KChannelContext context = plugin_->ChannelContext();
+    KReadChannelContext(*list, context);
+    plugin_->SetChannelContext(context);
+    return kResultTrue;
+  });
+}
+
 // ---- KAudioPluginInterface
 
 void KAudioPluginVST3Adapter::BeginGesture(int32_t index) { host_.BeginEdit(static_cast<ParamID>(index)); }
@@ -345,3 +372,10 @@ void KAudioPluginVST3Adapter::NotifyPresetChanged() { host_.Restart(kParamValues
 
 // No editor yet, so nothing to resize.
 bool KAudioPluginVST3Adapter::ResizeEditor(int32_t, int32_t) { return false; }
+
+// One whole gesture on the bypass parameter; the interface counts it as a send.
+void KAudioPluginVST3Adapter::SendBypassValue(bool bypass) {
+  host_.BeginEdit(KParameterTable::kBypass);
+  host_.PerformEdit(KParameterTable::kBypass, bypass ? 1.0 : 0.0);
+  host_.EndEdit(KParameterTable::kBypass);
+}

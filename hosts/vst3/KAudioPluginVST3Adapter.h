@@ -43,8 +43,9 @@ protected:
 // (no separate controller class, no messages between halves). It translates between the host
 // and the plug-in and keeps no logic of its own; the concerns live beside it: buses
 // (KVST3Buses), parameter identifiers and texts (KVST3Parameters), the processing call's input
-// (KVST3ProcessInput), MIDI output (KVST3MIDIOutput) and the host's objects (KVST3HostContext).
-// No editor yet: CreateView answers none.
+// (KVST3ProcessInput), MIDI output (KVST3MIDIOutput), the host's objects (KVST3HostContext)
+// and the channel the host puts the plug-in on (KVST3ChannelContext).
+// No editor yet: CreateView answers none, and help and the about box are not offered.
 //
 // Every method the host calls is guarded: a KException gives the neutral answer, anything else
 // is traced as "SYSTEM EXCEPTION! KAudioPluginVST3Adapter::<Method>" and gives it too.
@@ -53,8 +54,10 @@ class KAudioPluginVST3Adapter final : public KVST3::KComponentSide,
                                       public KVST3::IAudioProcessor,
                                       public KVST3::IProcessContextRequirements,
                                       public KVST3::KControllerSide,
+                                      public KVST3::IEditController2,
                                       public KVST3::IMidiMapping,
                                       public KVST3::IUnitInfo,
+                                      public KVST3::ChannelContext::IInfoListener,
                                       public KAudioPluginInterface {
 public:
   using TResult = KVST3::TResult;
@@ -109,6 +112,11 @@ public:
   TResult SetComponentHandler(KVST3::IComponentHandler* handler) override;
   KVST3::IPlugView* CreateView(KVST3::FIDString name) override;
 
+  // ---- IEditController2
+  TResult SetKnobMode(int32_t mode) override;
+  TResult OpenHelp(KVST3::TBool onlyCheck) override;
+  TResult OpenAboutBox(KVST3::TBool onlyCheck) override;
+
   // ---- IMidiMapping
   TResult GetMidiControllerAssignment(int32_t busIndex, int16_t channel, int16_t controller, ParamID& id) override;
 
@@ -126,6 +134,9 @@ public:
   TResult GetUnitByBus(int32_t type, int32_t direction, int32_t busIndex, int32_t channel, int32_t& unitId) override;
   TResult SetUnitProgramData(int32_t listOrUnitId, int32_t programIndex, KVST3::IBStream* data) override;
 
+  // ---- ChannelContext::IInfoListener: the channel's name, colour and the plug-in's place on it
+  TResult SetChannelContextInfos(KVST3::IAttributeList* list) override;
+
   // ---- KAudioPluginInterface: the plug-in's way back to the host
   void BeginGesture(int32_t index) override;
   void SendAutomationValue(int32_t index, double normalized) override;
@@ -136,8 +147,11 @@ public:
   void UpdateParameterNames() override;
   void NotifyPresetChanged() override;
   bool ResizeEditor(int32_t width, int32_t height) override;
+  void SendBypassValue(bool bypass) override;
 
   const KString& HostName() const noexcept { return host_.HostName(); }
+  // The host's knob mode (IEditController2::KnobMode), for the editor to come.
+  int32_t KnobMode() const noexcept { return knobMode_; }
 
 private:
   KStringList PresetNames() const;
@@ -145,6 +159,7 @@ private:
   std::unique_ptr<KAudioPlugin> plugin_;
   std::atomic<uint32_t> references_{1};
   int32_t initializations_ = 0;
+  int32_t knobMode_ = KVST3::IEditController2::kCircularMode;
   KVST3::KParameterTable table_;
   KVST3::KBusLayout buses_;
   KVST3::KHostContext host_;

@@ -77,6 +77,8 @@ protected:
 class IEditController2 : public FUnknown {
 public:
   static constexpr KUID kIID = KUID::FromWords(0x7F4EFE59, 0xF3204967, 0xAC27A3AE, 0xAFB63038);
+  // How the host wants knobs dragged.
+  enum KnobMode : int32_t { kCircularMode = 0, kRelativeCircularMode = 1, kLinearMode = 2 };
   virtual TResult SetKnobMode(int32_t mode) = 0;
   virtual TResult OpenHelp(TBool onlyCheck) = 0;
   virtual TResult OpenAboutBox(TBool onlyCheck) = 0;
@@ -142,7 +144,8 @@ protected:
 namespace ChannelContext {
 inline constexpr const char* kChannelNameKey = "channel name";
 inline constexpr const char* kChannelColorKey = "channel color";  // int64 holding 0xAARRGGBB
-inline constexpr const char* kChannelPluginLocationKey = "channel plugin location";
+inline constexpr const char* kChannelPluginLocationKey = "channel plugin location";  // int64, below
+enum PluginLocation : int64_t { kPreVolumeFader = 0, kPostVolumeFader = 1, kUsedAsPanner = 2 };
 
 class IInfoListener : public FUnknown {
 public:

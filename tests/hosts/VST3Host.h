@@ -5,6 +5,7 @@
 #include <cmath>
 #include <cstring>
 #include <deque>
+#include <map>
 
 #include "hosts/vst3/KVST3Controller.h"
 #include "hosts/vst3/KVST3Factory.h"
@@ -63,14 +64,30 @@ struct KEvents final : KHostObject<IEventList> {
   TResult AddEvent(Event& event) override { return list.push_back(event), kResultOk; }
 };
 
-struct KHost final : KHostObject<IHostApplication, IComponentHandler> {  // keeps restart requests
+struct KHost final : KHostObject<IHostApplication, IComponentHandler> {  // keeps edits and restart requests
   std::vector<int32_t> restarts;
+  std::vector<std::tuple<char, ParamID, double>> edits;  // 'b'egin, 'p'erform with its value, 'e'nd
   TResult GetName(String128 name) override { return std::copy_n(u"Test host", 10, name), kResultOk; }
   TResult CreateInstance(char*, char*, void**) override { return kNotImplemented; }
-  TResult BeginEdit(ParamID) override { return kResultOk; }
-  TResult PerformEdit(ParamID, double) override { return kResultOk; }
-  TResult EndEdit(ParamID) override { return kResultOk; }
+  TResult BeginEdit(ParamID id) override { return edits.emplace_back('b', id, 0.0), kResultOk; }
+  TResult PerformEdit(ParamID id, double value) override { return edits.emplace_back('p', id, value), kResultOk; }
+  TResult EndEdit(ParamID id) override { return edits.emplace_back('e', id, 0.0), kResultOk; }
   TResult RestartComponent(int32_t flags) override { return restarts.push_back(flags), kResultOk; }
+};
+
+struct KAttributes final : KHostObject<IAttributeList> {  // texts and integers; a text must fit whole
+  std::map<std::string, std::u16string> texts; std::map<std::string, int64_t> numbers;
+  TResult SetInt(AttrID id, int64_t value) override { return numbers[id] = value, kResultTrue; }
+  TResult GetInt(AttrID id, int64_t& value) override { return numbers.contains(id) ? (value = numbers[id], kResultTrue) : kResultFalse; }
+  TResult SetFloat(AttrID, double) override { return kNotImplemented; }
+  TResult GetFloat(AttrID, double&) override { return kResultFalse; }
+  TResult SetString(AttrID id, const TChar* text) override { return texts[id] = text, kResultTrue; }
+  TResult GetString(AttrID id, TChar* text, uint32_t bytes) override {
+    const auto found = texts.find(id);
+    return found == texts.end() || found->second.size() >= bytes / 2 ? kResultFalse : (std::copy_n(found->second.c_str(), found->second.size() + 1, text), kResultTrue);
+  }
+  TResult SetBinary(AttrID, const void*, uint32_t) override { return kNotImplemented; }
+  TResult GetBinary(AttrID, const void*&, uint32_t&) override { return kResultFalse; }
 };
 
 struct KBlock {  // one processing call: stereo buses (inputs carry sines), queues, events

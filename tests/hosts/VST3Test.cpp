@@ -162,3 +162,28 @@ TEST(VST3Adapter, ProcessDeliversNotesControllersTransportAndLatencyWithoutAlloc
   static_cast<KAudioPluginVST3Adapter*>(instance.component)->Idle();  // what the host's run loop calls
   EXPECT_EQ(std::pair(host.restarts, instance.processor->GetLatencySamples()), std::pair(std::vector<int32_t>{kLatencyChanged}, 64u));
 }
+
+// The host's channel reaches the plug-in (a key left out keeps its value); the second controller
+// face answers; a bypass the user switches goes to the host as one whole gesture.
+TEST(VST3Adapter, ChannelContextEditController2AndTheUsersBypassReachTheirTargets) {
+  using namespace ChannelContext;
+  auto* plugin = new KRecordingPlugin(4);
+  KHost host;
+  KInstance instance(Adapt(plugin));
+  instance.Start(host);
+  const auto [listener, controller2] = std::pair(Query<IInfoListener>(instance.component), Query<IEditController2>(instance.component));
+  ASSERT_TRUE(listener && controller2);
+  KAttributes channel, moved;
+  channel.SetString(kChannelNameKey, u"Drums"), channel.SetInt(kChannelColorKey, 0xFF336699), channel.SetInt(kChannelPluginLocationKey, kPostVolumeFader);
+  moved.SetString(kChannelPluginLocationKey, u"Insert 3");
+  auto fields = [&context = plugin->ChannelContext()] { return std::tuple(context.name.ToUtf8(), context.color, context.hasColor, context.location.ToUtf8()); };
+  EXPECT_EQ((std::pair{listener->SetChannelContextInfos(&channel), fields()}), std::pair(kResultTrue, decltype(fields()){"Drums", 0xFF336699u, true, "post-fader"}));
+  EXPECT_EQ((std::pair{listener->SetChannelContextInfos(&moved), fields()}), std::pair(kResultTrue, decltype(fields()){"Drums", 0xFF336699u, true, "Insert 3"}));
+  EXPECT_EQ((std::tuple{controller2->SetKnobMode(IEditController2::kLinearMode), controller2->SetKnobMode(3), controller2->OpenHelp(0), controller2->OpenAboutBox(0),
+                        static_cast<KAudioPluginVST3Adapter*>(instance.component)->KnobMode()}),
+            std::tuple(kResultTrue, kResultFalse, kResultFalse, kResultFalse, IEditController2::kLinearMode));
+  plugin->SetBypassFromUser(true);
+  EXPECT_EQ(std::pair(plugin->IsBypassed(), host.edits), std::pair(true, std::vector<std::tuple<char, ParamID, double>>{{'b', 32767, 0.0}, {'p', 32767, 1.0}, {'e', 32767, 0.0}}));
+  listener->Release(), controller2->Release();
+  instance.Stop();
+}

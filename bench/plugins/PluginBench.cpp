@@ -57,6 +57,20 @@ void Report(benchmark::State& state, int32_t length) {
   state.counters["realtime"] = benchmark::Counter(seconds, benchmark::Counter::kIsRate);
 }
 
+// Host blocks of `length` samples of the shared signal through a plug-in, as a host would call it.
+void RunHostBlocks(benchmark::State& state, KAudioPlugin& plugin, int32_t length) {
+  const KSignal signal;
+  KStereoOut out(length);
+  const float* in[4];
+  int64_t k = 0;
+  for (auto _ : state) {
+    signal.Block(k++, length, in);
+    plugin.ProcessHostBlock(in, out.outputs, length);
+    benchmark::ClobberMemory();
+  }
+  Report(state, length);
+}
+
 // A working setting: 4:1 from −10 dB with a soft knee, channels linked.
 void SetUpCompressor(KCompressorPlugin& plugin) {
   plugin.SetSampleRate(kRate);
@@ -69,16 +83,7 @@ void BM_CompressorHostBlock(benchmark::State& state) {
   const auto length = static_cast<int32_t>(state.range(0));
   KCompressorPlugin plugin;
   SetUpCompressor(plugin);
-  const KSignal signal;
-  KStereoOut out(length);
-  const float* in[4];
-  int64_t k = 0;
-  for (auto _ : state) {
-    signal.Block(k++, length, in);
-    plugin.ProcessHostBlock(in, out.outputs, length);
-    benchmark::ClobberMemory();
-  }
-  Report(state, length);
+  RunHostBlocks(state, plugin, length);
 }
 BENCHMARK(BM_CompressorHostBlock)->ArgName("block")->Arg(64)->Arg(512);
 
@@ -138,16 +143,7 @@ void BM_EqualizerHostBlock(benchmark::State& state) {
   const auto length = static_cast<int32_t>(state.range(0));
   KEqualizerPlugin plugin;
   SetUpEqualizer(plugin);
-  const KSignal signal;
-  KStereoOut out(length);
-  const float* in[4];
-  int64_t k = 0;
-  for (auto _ : state) {
-    signal.Block(k++, length, in);
-    plugin.ProcessHostBlock(in, out.outputs, length);
-    benchmark::ClobberMemory();
-  }
-  Report(state, length);
+  RunHostBlocks(state, plugin, length);
 }
 BENCHMARK(BM_EqualizerHostBlock)->ArgName("block")->Arg(512);
 
@@ -207,16 +203,7 @@ void BM_WarmerHostBlock(benchmark::State& state) {
   constexpr int32_t kLength = 512;
   KSampleWarmer plugin;
   SetUpWarmer(plugin, static_cast<int32_t>(state.range(0)));
-  const KSignal signal;
-  KStereoOut out(kLength);
-  const float* in[4];
-  int64_t k = 0;
-  for (auto _ : state) {
-    signal.Block(k++, kLength, in);
-    plugin.ProcessHostBlock(in, out.outputs, kLength);
-    benchmark::ClobberMemory();
-  }
-  Report(state, kLength);
+  RunHostBlocks(state, plugin, kLength);
   KCountPerSampleChannel(state, 2 * kLength);
 }
 BENCHMARK(BM_WarmerHostBlock)->ArgName("shape")->DenseRange(0, KSampleWarmer::kShapeCount - 1);

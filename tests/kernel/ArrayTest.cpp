@@ -6,8 +6,7 @@
 
 static std::vector<int> Items(const KArray<int>& array) { return {array.begin(), array.end()}; }
 
-// Below two elements the capacity is the new count; from there the next power of two above
-// the old count, continuing from a reserved capacity.
+// The new count below two elements, then the next power of two above the old count (a reserved one too).
 TEST(KArray, GrowsToNewCountBelowTwoThenToPowersOfTwo) {
   KArray<int> array;
   std::vector<int32_t> capacities;

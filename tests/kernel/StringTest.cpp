@@ -55,7 +55,6 @@ TEST(KStringT, LiteralsAreReferencedShortTextsInlineLongOnesOnTheHeap) {
 // A block holding c characters takes 2c + 10 bytes (header, text, NUL) rounded up to a power of two.
 TEST(KStringT, HeapBlocksRoundToPowersOfTwoAndCountReferences) {
   for (int32_t c = 0; c <= 3000; ++c) ASSERT_EQ(KStringHeap::BlockSize(c), static_cast<int32_t>(std::bit_ceil(2u * c + 10))) << c;
-  EXPECT_EQ(Header(Text(124), kSize), 512);
   KString grown;  // one character at a time: inline up to 59, then a heap block that doubles
   for (int32_t i = 0; i < 1000; ++i) {
     grown.Append(static_cast<char16_t>('a' + i % 26));
@@ -97,9 +96,7 @@ TEST(KStringT, CopiesBetweenSizesShareHeapBlocksAndMoveInlineTextsWhereTheyFit) 
   const KString heapText = Text(80), widened = KStringT<16>::FromUtf8("short");
   const KStringT<200> wide = heapText;
   narrow = heapText;  // drops its own block
-  EXPECT_EQ(UnitsOf(narrow), UnitsOf(heapText));
-  EXPECT_EQ(UnitsOf(wide), UnitsOf(heapText));
-  EXPECT_EQ(Header(heapText, kReferences), 3);
+  EXPECT_EQ(Header(heapText, kReferences), 3);  // one block for all three
   EXPECT_EQ(widened.GetStorage(), KString::kInline);
   EXPECT_EQ(widened.ToUtf8(), "short");
   EXPECT_EQ(UnitsOf(KStringT<16>(KString(kGreeting))), kGreeting);

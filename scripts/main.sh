@@ -7,6 +7,6 @@ bash scripts/install-deps.sh
 cmake -S . -B build/release -G Ninja -DCMAKE_BUILD_TYPE=Release -DTORVANE_TESTS=OFF -DTORVANE_BENCHMARKS=OFF
 cmake --build build/release
 if [ $# -eq 0 ]; then
-  set -- render KCompressorPlugin demo-compressed.wav
+  set -- render KCompressorPlugin demo-compressed.wav --set threshold=0.2 --set ratio=4 --set kneemode=Soft
 fi
 ./build/release/tools/torvane "$@"

@@ -52,7 +52,7 @@ TEST(KFormat, FloatingPoint) {
   char printed[512];
   for (const double value : {DBL_MAX, -DBL_MAX, 123.456, 1e-300, 5e-324, 9.9999995}) {
     for (const int precision : {0, 1, 2, 7, 17, 99}) {
-      const std::string pattern = "{0." + std::to_string(precision) + "}";
+      const std::string pattern = std::string("{0.").append(std::to_string(precision)).append("}");
       std::snprintf(printed, sizeof(printed), "%.*f", precision, value);
       EXPECT_EQ(Format(KString::FromUtf8(pattern), value), printed) << pattern << " " << value;
     }
@@ -67,7 +67,7 @@ TEST(KFormat, PlaceholdersAtOnePositionComeOutInWrittenOrder) {
   EXPECT_EQ(Format("a{32}b{-1}c{0}", KString("x")), "abcx");  // indices beyond the 32 slots produce nothing
   std::string pattern, expected;
   for (int i = 0; i < 32; ++i) {
-    pattern += "{" + std::to_string(i) + "},";
+    pattern.append("{").append(std::to_string(i)).append("},");
     expected += std::to_string(i * 3) + ",";
   }
   KFormat format(KString::FromUtf8(pattern));

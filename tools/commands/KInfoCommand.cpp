@@ -20,6 +20,11 @@ std::string Json(const KString& text) {
 
 std::string Number(double value) { return KFormatText("{0}", value).ToUtf8(); }
 
+std::string WithUnit(std::string text, const KString& unit) {
+  if (!unit.IsEmpty()) text.append(" ").append(unit.ToUtf8());
+  return text;
+}
+
 }  // namespace
 
 int KRunInfo(std::span<char* const> words) {
@@ -46,7 +51,7 @@ int KRunInfo(std::span<char* const> words) {
                   p.Steps(), p.IsAutomatable() ? "true" : "false");
     } else {
       std::printf("%3d  %-24s %-24s %-12s %s .. %s%s%s\n", i, p.Key().ToUtf8().c_str(), p.Name().ToUtf8().c_str(),
-                  (defaultText + (p.Unit().IsEmpty() ? "" : " " + p.Unit().ToUtf8())).c_str(), Number(kind.Minimum()).c_str(),
+                  WithUnit(defaultText, p.Unit()).c_str(), Number(kind.Minimum()).c_str(),
                   Number(kind.Maximum()).c_str(), p.Steps() > 0 ? KFormatText(" in {0} steps", p.Steps()).ToUtf8().c_str() : "",
                   p.IsAutomatable() ? "" : ", not automatable");
     }

@@ -13,6 +13,26 @@ void Copy(const char* text, Char (&field)[N]) noexcept {
   for (; text && text[i] != 0 && i + 1 < N; ++i) field[i] = static_cast<Char>(static_cast<unsigned char>(text[i]));
   for (; i < N; ++i) field[i] = 0;
 }
+
+// The fields every class-info record has.
+template <class Info>
+void FillBasic(Info& info, const KUID& classId, const KPluginDescription& description) noexcept {
+  classId.CopyTo(info.cid);
+  info.cardinality = PClassInfo::kManyInstances;
+  Copy(kAudioModuleClass, info.category);
+  Copy(description.name, info.name);
+}
+
+// The fields the second and third forms add (one text width each).
+template <class Info>
+void FillExtended(Info& info, const KUID& classId, const KPluginDescription& description) noexcept {
+  FillBasic(info, classId, description);
+  info.classFlags = 0;  // processor and controller are one object: not distributable
+  Copy(description.subCategories, info.subCategories);
+  Copy(KPluginFactory::kVendor, info.vendor);
+  Copy(description.version, info.version);
+  Copy(KPluginFactory::kSdkVersion, info.sdkVersion);
+}
 }  // namespace
 
 KPluginFactory::KPluginFactory(const KPluginDescription& description, KKernelLibrary& kernel) noexcept
@@ -48,38 +68,19 @@ int32_t KPluginFactory::CountClasses() { return 1; }
 
 TResult KPluginFactory::GetClassInfo(int32_t index, PClassInfo* info) {
   if (index != 0 || !info) return kInvalidArgument;
-  classId_.CopyTo(info->cid);
-  info->cardinality = PClassInfo::kManyInstances;
-  Copy(kAudioModuleClass, info->category);
-  Copy(description_.name, info->name);
+  FillBasic(*info, classId_, description_);
   return kResultOk;
 }
 
 TResult KPluginFactory::GetClassInfo2(int32_t index, PClassInfo2* info) {
   if (index != 0 || !info) return kInvalidArgument;
-  classId_.CopyTo(info->cid);
-  info->cardinality = PClassInfo::kManyInstances;
-  Copy(kAudioModuleClass, info->category);
-  Copy(description_.name, info->name);
-  info->classFlags = 0;  // processor and controller are one object: not distributable
-  Copy(description_.subCategories, info->subCategories);
-  Copy(kVendor, info->vendor);
-  Copy(description_.version, info->version);
-  Copy(kSdkVersion, info->sdkVersion);
+  FillExtended(*info, classId_, description_);
   return kResultOk;
 }
 
 TResult KPluginFactory::GetClassInfoUnicode(int32_t index, PClassInfoW* info) {
   if (index != 0 || !info) return kInvalidArgument;
-  classId_.CopyTo(info->cid);
-  info->cardinality = PClassInfo::kManyInstances;
-  Copy(kAudioModuleClass, info->category);
-  Copy(description_.name, info->name);
-  info->classFlags = 0;
-  Copy(description_.subCategories, info->subCategories);
-  Copy(kVendor, info->vendor);
-  Copy(description_.version, info->version);
-  Copy(kSdkVersion, info->sdkVersion);
+  FillExtended(*info, classId_, description_);
   return kResultOk;
 }
 

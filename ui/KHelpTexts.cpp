@@ -43,7 +43,7 @@ KString KHelpTexts::ActionItems(std::span<const char* const> actions) {
 }
 
 KString KHelpTexts::ControlHelp(const KString& helpText, std::span<const char* const> actions) {
-  KString text = Section(KString::Static(kControlMeaning));
+  KString text = Section(KString::Static(kControlMeaning)).Append(KString("<p>"));
   text.Append(helpText.IsEmpty() ? KString::Static(kNoHelp) : helpText);
   if (!actions.empty()) text.Append(Section(KString::Static(kMouseAndKeys))).Append(ActionItems(actions));
   return text.Append(KString("<p><s>")).Append(KString::Static(kF1Hint)).Append(KString("</s>"));

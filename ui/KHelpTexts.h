@@ -25,7 +25,7 @@ struct TORVANE_API KHelpTexts {
   static const KString& SemanticTagSets();
 
   // A section header: an inverted, centred, single-line title in large text; what follows is
-  // left-aligned again.
+  // left-aligned again, a blank line below the title.
   static KString Section(const KString& title);
   // One list item per action.
   static KString ActionItems(std::span<const char* const> actions);

@@ -26,7 +26,7 @@ enum KRichTextStyle : int32_t {
 // Colour indices: 0 is the default text colour, or the explicit colour value beside it.
 enum KRichTextColourIndex : int32_t { kColourDefault = 0, kColourRed = 2, kColourGreen = 3, kColourBlue = 4 };
 
-enum KRichTextAlignment : int32_t { kAlignLeft = 0, kAlignCenter = 1, kAlignRight = 2, kAlignJustify = 3 };
+enum KRichTextAlignment : int32_t { kParagraphLeft = 0, kParagraphCenter = 1, kParagraphRight = 2, kParagraphJustify = 3 };
 
 struct KRichTextFormat {
   int32_t style = kStyleNormal;
@@ -52,7 +52,7 @@ struct KRichTextBackground {
 };
 
 struct KRichTextParagraph {
-  int32_t alignment = kAlignLeft;
+  int32_t alignment = kParagraphLeft;
   bool singleLine = false;  // kept on one line, clipped rather than broken
   KRichTextBackground background;
   int32_t heading = 0;  // 1 or 2 inside header1 / header2, else 0

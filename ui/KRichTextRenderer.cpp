@@ -28,10 +28,10 @@ constexpr KBuiltInTag kBuiltInTags[] = {
     {"ci", KTagKind::kInvert, 0},
     {"c", KTagKind::kColour, 0},
     {"alpha", KTagKind::kAlpha, 0},
-    {"left", KTagKind::kParagraph, kAlignLeft},
-    {"center", KTagKind::kParagraph, kAlignCenter},
-    {"right", KTagKind::kParagraph, kAlignRight},
-    {"justify", KTagKind::kParagraph, kAlignJustify},
+    {"left", KTagKind::kParagraph, kParagraphLeft},
+    {"center", KTagKind::kParagraph, kParagraphCenter},
+    {"right", KTagKind::kParagraph, kParagraphRight},
+    {"justify", KTagKind::kParagraph, kParagraphJustify},
     {"p", KTagKind::kParagraph, -1},
     {"header1", KTagKind::kHeader, 1},
     {"header2", KTagKind::kHeader, 2},
@@ -111,7 +111,7 @@ void KRichTextRenderer::Reset() {
   opacities_ = Stack<uint8_t>(255);
   playedSets_ = Stack<KString>(KString());
   inversions_ = 0;
-  alignment_ = kAlignLeft;
+  alignment_ = kParagraphLeft;
   heading_ = 0;
   blocks_.assign(1, &document_.body);
   paragraph_.assign(1, -1);

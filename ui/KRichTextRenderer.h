@@ -88,7 +88,7 @@ private:
   Stack<uint8_t> opacities_{255};
   Stack<KString> playedSets_{KString()};
   int32_t inversions_ = 0;  // depth of ci
-  int32_t alignment_ = kAlignLeft;
+  int32_t alignment_ = kParagraphLeft;
   int32_t heading_ = 0;
   // The open blocks, innermost last, with each one's current paragraph and row (item indices,
   // -1 for none), and how many more were opened beyond the depth limit.

@@ -94,10 +94,10 @@ TEST(HelpWindow, TextsAndComposition) {
   const auto& header = std::get<KRichTextParagraph>(renderer.Document().body.items[0]);
   EXPECT_TRUE(header.background.invert);
   EXPECT_TRUE(header.singleLine);
-  EXPECT_EQ(header.alignment, kAlignCenter);
+  EXPECT_EQ(header.alignment, kParagraphCenter);
   EXPECT_EQ(header.runs[0].format.style, kStyleLarge2);
   const auto& body = std::get<KRichTextParagraph>(renderer.Document().body.items[2]);
-  EXPECT_EQ(body.alignment, kAlignLeft);
+  EXPECT_EQ(body.alignment, kParagraphLeft);
   EXPECT_EQ(body.runs.back().format.style, kStyleNormal);
 }
 

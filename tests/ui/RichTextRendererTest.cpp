@@ -141,8 +141,8 @@ TEST(RichTextRenderer, ParagraphKeepsTheAlignmentAndAlignmentTagsChangeIt) {
   std::vector<int32_t> alignments;
   for (const KRichTextParagraph* p : r.Paragraphs()) alignments.push_back(p->alignment);
   EXPECT_EQ(r.Lines(), (Lines{"a", "b", "c", "d", "e", "f", "g", "h"}));
-  EXPECT_EQ(alignments, (std::vector<int32_t>{kAlignLeft, kAlignCenter, kAlignCenter, kAlignCenter, kAlignRight, kAlignJustify,
-                                              kAlignJustify, kAlignLeft}));
+  EXPECT_EQ(alignments, (std::vector<int32_t>{kParagraphLeft, kParagraphCenter, kParagraphCenter, kParagraphCenter, kParagraphRight, kParagraphJustify,
+                                              kParagraphJustify, kParagraphLeft}));
   // "<p><p>" leaves a blank line; a closing paragraph tag makes the next text open a new one.
   EXPECT_EQ(Rendered("one<p><p>two</p>three").Lines(), (Lines{"one", "", "two", "three"}));
 }
@@ -151,13 +151,13 @@ TEST(RichTextRenderer, ParagraphAttributes) {
   const Rendered r("<center invert=1 singleline=1 fillalpha=50 fill=112233><l2>Section</l2><left>text<p fillalpha=-50 invert=x>");
   const auto p = r.Paragraphs();
   ASSERT_EQ(p.size(), 3u);
-  EXPECT_EQ(p[0]->alignment, kAlignCenter);
+  EXPECT_EQ(p[0]->alignment, kParagraphCenter);
   EXPECT_TRUE(p[0]->singleLine);
   EXPECT_TRUE(p[0]->background.invert);
   EXPECT_EQ(p[0]->background.fillAlpha, 0x50);
   EXPECT_EQ(p[0]->background.fill, 0xFF112233u);
   EXPECT_EQ(r.Run("Section").style, kStyleLarge2);
-  EXPECT_EQ(p[1]->alignment, kAlignLeft);
+  EXPECT_EQ(p[1]->alignment, kParagraphLeft);
   EXPECT_FALSE(p[1]->singleLine);
   EXPECT_EQ(p[2]->background.fillAlpha, 0xB0);  // -0x50 as a byte
   EXPECT_FALSE(p[2]->background.invert);         // non-numeric reads as 0

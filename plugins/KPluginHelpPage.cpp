@@ -3,8 +3,10 @@
 #include "core/KParameter.h"
 #include "kernel/KException.h"
 #include "kernel/KFormat.h"
+#include "ui/KDrawerToKBitmap.h"
 #include "ui/KHelpTexts.h"
 #include "ui/KRichTextHtml.h"
+#include "ui/KRichTextLayout.h"
 #include "ui/KRichTextPlain.h"
 #include "ui/KRichTextRenderer.h"
 
@@ -76,3 +78,15 @@ std::string KPluginHelpPage::Html() const {
   }
   return page.Finish();
 }
+
+KBitmap KPluginHelpPage::Picture(int32_t width, double scale) const {
+  const KRichTextDocument document = Document();
+  const KRichTextLayout layout(document, width - 2 * kMargin, scale);
+  KBitmap picture(static_cast<int32_t>(width * scale), static_cast<int32_t>((layout.Height() + 2 * kMargin) * scale));
+  KDrawerToKBitmap drawer(picture, scale);
+  drawer.FillRectangle(picture.Bounds(), KRichTextLook().paper, 255, kDrawCopy);
+  layout.Draw(drawer, {kMargin, kMargin});
+  return picture;
+}
+
+std::string KPluginHelpPage::PicturePNG(int32_t width, double scale) const { return Picture(width, scale).EncodePNG(); }

@@ -7,6 +7,7 @@
 #include "kernel/KExport.h"
 #include "kernel/KString.h"
 #include "plugins/KPluginHelp.h"
+#include "ui/KBitmap.h"
 #include "ui/KRichTextDocument.h"
 
 // The help of one plug-in instance: its help data with the placeholders filled from the
@@ -27,6 +28,11 @@ public:
   KRichTextDocument Document() const;
   std::string PlainText() const;
   std::string Html() const;
+  // The help as the help window draws it: `width` logical units wide (margins included), all of
+  // it, at `scale` pixels per unit, by the software drawer.
+  KBitmap Picture(int32_t width, double scale) const;
+  std::string PicturePNG(int32_t width, double scale) const;  // the same as PNG file bytes
+  static constexpr int32_t kMargin = 12;
 
 private:
   KAudioPlugin& plugin_;

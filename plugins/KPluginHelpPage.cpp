@@ -18,10 +18,11 @@ const KPluginHelp& HelpOf(const KAudioPlugin& plugin) {
   return *help;
 }
 
-// A value as the parameter displays it, with its unit, written so that it reads as text in mark-up.
+// A value as the parameter displays it, with its unit after a blank that never breaks a line,
+// written so that it reads as text in mark-up.
 KString Display(const KAudioPluginBase::Parameter& p, double normalized) {
   KString text = p.TextForNormalized(normalized);
-  if (!p.Unit().IsEmpty()) text.Append(u' ').Append(p.Unit());
+  if (!p.Unit().IsEmpty()) text.Append(u'\u00A0').Append(p.Unit());
   return KHelpTexts::Escape(text);
 }
 

@@ -64,9 +64,9 @@ TEST(PluginHelp, RangesComeFromTheParameters) {
   const KPluginHelpPage page(*plugin);
   const std::string freq = page.ParameterText(12).ToUtf8();  // band 3 frequency
   EXPECT_NE(freq.find("<control>Band 3 frequency</control>"), std::string::npos) << freq;
-  EXPECT_NE(freq.find("<range>20.0 Hz</range> to <range>20000 Hz</range>, default <value>350 Hz</value>"), std::string::npos) << freq;
+  EXPECT_NE(freq.find("<range>20.0\u00A0Hz</range> to <range>20000\u00A0Hz</range>, default <value>350\u00A0Hz</value>"), std::string::npos) << freq;
   const auto utility = Create("KUtilityPlugin");
-  EXPECT_NE(KPluginHelpPage(*utility).ParameterText(0).ToUtf8().find("<range>-60.0 dB</range>"), std::string::npos);
+  EXPECT_NE(KPluginHelpPage(*utility).ParameterText(0).ToUtf8().find("<range>-60.0\u00A0dB</range>"), std::string::npos);
 }
 
 TEST(PluginHelp, PluginWithoutHelpIsRefused) {

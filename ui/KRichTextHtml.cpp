@@ -4,6 +4,7 @@
 #include <type_traits>
 
 #include "kernel/KFormat.h"
+#include "ui/KVectorIcons.h"
 
 namespace {
 
@@ -20,7 +21,8 @@ constexpr const char* kStyleSheet =
     ".reference,.symbol{color:#880000;font-weight:bold}.example{font-style:italic}\n"
     ".cred{color:#880000;font-weight:bold}.cgreen{color:#008800;font-weight:bold}.cblue{color:#000088;font-weight:bold}\n"
     "table.row{border-collapse:separate;width:100%}td{vertical-align:top}ul{margin:0}\n"
-    ".icon{display:inline-block;width:1em;height:1em;vertical-align:-.15em;border:1px solid #888;border-radius:2px}"
+    ".icon{width:1.15em;height:1.15em;vertical-align:-.2em}"
+    ".image{display:inline-block;width:1em;height:1em;vertical-align:-.15em;border:1px solid #888;border-radius:2px}"
     ".shape{display:inline-block;vertical-align:middle}\n";
 
 constexpr const char* kStyleClasses[] = {nullptr, "b", "i", "s", "l1", "l2", "l3", "l4"};
@@ -36,10 +38,17 @@ std::string Css(uint32_t colour, uint32_t opacity = 255) {
               static_cast<int32_t>(colour & 0xFF), alpha);
 }
 
+// "12px" or "25%", or `fallback` for an unset size.
+std::string Length(const KMarkupSize& size, const char* fallback) {
+  if (size.unit == KMarkupSize::kPixels) return Text("{0}px", size.value);
+  if (size.unit == KMarkupSize::kPercent) return Text("{0}%", size.value);
+  return fallback;
+}
+
+// "width:12px;" or nothing for an unset size.
 std::string Size(const char* property, const KMarkupSize& size) {
-  if (size.unit == KMarkupSize::kPixels) return Text("{0}:{1}px;", KString::Static(property), size.value);
-  if (size.unit == KMarkupSize::kPercent) return Text("{0}:{1}%;", KString::Static(property), size.value);
-  return {};
+  const std::string length = Length(size, "");
+  return length.empty() ? length : std::string(property) + ":" + length + ";";
 }
 
 // A tag set's name becomes a class only when it is a plain word.
@@ -181,7 +190,11 @@ void KRichTextHtml::Row(const KRichTextDocument& document, const KRichTextRow& r
 void KRichTextHtml::Element(const KRichTextElement& e, bool inLine) {
   switch (e.kind) {
     case KRichTextElement::kImage:
-      page_.append("<span class=\"icon\" title=\"");
+      if (const std::string svg = KVectorIcons::Svg(e.icon); !svg.empty()) {
+        page_.append(svg);
+        break;
+      }
+      page_.append("<span class=\"image\" title=\"");
       AppendEscaped(e.icon.IsEmpty() ? (e.bitmap.IsEmpty() ? KFormatText("image {0}", e.number) : e.bitmap) : e.icon, page_);
       page_.append("\"></span>");
       break;
@@ -192,8 +205,7 @@ void KRichTextHtml::Element(const KRichTextElement& e, bool inLine) {
       break;
     case KRichTextElement::kRectangle:
     case KRichTextElement::kIndicator: {
-      std::string style = "width:" + (e.width.unit == KMarkupSize::kAuto ? std::string("1em;") : Size("", e.width).substr(1));
-      style += "height:" + (e.height.unit == KMarkupSize::kAuto ? std::string("1em;") : Size("", e.height).substr(1));
+      std::string style = "width:" + Length(e.width, "1em") + ";height:" + Length(e.height, "1em") + ";";
       if (e.borderColour) style += "border:1px solid " + Css(e.borderColour) + ";";
       const std::string fill = Css(e.colour ? e.colour : 0xFF000000);
       if (e.kind == KRichTextElement::kRectangle) {

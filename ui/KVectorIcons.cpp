@@ -1,6 +1,7 @@
 #include "ui/KVectorIcons.h"
 
 #include <cmath>
+#include <cstdio>
 #include <cstdlib>
 #include <vector>
 
@@ -99,7 +100,15 @@ constexpr KNames kNames;
 constexpr double kPi = 3.141592653589793;
 constexpr double kStroke = 1.5;  // grid units
 
-// Reads the numbers of one shape ("8,3 8,13" or "8,8,5.5,30,320").
+// One shape of an icon in grid units: a stroked polyline, a filled polygon, a stroked circle or
+// a filled disc (arcs become polylines, arrowheads polygons).
+struct KShape {
+  char kind;  // 'L', 'P', 'C', 'D'
+  std::vector<KPointF> points;
+  double radius = 0;  // circles: centre in points[0]
+};
+
+// Reads the numbers of one shape ("8,3 8,13" or "8,8,5.5,30,320") and whether it ends in ">".
 std::vector<double> Numbers(const char*& at, bool& arrow) {
   std::vector<double> values;
   arrow = false;
@@ -117,6 +126,45 @@ std::vector<double> Numbers(const char*& at, bool& arrow) {
   return values;
 }
 
+std::vector<KShape> Shapes(const KIcon& icon) {
+  std::vector<KShape> shapes;
+  const char* text = icon.shapes;
+  while (*text != '\0') {
+    while (*text == ' ') ++text;
+    const char kind = *text;
+    if (kind == '\0') break;
+    bool arrow = false;
+    const std::vector<double> v = Numbers(++text, arrow);
+    KShape shape{kind == 'A' ? 'L' : kind, {}};
+    if (kind == 'C' || kind == 'D') {
+      if (v.size() >= 3) shapes.push_back({kind, {{v[0], v[1]}}, v[2]});
+      continue;
+    }
+    if (kind == 'A' && v.size() >= 5) {
+      constexpr int32_t kSteps = 24;
+      for (int32_t s = 0; s <= kSteps; ++s) {
+        const double a = (v[3] + (v[4] - v[3]) * s / kSteps) * kPi / 180.0;
+        shape.points.push_back({v[0] + v[2] * std::sin(a), v[1] - v[2] * std::cos(a)});
+      }
+    } else {
+      for (size_t i = 0; i + 1 < v.size(); i += 2) shape.points.push_back({v[i], v[i + 1]});
+    }
+    if (shape.points.size() < 2) continue;
+    shapes.push_back(shape);
+    if (!arrow) continue;
+    // A filled head along the last segment.
+    const KPointF tip = shape.points.back(), from = shape.points[shape.points.size() - 2];
+    const double dx = tip.x - from.x, dy = tip.y - from.y, length = std::hypot(dx, dy);
+    if (length <= 0) continue;
+    const double ux = dx / length, uy = dy / length, size = 3.2;
+    shapes.push_back({'P',
+                      {{tip.x + ux, tip.y + uy},
+                       {tip.x - ux * size + uy * size * 0.8, tip.y - uy * size - ux * size * 0.8},
+                       {tip.x - ux * size - uy * size * 0.8, tip.y - uy * size + ux * size * 0.8}}});
+  }
+  return shapes;
+}
+
 }  // namespace
 
 std::span<const char* const> KVectorIcons::Names() noexcept { return kNames.names; }
@@ -128,64 +176,51 @@ bool KVectorIcons::Paint(KDrawer& drawer, const KString& name, const KRect& rect
   if (!icon) return false;
   const double side = static_cast<double>(std::min(rect.Width(), rect.Height()));
   const double unit = side / 16.0;
+  // Grid (0, 0) is the square's top-left edge, half a pixel before the centre of its first pixel.
   const double left = static_cast<double>(rect.left) + (static_cast<double>(rect.Width()) - side) / 2 - 0.5;
   const double top = static_cast<double>(rect.top) + (static_cast<double>(rect.Height()) - side) / 2 - 0.5;
-  auto at = [&](double x, double y) { return KPointF{left + x * unit, top + y * unit}; };
   const double savedWidth = drawer.LineWidth();
   drawer.SetLineWidth(kStroke * unit);
-
-  std::vector<KPointF> points;
-  const char* text = icon->shapes;
-  while (*text != '\0') {
-    while (*text == ' ') ++text;
-    const char kind = *text;
-    if (kind == '\0') break;
-    bool arrow = false;
-    const std::vector<double> v = Numbers(++text, arrow);
-    points.clear();
-    switch (kind) {
-      case 'L':
-      case 'P':
-        for (size_t i = 0; i + 1 < v.size(); i += 2) points.push_back(at(v[i], v[i + 1]));
-        break;
-      case 'A': {
-        if (v.size() < 5) break;
-        const int32_t steps = 24;
-        for (int32_t s = 0; s <= steps; ++s) {
-          const double a = (v[3] + (v[4] - v[3]) * s / steps) * kPi / 180.0;
-          points.push_back(at(v[0] + v[2] * std::sin(a), v[1] - v[2] * std::cos(a)));
-        }
-        break;
-      }
-      case 'C':
-      case 'D':
-        if (v.size() >= 3) {
-          const KPointF centre = at(v[0], v[1]);
-          kind == 'C' ? drawer.Circle(centre, v[2] * unit, colour, opacity, kDrawBlend)
-                      : drawer.FillCircle(centre, v[2] * unit, colour, opacity, kDrawBlend);
-        }
-        continue;
-      default:
-        continue;
-    }
-    if (points.size() < 2) continue;
-    if (kind == 'P') {
-      drawer.FillPolygon(points, {}, colour, opacity, kDrawBlend);
-      continue;
-    }
-    drawer.PolyLineF(points, colour, opacity, kDrawBlend);
-    if (arrow) {
-      // A filled head along the last segment, three stroke widths long.
-      const KPointF tip = points.back(), from = points[points.size() - 2];
-      const double dx = tip.x - from.x, dy = tip.y - from.y, length = std::hypot(dx, dy);
-      if (length <= 0) continue;
-      const double ux = dx / length, uy = dy / length, size = 3.2 * unit;
-      const KPointF head[3] = {{tip.x + ux * unit, tip.y + uy * unit},
-                               {tip.x - ux * size + uy * size * 0.8, tip.y - uy * size - ux * size * 0.8},
-                               {tip.x - ux * size - uy * size * 0.8, tip.y - uy * size + ux * size * 0.8}};
-      drawer.FillPolygon(head, {}, colour, opacity, kDrawBlend);
+  for (KShape& shape : Shapes(*icon)) {
+    for (KPointF& p : shape.points) p = {left + p.x * unit, top + p.y * unit};
+    switch (shape.kind) {
+      case 'L': drawer.PolyLineF(shape.points, colour, opacity, kDrawBlend); break;
+      case 'P': drawer.FillPolygon(shape.points, {}, colour, opacity, kDrawBlend); break;
+      case 'C': drawer.Circle(shape.points[0], shape.radius * unit, colour, opacity, kDrawBlend); break;
+      default: drawer.FillCircle(shape.points[0], shape.radius * unit, colour, opacity, kDrawBlend); break;
     }
   }
   drawer.SetLineWidth(savedWidth);
   return true;
+}
+
+std::string KVectorIcons::Svg(const KString& name) {
+  const KIcon* icon = Find(name);
+  if (!icon) return {};
+  std::string svg = "<svg class=\"icon\" viewBox=\"0 0 16 16\" fill=\"currentColor\" stroke=\"currentColor\" stroke-width=\"1.5\" "
+                    "stroke-linejoin=\"round\">";
+  char number[32];
+  auto append = [&](double value) { svg.append(number, static_cast<size_t>(std::snprintf(number, sizeof number, "%.2f", value))); };
+  for (const KShape& shape : Shapes(*icon)) {
+    if (shape.kind == 'C' || shape.kind == 'D') {
+      svg.append("<circle cx=\"");
+      append(shape.points[0].x);
+      svg.append("\" cy=\"");
+      append(shape.points[0].y);
+      svg.append("\" r=\"");
+      append(shape.radius);
+      svg.append(shape.kind == 'C' ? "\" fill=\"none\"/>" : "\" stroke=\"none\"/>");
+      continue;
+    }
+    svg.append(shape.kind == 'L' ? "<polyline fill=\"none\" points=\"" : "<polygon stroke=\"none\" points=\"");
+    for (const KPointF& p : shape.points) {
+      append(p.x);
+      svg.push_back(',');
+      append(p.y);
+      svg.push_back(' ');
+    }
+    svg.back() = '"';
+    svg.append("/>");
+  }
+  return svg.append("</svg>");
 }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <span>
+#include <string>
 
 #include "kernel/KExport.h"
 #include "kernel/KString.h"
@@ -14,4 +15,7 @@ struct TORVANE_API KVectorIcons {
   static bool Has(const KString& name) noexcept;
   // Paints the icon into `rect` (square: the smaller side, centred); false for an unknown name.
   static bool Paint(KDrawer& drawer, const KString& name, const KRect& rect, KColor colour, uint8_t opacity);
+  // The same icon as an inline SVG element in the current text colour, or empty for an unknown
+  // name.
+  static std::string Svg(const KString& name);
 };

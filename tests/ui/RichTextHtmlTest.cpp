@@ -51,4 +51,11 @@ TEST(RichTextHtml, StructureFollowsTheDocument) {
   EXPECT_TRUE(Has(page, "<h3 style=\"text-align:center;\"><span class=\"l1\">H</span></h3>"));
 }
 
+TEST(RichTextHtml, IconsAreInlineVectorShapes) {
+  const std::string page = Page("press <img icon=play> or <img icon=nosuch>");
+  EXPECT_TRUE(Has(page, "<svg class=\"icon\" viewBox=\"0 0 16 16\"")) << page;
+  EXPECT_TRUE(Has(page, "<polygon stroke=\"none\" points=\"4.50,2.50 13.00,8.00 4.50,13.50\"/></svg>"));
+  EXPECT_TRUE(Has(page, "<span class=\"image\" title=\"nosuch\"></span>"));
+}
+
 }  // namespace

@@ -13,8 +13,11 @@
 namespace {
 // The elements and attributes the writer makes; anything else in the page came from the text.
 constexpr std::string_view kElements[] = {"!DOCTYPE", "html", "head", "meta", "title", "style", "body", "h1", "h2", "h3", "h4",
-                                          "h5", "h6", "div", "span", "br", "ul", "li", "table", "tr", "td", "hr"};
-constexpr std::string_view kAttributes[] = {"html", "lang", "charset", "class", "style", "title"};
+                                          "h5", "h6", "div", "span", "br", "ul", "li", "table", "tr", "td", "hr", "svg",
+                                          "polyline", "polygon", "circle"};
+constexpr std::string_view kAttributes[] = {"html",   "lang",         "charset",         "class", "style", "title", "viewBox",
+                                            "fill",   "stroke",       "stroke-width",    "points", "cx",   "cy",    "r",
+                                            "stroke-linejoin"};
 
 template <size_t N>
 bool Listed(std::string_view word, const std::string_view (&list)[N]) {
@@ -33,7 +36,7 @@ bool OnlyOwnMarkup(const std::string& page) {
     while (i < page.size() && isName(page[i])) ++i;
     if (!Listed(std::string_view(page).substr(start, i - start), kElements)) return false;
     while (i < page.size() && page[i] != '>') {
-      if (page[i] == ' ') {
+      if (page[i] == ' ' || (page[i] == '/' && page[i + 1] == '>')) {
         ++i;
         continue;
       }

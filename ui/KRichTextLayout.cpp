@@ -265,11 +265,14 @@ int32_t KRichTextLayout::Row(const KRichTextRow& row, int32_t x, int32_t y, int3
   for (int32_t c = 0; c < count; ++c) {
     const KRichTextBlock& cell = *row.cells[static_cast<size_t>(c)];
     int32_t w = cell.width.unit == KMarkupSize::kAuto || cell.width.value <= 0 ? -1 : cell.width.Resolve(available, 1, -1);
-    if (w < 0 && cell.autoSize) {
-      // As wide as its content laid out in what is left.
+    if (w < 0 && cell.autoSize && measuring_ == 0) {
+      // As wide as its content laid out in what is left. Cells inside it are not measured in
+      // turn, so nested automatic cells cost linear, not exponential, work.
       const size_t mark = pieces_.size();
       const int32_t padding = cell.padding >= 0 ? cell.padding : row.padding;
+      ++measuring_;
       Block(cell, 0, 0, std::max(available - used, 1));
+      --measuring_;
       int32_t right = 0;
       for (size_t i = mark; i < pieces_.size(); ++i) right = std::max(right, pieces_[i].rect.right + 1);
       pieces_.resize(mark);

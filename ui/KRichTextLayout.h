@@ -64,6 +64,6 @@ private:
   double scale_;
   KRichTextLook look_;
   int32_t height_ = 0;
-  int32_t depth_ = 0;  // nesting of cells and list items being laid out
+  int32_t measuring_ = 0;  // above 0 while a cell is laid out only to learn its width
   std::vector<Piece> pieces_;
 };

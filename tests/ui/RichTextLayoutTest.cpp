@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <chrono>
 #include <cmath>
 #include <map>
 #include <memory>
@@ -175,6 +176,22 @@ TEST(RichTextLayout, LayoutInLogicalUnitsHoldsAtEveryScale) {
   EXPECT_EQ(one.Of(Piece::kText).size(), two.Of(Piece::kText).size());
   // Hinted metrics differ by up to a unit per line between scales.
   EXPECT_NEAR(one.layout->Height(), two.layout->Height(), double(one.Of(Piece::kText).size()));
+}
+
+TEST(RichTextLayout, HostileDocumentsTakeBoundedWork) {
+  // Automatic cells nested as deep as the renderer allows, and a row of thousands of cells.
+  std::string nested;
+  for (int i = 0; i < 40; ++i) nested += "<tr><td autosize=1 padding=1 border=1>word ";
+  const auto start = std::chrono::steady_clock::now();
+  const Laid deep(nested.c_str(), 600);
+  std::string wide = "<tr>";
+  for (int i = 0; i < 5000; ++i) wide += "<td>x</td>";
+  const Laid cells(wide.c_str(), 300);
+  const double seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+  EXPECT_LT(seconds, 20.0);  // exponential work would not end at all
+  EXPECT_EQ(deep.Of(Piece::kText).size(), 40u);  // cells beyond the depth limit are read as content
+  EXPECT_EQ(cells.Of(Piece::kText).size(), 5000u);
+  for (const Piece& p : cells.Of(Piece::kText)) EXPECT_GE(p.rect.left, 0);
 }
 
 }  // namespace

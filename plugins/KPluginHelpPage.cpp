@@ -18,12 +18,14 @@ const KPluginHelp& HelpOf(const KAudioPlugin& plugin) {
   return *help;
 }
 
-// A value as the parameter displays it, with its unit after a blank that never breaks a line,
-// written so that it reads as text in mark-up.
+// A value as the parameter displays it, with its unit, written so that it reads as text in
+// mark-up and never breaks across lines ("1.80 : 1", "20.0 Hz").
 KString Display(const KAudioPluginBase::Parameter& p, double normalized) {
   KString text = p.TextForNormalized(normalized);
-  if (!p.Unit().IsEmpty()) text.Append(u'\u00A0').Append(p.Unit());
-  return KHelpTexts::Escape(text);
+  if (!p.Unit().IsEmpty()) text.Append(u' ').Append(p.Unit());
+  KString kept;
+  for (int32_t i = 0; i < text.Length(); ++i) kept.Append(text.CharAt(i) == u' ' ? u'\u00A0' : text.CharAt(i));
+  return KHelpTexts::Escape(kept);
 }
 
 // Mark-up rendered after the semantic tag sets.

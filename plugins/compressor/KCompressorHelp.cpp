@@ -33,10 +33,10 @@ constexpr KParameterHelp kParameters[] = {
      "Range <range>{0}</range> to <range>{1}</range>, default <value>{2}</value>.<p>"
      "Tip: lower it until the meter shows a few dB of gain reduction on the loudest parts only."},
     {"ratio",
-     "<control>Ratio</control> sets how strongly levels above the threshold are reduced: at <value>4 : 1</value>, a signal 8 dB "
+     "<control>Ratio</control> sets how strongly levels above the threshold are reduced: at <value>4&nbsp;:&nbsp;1</value>, a signal 8 dB "
      "over the threshold comes out only 2 dB over it. "
      "Range <range>{0}</range> to <range>{1}</range>, default <value>{2}</value>.<p>"
-     "Tip: <example>2 : 1</example> glues a mix gently; <example>8 : 1</example> and above behave like a limiter."},
+     "Tip: <example>2&nbsp;:&nbsp;1</example> glues a mix gently; <example>8&nbsp;:&nbsp;1</example> and above behave like a limiter."},
     {"kneemode",
      "<control>Knee mode</control> shapes the change from no compression to full compression around the threshold: "
      "<value>Hard</value> switches at once, <value>Linear</value> and <value>Soft</value> blend over the "

@@ -2,6 +2,7 @@
 #include "core/KAudioPlugin.h"
 #include "hosts/vst3/KAudioPluginVST3Adapter.h"
 #include "hosts/vst3/KVST3ClassId.h"
+#include "hosts/vst3/KVST3Parameters.h"
 #include "kernel/KEntryPoints.h"
 #include "plugins/utility/KUtilityPlugin.h"
 #include "tests/core/AllocationCounter.h"
@@ -30,7 +31,16 @@ TEST(VST3Bundles, EveryCataloguePluginHasABundleThatDescribesAndMakesIt) {
     EXPECT_EQ(std::tuple(std::string(factory.vendor), bundle.factory->CountClasses(), std::string(info.category), std::string(info.subCategories).substr(0, 3),
                          std::u16string(info.name), std::u16string(info.version)),
               std::tuple("Torvane", 1, "Audio Module Class", "Fx|", std::u16string(name.begin(), name.end()), u"" TORVANE_VERSION));
+    // Every parameter of the plug-in can be automated: a host hides the others from its controls.
     KInstance made(bundle.Create());
+    KHost host;
+    ASSERT_EQ(made.component->Initialize(static_cast<IHostApplication*>(&host)), kResultOk);
+    for (int32_t index = 0, count = made.controller->GetParameterCount(); index < count; ++index) {
+      ParameterInfo parameter{};
+      ASSERT_EQ(made.controller->GetParameterInfo(index, parameter), kResultOk);
+      EXPECT_TRUE(parameter.id >= KParameterTable::kFirstController || (parameter.flags & ParameterInfo::kCanAutomate)) << name << " " << parameter.id;
+    }
+    EXPECT_EQ(made.component->Terminate(), kResultOk);
   }
 }
 

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
 
 #include "core/KAudioPlugin.h"
 #include "hosts/common/KHostRamp.h"
@@ -26,15 +27,18 @@ void RampThrough(IParamValueQueue& queue, int32_t first, int32_t points, int32_t
   ramp.Commit();
 }
 
+// Each state flag of the process context and the validity it gives.
+constexpr std::pair<uint32_t, uint32_t> kValidity[] = {
+    {ProcessContext::kTempoValid, KHostTime::kTempoValid},       {ProcessContext::kProjectTimeMusicValid, KHostTime::kSongPositionValid},
+    {ProcessContext::kBarPositionValid, KHostTime::kBarStartValid}, {ProcessContext::kTimeSigValid, KHostTime::kSignatureValid},
+    {ProcessContext::kCycleValid, KHostTime::kCycleValid},       {ProcessContext::kPlaying, KHostTime::kPlaying},
+};
+
 // What the process context reports, with the validity its state flags give.
 KHostTime TimeOf(const ProcessContext& context) noexcept {
-  const uint32_t state = context.state;
   KHostTime time;
-  time.valid = ((state & ProcessContext::kTempoValid) ? KHostTime::kTempoValid : 0) |
-               ((state & ProcessContext::kProjectTimeMusicValid) ? KHostTime::kSongPositionValid : 0) |
-               ((state & ProcessContext::kBarPositionValid) ? KHostTime::kBarStartValid : 0) |
-               ((state & ProcessContext::kTimeSigValid) ? KHostTime::kSignatureValid : 0) |
-               ((state & ProcessContext::kCycleValid) ? KHostTime::kCycleValid : 0) | ((state & ProcessContext::kPlaying) ? KHostTime::kPlaying : 0);
+  for (const auto& [flag, valid] : kValidity)
+    if (context.state & flag) time.valid |= valid;
   time.samplePosition = static_cast<double>(context.projectTimeSamples);
   time.tempo = context.tempo;
   time.songPosition = context.projectTimeMusic;

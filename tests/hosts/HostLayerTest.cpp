@@ -8,6 +8,7 @@
 #include "core/KTransport.h"
 #include "hosts/common/KHostChannelMap.h"
 #include "hosts/common/KHostEcho.h"
+#include "hosts/common/KHostEntry.h"
 #include "hosts/common/KHostGuard.h"
 #include "hosts/common/KHostMIDIList.h"
 #include "hosts/common/KHostRamp.h"
@@ -16,6 +17,7 @@
 #include "tests/core/AllocationCounter.h"
 #include "tests/core/RecordingPlugin.h"
 #include "tests/core/TraceCapture.h"
+#include "kernel/KUserMessage.h"
 
 namespace {
 auto Fields(const KTransport& t) {
@@ -144,4 +146,20 @@ TEST(HostGuard, AKExceptionIsSilentAnythingElseIsTracedWithTheOperation) {
   EXPECT_EQ(KHostGuarded("KAdapter::second", -1, []() -> int { throw KException("for the user"); }), -1);
   EXPECT_EQ(KHostGuarded("KAdapter::third", -1, []() -> int { throw std::runtime_error("bug"); }), -1);
   EXPECT_EQ(KTraceCapture::Lines(), std::vector<std::string>{"SYSTEM EXCEPTION! KAdapter::third"});
+}
+
+// The creation entry: the loader's two names joined; an unknown name is a KException that the
+// entry answers with null silently; anything else is shown with the format's caption.
+TEST(HostEntry, NamesJoinUnknownOnesAreSilentAndOtherFailuresAreShown) {
+  static std::vector<std::string> messages;
+  const KUserMessageHook previous = KSetUserMessageHook([](const KString& text) { messages.push_back(text.ToUtf8()); });
+  const std::unique_ptr<KAudioPlugin> made = KHostCreatePlugin("KUtility", "Plugin");
+  EXPECT_EQ(made ? made->Identifier().ToUtf8() : "", "KUtilityPlugin");
+  int built = 0;
+  const auto make = [&](const char* name) { return KHostEntryGuarded<int>("VST9 Plugin main", "KEntry", [&] { return KHostCreatePlugin(name, "") ? &built : nullptr; }); };
+  EXPECT_EQ(make("KUtilityPlugin"), &built);
+  EXPECT_EQ(make("KNoSuchPlugin"), nullptr);
+  EXPECT_EQ(KHostEntryGuarded<int>("VST9 Plugin main", "KEntry", []() -> int* { throw std::bad_alloc(); }), nullptr);
+  KSetUserMessageHook(previous);
+  EXPECT_EQ(messages, std::vector<std::string>{"VST9 Plugin main\n\nSYSTEM EXCEPTION! KEntry"});
 }

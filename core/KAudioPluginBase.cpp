@@ -143,7 +143,7 @@ int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& sub
     ApplyLast(*ramp);
     Retire(ramp);
   }
-  position_ = 0;  // the grid starts again where values landed at once
+  if (jump) position_ = 0;  // the grid starts again where values landed at once
   remaining_ = 0;
   rampsAdded_ = false;
   return limit;

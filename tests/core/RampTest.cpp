@@ -114,24 +114,27 @@ TEST_F(RampTest, PostedRampsStartAtTheNextBlockAndNeverLoseTheirFinalValue) {
 // the first after it): every sample sees the lane's value at the grid line before it, the same
 // whatever the block size, so the audio cannot depend on where blocks begin.
 TEST(FineRampGrid, EverySampleSeesTheSameValueWhateverTheBlockSize) {
-  const std::vector<Point> lane = {{40, 0.5}, {3000, 0.1}, {3000, 0.8}, {7777, 0.3}, {9001, 0.9}};  // a step at 3000
+  const std::vector<Point> lane = {{1000, 0.5}, {3000, 0.1}, {3000, 0.8}, {7777, 0.3}, {9001, 0.9}};  // a step at 3000
   constexpr int32_t kLength = 10000;
   const auto valuesIn = [&](auto nextBlock) {
     KRecordingPlugin plugin(1);
+    plugin.GetParameter(0).SetNormalized(lane.front().value);
     KBlockBuffers buffers(2, 2, 4096);
     std::vector<double> values;
-    for (int32_t start = 0; start < kLength;) {
-      const int32_t n = std::min(nextBlock(), kLength - start);
-      const auto after = std::find_if(lane.begin(), lane.end(), [&](const Point& p) { return p.time > start; });
-      std::vector<Point> points = {after == lane.begin() ? Point{0, lane.front().value} : Point{after[-1].time - start, after[-1].value}};
-      auto corner = after;
-      for (; corner != lane.end() && corner->time < start + n; ++corner) points.push_back({corner->time - start, corner->value});
-      points.push_back(corner != lane.end() ? Point{corner->time - start, corner->value} : Point{n, lane.back().value});
-      EXPECT_TRUE(plugin.AddRamp(0, points, true));
+    for (int32_t start = 0, n = 0; start < kLength; start += n) {
+      n = std::min(nextBlock(), kLength - start);
+      // While the lane holds, before its first corner and after its last, the host sends nothing.
+      if (start + n > lane.front().time && start <= lane.back().time) {
+        const auto after = std::find_if(lane.begin(), lane.end(), [&](const Point& p) { return p.time > start; });
+        std::vector<Point> points = {after == lane.begin() ? Point{0, lane.front().value} : Point{after[-1].time - start, after[-1].value}};
+        auto corner = after;
+        for (; corner != lane.end() && corner->time < start + n; ++corner) points.push_back({corner->time - start, corner->value});
+        points.push_back(corner != lane.end() ? Point{corner->time - start, corner->value} : Point{n, lane.back().value});
+        EXPECT_TRUE(plugin.AddRamp(0, points, true));
+      }
       plugin.Run(buffers, n);
       for (int32_t call = 0; const KRecordingPlugin::Entry& e : plugin.Log())
         if (e.kind == KRecordingPlugin::Entry::kProcess) values.insert(values.end(), static_cast<size_t>(e.length), plugin.Seen(call++, 0));
-      start += n;
     }
     return values;
   };

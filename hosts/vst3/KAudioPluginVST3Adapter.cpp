@@ -2,8 +2,8 @@
 
 #include <utility>
 
-#include "hosts/vst3/KVST3ChannelContext.h"
 #include "hosts/common/KHostGuard.h"
+#include "hosts/vst3/KVST3ChannelContext.h"
 #include "hosts/vst3/KVST3ClassId.h"
 #include "hosts/vst3/KVST3MIDIOutput.h"
 #include "hosts/vst3/KVST3ProcessInput.h"

@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # Installs every package the build, the tests and the benchmarks need (Debian 12); chromium
-# opens the exported help pages headless.
+# opens the exported help pages headless; the LV2 headers, validator (sordi) and command-line
+# hosts (lilv-utils, lv2file) build and test the LV2 bundles.
 # With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in.
 set -euo pipefail
 SUDO=""
@@ -11,7 +12,7 @@ packages=(ca-certificates g++ cmake ninja-build pkg-config
   clang libclang-rt-14-dev
   libpng-dev libwebp-dev libfreetype-dev fonts-dejavu-core fonts-dejavu-extra
   libepoxy-dev libegl-dev libegl1-mesa-dev libgl1-mesa-dri libcairo2-dev
-  chromium)
+  chromium lv2-dev sordi lilv-utils lv2file)
 [ "${1:-}" = "--hosts" ] && packages+=(ardour)
 $SUDO apt-get update -q
 $SUDO apt-get install -y -q --no-install-recommends "${packages[@]}"

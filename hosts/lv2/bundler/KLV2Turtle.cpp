@@ -1,0 +1,132 @@
+#include "hosts/lv2/bundler/KLV2Turtle.h"
+
+#include <charconv>
+#include <cmath>
+#include <string_view>
+
+#include "core/KAudioPlugin.h"
+#include "core/KParameter.h"
+#include "hosts/lv2/KLV2Ports.h"
+
+namespace KLV2 {
+namespace {
+constexpr const char* kPrefixes =
+    "@prefix atom: <http://lv2plug.in/ns/ext/atom#> .\n"
+    "@prefix doap: <http://usefulinc.com/ns/doap#> .\n"
+    "@prefix lv2: <http://lv2plug.in/ns/lv2core#> .\n"
+    "@prefix midi: <http://lv2plug.in/ns/ext/midi#> .\n"
+    "@prefix pprops: <http://lv2plug.in/ns/ext/port-props#> .\n"
+    "@prefix rdf: <http://www.w3.org/1999/02/22-rdf-syntax-ns#> .\n"
+    "@prefix rdfs: <http://www.w3.org/2000/01/rdf-schema#> .\n"
+    "@prefix state: <http://lv2plug.in/ns/ext/state#> .\n"
+    "@prefix units: <http://lv2plug.in/ns/extensions/units#> .\n"
+    "@prefix urid: <http://lv2plug.in/ns/ext/urid#> .\n\n";
+
+// A decimal literal the parser reads as a number in any locale: shortest round trip, always
+// with a point or an exponent.
+std::string Number(double value) {
+  char text[32];
+  const auto end = std::to_chars(text, text + sizeof text, value).ptr;
+  std::string number(text, end);
+  if (number.find_first_of(".e") == std::string::npos) number += ".0";
+  return number;
+}
+
+std::string Quoted(std::string_view text) {
+  std::string quoted = "\"";
+  for (const char c : text) {
+    if (c == '"' || c == '\\') quoted += '\\';
+    quoted += c;
+  }
+  return quoted + "\"";
+}
+
+// The working unit of a kind. Time kinds are shown in milliseconds but work in seconds.
+const char* UnitOf(const std::string& unit) {
+  if (unit == "dB") return "units:db";
+  if (unit == "Hz") return "units:hz";
+  if (unit == "ms") return "units:s";
+  if (unit == "%") return "units:pc";
+  return nullptr;
+}
+
+// Half travel at the geometric mean of a positive range: equal travel per octave.
+bool IsLogarithmic(const KValueKind& kind) {
+  if (kind.Minimum() <= 0.0 || kind.Steps() > 0) return false;
+  const double middle = std::sqrt(kind.Minimum() * kind.Maximum());
+  return std::fabs(kind.ToWorking(0.5) - middle) <= 1e-9 * middle;
+}
+
+// A stepped kind whose texts are names rather than numbers is a choice among them.
+bool IsEnumeration(const KValueKind& kind) {
+  double parsed = 0.0;
+  const std::string text = kind.ToText(kind.Minimum()).ToUtf8();
+  return kind.Steps() > 0 && std::from_chars(text.data(), text.data() + text.size(), parsed).ec != std::errc();
+}
+
+void ControlPort(std::string& out, const KAudioPluginBase::Parameter& parameter) {
+  const KValueKind& kind = parameter.Kind();
+  out += " ;\n    lv2:default " + Number(parameter.Info().defaultValue) + " ;\n    lv2:minimum " + Number(kind.Minimum()) +
+         " ;\n    lv2:maximum " + Number(kind.Maximum());
+  if (const char* unit = UnitOf(kind.Unit().ToUtf8())) out += std::string(" ;\n    units:unit ") + unit;
+  if (kind.Steps() == 1 && kind.Minimum() == 0.0) out += " ;\n    lv2:portProperty lv2:toggled";
+  else if (kind.Steps() > 0) out += " ;\n    lv2:portProperty lv2:integer";
+  if (IsEnumeration(kind) && kind.Steps() > 1) {
+    out += " , lv2:enumeration";
+    for (int32_t step = 0; step <= kind.Steps(); ++step) {
+      const double value = kind.Minimum() + step;
+      out += std::string(step == 0 ? " ;\n    lv2:scalePoint " : " ,\n      ") + "[ rdfs:label " + Quoted(kind.ToText(value).ToUtf8()) +
+             " ; rdf:value " + Number(value) + " ]";
+    }
+  }
+  if (IsLogarithmic(kind)) out += " ;\n    lv2:portProperty pprops:logarithmic";
+}
+}  // namespace
+
+std::string KManifestTurtle(const std::string& uri, const std::string& name) {
+  return std::string(kPrefixes) + "<" + uri + ">\n  a lv2:Plugin ;\n  lv2:binary <" + name + ".so> ;\n  rdfs:seeAlso <" + name + ".ttl> .\n";
+}
+
+std::string KPluginTurtle(const KAudioPlugin& plugin, const std::string& uri, const std::string& name) {
+  const KAudioPlugin::Shape& shape = plugin.GetShape();
+  const bool needsMap = shape.acceptsMIDI || shape.producesMIDI;
+  std::string out = std::string(kPrefixes) + "<" + uri + ">\n  a lv2:Plugin ;\n  doap:name " + Quoted(name) +
+                    " ;\n  lv2:optionalFeature lv2:hardRTCapable" + (needsMap ? "" : " , urid:map") +
+                    (needsMap ? " ;\n  lv2:requiredFeature urid:map" : "") + " ;\n  lv2:extensionData state:interface";
+  const KPortLayout layout(plugin);
+  using Kind = KPort::Kind;
+  for (int32_t index = 0; index < layout.Count(); ++index) {
+    const KPort& port = layout.Ports()[index];
+    const bool input = port.kind == Kind::kAudioIn || port.kind == Kind::kSideChainIn || port.kind == Kind::kParameter || port.kind == Kind::kMIDIIn;
+    const bool audio = port.kind == Kind::kAudioIn || port.kind == Kind::kSideChainIn || port.kind == Kind::kAudioOut;
+    const bool midi = port.kind == Kind::kMIDIIn || port.kind == Kind::kMIDIOut;
+    out += std::string(index == 0 ? " ;\n  lv2:port [\n" : " , [\n") + "    a lv2:" + (input ? "InputPort" : "OutputPort") + " , " +
+           (audio ? "lv2:AudioPort" : midi ? "atom:AtomPort" : "lv2:ControlPort") + " ;\n    lv2:index " + std::to_string(index) +
+           " ;\n    lv2:symbol " + Quoted(port.symbol) + " ;\n    lv2:name " + Quoted(port.name);
+    switch (port.kind) {
+      case Kind::kSideChainIn:
+        out += " ;\n    lv2:portProperty lv2:isSideChain , lv2:connectionOptional";
+        break;
+      case Kind::kParameter:
+        ControlPort(out, plugin.GetParameter(port.index));
+        break;
+      case Kind::kMeter:
+        out += " ;\n    lv2:minimum 0.0 ;\n    lv2:maximum 2.0";
+        break;
+      case Kind::kLatency:
+        out += " ;\n    lv2:designation lv2:latency ;\n    lv2:portProperty lv2:reportsLatency , lv2:integer ;\n    lv2:minimum 0.0 ;\n"
+               "    lv2:maximum 192000.0";
+        break;
+      case Kind::kMIDIIn:
+      case Kind::kMIDIOut:
+        out += " ;\n    atom:bufferType atom:Sequence ;\n    atom:supports midi:MidiEvent";
+        break;
+      default:
+        break;
+    }
+    out += "\n  ]";
+  }
+  return out + " .\n";
+}
+
+}  // namespace KLV2

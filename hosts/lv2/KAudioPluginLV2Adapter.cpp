@@ -154,13 +154,19 @@ LV2_State_Status KAudioPluginLV2Adapter::Restore(LV2_State_Retrieve_Function ret
     if (!mapped_) return LV2_STATE_ERR_NO_FEATURE;
     size_t size = 0;
     uint32_t type = 0, flags = 0;
-    const auto* value = static_cast<const char*>(retrieve(handle, urids_.stateKey, &size, &type, &flags));
-    if (!value) return LV2_STATE_ERR_NO_PROPERTY;
+    const auto* stored = static_cast<const char*>(retrieve(handle, urids_.stateKey, &size, &type, &flags));
+    if (!stored) return LV2_STATE_ERR_NO_PROPERTY;
     if (type != urids_.string) return LV2_STATE_ERR_BAD_TYPE;
-    std::string_view text(value, size);
+    std::string_view text(stored, size);
     while (!text.empty() && text.back() == '\0') text.remove_suffix(1);
     // A text that does not parse throws before anything is loaded: the plug-in stays as it was.
     KHostState::Load(*plugin_, text);
+    // The restored values stand until the host moves a control away from what it shows now.
+    const int32_t first = layout_.First(KPort::Kind::kParameter);
+    for (int32_t p = 0; p < plugin_->ParameterCount(); ++p) {
+      const auto* value = static_cast<const float*>(ports_[first + p]);
+      seen_[p] = value ? *value : static_cast<float>(plugin_->GetParameter(p).Working());
+    }
     return LV2_STATE_SUCCESS;
   });
 }

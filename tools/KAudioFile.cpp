@@ -139,13 +139,18 @@ void KAudioFileWriter::Flush() {
   pending_.clear();
 }
 
-void KAudioFileWriter::Commit() {
+void KAudioFileWriter::Finish() {
+  if (!file_) return;
   Flush();
   const int closed = sf_close(file_);
   file_ = nullptr;
   if (closed != SF_ERR_NO_ERROR) KCliFail("Cannot write " + Shown() + ": " + sf_error_number(closed));
   if (IsStandardOutput() && !(stream_ ? stream_->Finish() : std::fflush(stdout) == 0))
     KCliFail("Cannot write " + Shown() + ": " + std::strerror(errno));
+}
+
+void KAudioFileWriter::Commit() {
+  Finish();
   if (partial_.empty()) return;
   KPlatform::RenameFile(partial_, path_);  // when this throws, the destructor removes the partial file
   committed_ = true;

@@ -74,6 +74,9 @@ public:
   KAudioFileWriter& operator=(const KAudioFileWriter&) = delete;
 
   void Write(const float* interleaved, int64_t frames);
+  // Writes what is buffered and closes the output; the clipped samples are all counted then.
+  void Finish();
+  // Finishes, then puts the file in place.
   void Commit();
 
   // Samples held at full scale by an integer output so far.

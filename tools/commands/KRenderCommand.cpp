@@ -162,6 +162,7 @@ void RenderOne(const std::vector<KCliArguments>& segments, const RenderSettings&
   options.showProgress = !settings.quiet && KPlatform::IsErrorStreamTerminal();
   KAudioFileWriter output(outputPath, type, stages.back().plugin->OutputChannelCount(), input->SampleRate(), tags);
   const KRenderSummary summary = KRender(stages, *input, output, options);
+  output.Finish();
   const int64_t clipped = output.ClippedSamples();
   const std::string shownName = output.IsStandardOutput() ? "standard output" : outputPath;
   if (clipped > 0 && settings.failOnClipping)

@@ -17,14 +17,17 @@ namespace {
 // whatever the host block size.
 constexpr int64_t kChunkFrames = 65536;
 
-// Whether libsndfile's account of the header found a data chunk longer than the file.
+// Whether libsndfile's account of the header found a data chunk longer than the file; a
+// length of all ones is the "unknown" that streaming tools write, no promise.
 bool HeaderPromisesMore(SNDFILE* file) {
   char log[8192] = {};
   sf_command(file, SFC_GET_LOG_INFO, log, sizeof(log));
   for (std::string_view rest = log; !rest.empty();) {
     const size_t end = std::min(rest.find('\n'), rest.size());
     const std::string_view line = rest.substr(0, end);
-    if ((line.starts_with("data") || line.starts_with("SSND")) && line.find("(should be") != std::string_view::npos) return true;
+    if ((line.starts_with("data") || line.starts_with("SSND")) && line.find("(should be") != std::string_view::npos &&
+        line.find("4294967295") == std::string_view::npos)
+      return true;
     rest.remove_prefix(std::min(end + 1, rest.size()));
   }
   return false;

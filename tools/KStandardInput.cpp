@@ -21,7 +21,11 @@ sf_count_t KStandardInput::ReadBytes(char* into, sf_count_t count) {
       const size_t n = static_cast<size_t>(std::min<int64_t>(static_cast<int64_t>(kept_.size()) - position_, count - done));
       std::memcpy(into + done, kept_.data() + position_, n);
       position_ += static_cast<int64_t>(n), done += static_cast<sf_count_t>(n);
-    } else if (position_ > taken_) {  // a seek forward: pass over the bytes in between
+    } else if (position_ > taken_) {
+      // A seek forward within the kept start passes over the bytes in between; beyond it the
+      // stream looks ended, so that a header reader looking past the audio for more chunks
+      // (WAV, AIFF) comes back to the audio instead of consuming it.
+      if (position_ > static_cast<int64_t>(kKept)) break;
       if (Take(skipped, static_cast<size_t>(std::min<int64_t>(position_ - taken_, sizeof(skipped)))) == 0) break;
     } else {
       const size_t got = Take(into + done, static_cast<size_t>(count - done));

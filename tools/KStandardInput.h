@@ -8,8 +8,9 @@
 
 // Standard input as a file libsndfile can open, read as a stream: the first megabyte stays in
 // memory, so the header probes of every format (which seek back to the start) work on a pipe,
-// while the audio itself passes through without being kept. A seek past what is kept, or to
-// the end, fails, and the format's reader reports the failure.
+// while the audio itself passes through without being kept. A seek back past what is kept, or
+// to the end, fails, and the format's reader reports the failure; reading far ahead of the
+// stream finds its end.
 class KStandardInput {
 public:
   static constexpr size_t kKept = size_t{1} << 20;

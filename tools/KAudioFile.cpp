@@ -3,6 +3,7 @@
 #include <sndfile.h>
 
 #include <cerrno>
+#include <cstdio>
 #include <cstring>
 
 #include "kernel/KException.h"
@@ -80,8 +81,9 @@ KAudioFileWriter::KAudioFileWriter(const std::string& path, const KOutputType& t
   const std::string container = type.container.empty() ? KContainerOfPath(path) : type.container;
   info.format = KFileFormat(container, type.format, type.preferred);
   if (!sf_format_check(&info)) KCliFail("Cannot write '" + path + "': the file type cannot hold this audio.");
-  if (IsStandardOutput() && container == "wav") {
-    stream_ = std::make_unique<KStandardOutput>();
+  const bool pipe = IsStandardOutput() && std::ftell(stdout) < 0;  // standard output redirected to a file can seek
+  if (pipe && (container == "wav" || container == "flac")) {
+    stream_ = std::make_unique<KStandardOutput>(container == "wav");
     file_ = sf_open_virtual(&stream_->Callbacks(), SFM_WRITE, &info, stream_.get());
   } else if (IsStandardOutput()) {
     file_ = sf_open_fd(1, SFM_WRITE, &info, SF_FALSE);  // the types libsndfile streams itself

@@ -31,8 +31,8 @@ sf_count_t KStandardOutput::WriteBytes(const char* from, sf_count_t count) {
 void KStandardOutput::Start() {
   if (started_) return;
   // RIFF length at 4; then chunks of a 4-byte name and a 4-byte length from 12, up to "data".
-  MarkUnknown(header_, 4);
-  for (size_t at = 12; at + 8 <= header_.size();) {
+  if (riff_) MarkUnknown(header_, 4);
+  for (size_t at = 12; riff_ && at + 8 <= header_.size();) {
     if (std::memcmp(header_.data() + at, "data", 4) == 0) {
       MarkUnknown(header_, at + 4);
       break;

@@ -5,12 +5,15 @@
 #include <cstdint>
 #include <vector>
 
-// Standard output as a WAV file libsndfile can write to a pipe. libsndfile writes a WAV header
-// at the start and, at the end, seeks back to put the lengths in; a pipe cannot seek. So the
-// header is held until Start, sent with its lengths marked unknown (all ones, as streaming
-// tools write and read them), and the final rewrite is dropped.
+// Standard output as a file libsndfile can write to a pipe. For WAV and FLAC libsndfile writes
+// a header at the start and, at the end, seeks back to put the lengths in; a pipe cannot seek.
+// So the header is held until Start and the final rewrite is dropped. A FLAC header's zero
+// lengths already mean "unknown"; a WAV header's are marked unknown (all ones, as streaming
+// tools write and read them).
 class KStandardOutput {
 public:
+  explicit KStandardOutput(bool riff) noexcept : riff_(riff) {}
+
   SF_VIRTUAL_IO& Callbacks() noexcept { return callbacks_; }
   // Sends what was written so far, its header's lengths marked unknown; everything written
   // after it goes out as it comes. Once only.
@@ -23,6 +26,7 @@ private:
 
   std::vector<char> header_;
   int64_t position_ = 0, end_ = 0, sent_ = 0;
+  bool riff_;  // a WAV header, whose lengths are marked
   bool started_ = false, failed_ = false;
   SF_VIRTUAL_IO callbacks_{
       [](void* self) -> sf_count_t { return static_cast<KStandardOutput*>(self)->end_; },

@@ -40,10 +40,10 @@ inline Audio ReadAudio(const fs::path& path, int* format = nullptr, bool steps =
   EXPECT_NE(file, nullptr) << path << ": " << sf_strerror(nullptr);
   if (!file) return {};
   Audio audio{info.channels, info.samplerate, {}};
-  std::vector<double> samples(static_cast<size_t>(info.frames * info.channels));
   sf_command(file, SFC_SET_NORM_DOUBLE, nullptr, steps ? SF_FALSE : SF_TRUE);
-  samples.resize(static_cast<size_t>(sf_read_double(file, samples.data(), static_cast<sf_count_t>(samples.size()))));
-  audio.samples.assign(samples.begin(), samples.end());
+  std::vector<double> block(static_cast<size_t>(65536 * info.channels));  // to the end: a streamed header gives no length
+  for (sf_count_t got; (got = sf_read_double(file, block.data(), static_cast<sf_count_t>(block.size()))) > 0;)
+    audio.samples.insert(audio.samples.end(), block.begin(), block.begin() + got);
   if (format) *format = info.format;
   sf_close(file);
   return audio;

@@ -1,0 +1,17 @@
+#!/usr/bin/env bash
+# Installs a build under a prefix, moves the prefix, and runs the installed `torvane` there:
+# it must find the kernel beside it, the bundles must be under the prefix, and nothing may
+# land in the user's ~/.vst3.
+set -euo pipefail
+build=$1
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+export HOME="$work/home"
+mkdir -p "$HOME"
+cmake --install "$build" --prefix "$work/prefix" >/dev/null
+mv "$work/prefix" "$work/moved"
+"$work/moved/bin/torvane" --version | grep -q '^torvane '
+ldd "$work/moved/bin/torvane" | grep -q "=> $work/moved/bin/../lib/libtorvane.so"
+"$work/moved/bin/torvane" list | grep -q KCompressorPlugin
+ls -d "$work"/moved/lib/vst3/*.vst3 >/dev/null
+[ ! -e "$HOME/.vst3" ]

@@ -1,7 +1,6 @@
 #include "tools/KCliPlugin.h"
 
 #include <algorithm>
-#include <cctype>
 #include <charconv>
 #include <cmath>
 #include <fstream>
@@ -54,11 +53,6 @@ bool ClampedByKind(const KValueKind& kind, const std::string& number, const std:
   return true;
 }
 
-std::string Lower(std::string text) {
-  std::transform(text.begin(), text.end(), text.begin(), [](unsigned char c) { return std::tolower(c); });
-  return text;
-}
-
 }  // namespace
 
 std::string KCliPlugin::ResolveName(const std::string& name) {
@@ -68,11 +62,11 @@ std::string KCliPlugin::ResolveName(const std::string& name) {
   std::vector<std::string> known;
   for (const KString& key : keys) {
     known.push_back(key.ToUtf8());
-    if (Lower(known.back()) == Lower(name)) return known.back();
+    if (KLowerCase(known.back()) == KLowerCase(name)) return known.back();
   }
   for (int32_t m = 0; m < modules.Count(); ++m) {
     known.push_back(modules.Record(m).key.ToUtf8());
-    if (Lower(known.back()) != Lower(name)) continue;
+    if (KLowerCase(known.back()) != KLowerCase(name)) continue;
     for (int32_t p = 0; p < main.Count(); ++p)
       if (main.Record(p).factory == modules.Record(m).factory) return main.Record(p).key.ToUtf8();
   }
@@ -94,7 +88,7 @@ KAudioPluginBase::Parameter& KCliPlugin::Find(const std::string& key) {
   std::vector<std::string> keys;
   for (int32_t i = 0; i < plugin_->ParameterCount(); ++i) {
     keys.push_back(plugin_->GetParameter(i).Key().ToUtf8());
-    if (Lower(keys.back()) == Lower(key)) return plugin_->GetParameter(i);
+    if (KLowerCase(keys.back()) == KLowerCase(key)) return plugin_->GetParameter(i);
   }
   KCliFail("Unknown parameter '" + key + "' of " + plugin_->Identifier().ToUtf8() + "." + KSuggestions(key, keys));
 }
@@ -141,7 +135,7 @@ void KCliPlugin::LoadPreset(const std::string& fileOrName) {
   if (!file) {
     const KStringList names = plugin_->ListPresets();
     for (const KString& name : names) {
-      if (Lower(name.ToUtf8()) != Lower(fileOrName)) continue;
+      if (KLowerCase(name.ToUtf8()) != KLowerCase(fileOrName)) continue;
       plugin_->LoadPreset(name);
       return;
     }

@@ -148,7 +148,7 @@ void Measure(const float* samples, int32_t n, double& peak, double& sumOfSquares
 
 KRenderSummary KRender(std::span<const KRenderStage> stages, KAudioSource& input, KAudioFileWriter& output, const KRenderOptions& options) {
   const double rate = input.SampleRate();
-  std::deque<Stage> chain;  // never moves a stage that the others point into
+  std::deque<Stage> chain;  // stages hold references: built in place, never moved
   int64_t latency = 0;
   for (const KRenderStage& stage : stages) {
     chain.emplace_back(stage);

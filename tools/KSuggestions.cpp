@@ -6,11 +6,6 @@
 
 namespace {
 
-std::string Lower(std::string text) {
-  std::transform(text.begin(), text.end(), text.begin(), [](unsigned char c) { return std::tolower(c); });
-  return text;
-}
-
 size_t EditDistance(const std::string& a, const std::string& b) {
   std::vector<size_t> row(b.size() + 1);
   for (size_t j = 0; j <= b.size(); ++j) row[j] = j;
@@ -28,11 +23,16 @@ size_t EditDistance(const std::string& a, const std::string& b) {
 
 }  // namespace
 
+std::string KLowerCase(std::string text) {
+  std::transform(text.begin(), text.end(), text.begin(), [](unsigned char c) { return std::tolower(c); });
+  return text;
+}
+
 std::string KSuggestions(const std::string& wanted, const std::vector<std::string>& known) {
-  const std::string target = Lower(wanted);
+  const std::string target = KLowerCase(wanted);
   std::vector<std::pair<size_t, std::string>> close;
   for (const std::string& candidate : known) {
-    const std::string lower = Lower(candidate);
+    const std::string lower = KLowerCase(candidate);
     const size_t distance = EditDistance(target, lower);
     if (distance <= std::max<size_t>(2, target.size() / 3) || (!target.empty() && lower.find(target) != std::string::npos))
       close.emplace_back(distance, candidate);

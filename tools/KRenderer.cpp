@@ -137,11 +137,24 @@ private:
   std::chrono::steady_clock::time_point begun_, shown_;
 };
 
+// Four running peaks and sums side by side: one chain of dependent additions through every
+// sample took a third of a whole render.
 void Measure(const float* samples, int32_t n, double& peak, double& sumOfSquares) {
-  for (int32_t i = 0; i < n; ++i) {
-    peak = std::max(peak, static_cast<double>(std::fabs(samples[i])));
-    sumOfSquares += static_cast<double>(samples[i]) * samples[i];
+  constexpr int32_t kLanes = 4;
+  float peaks[kLanes] = {};
+  double sums[kLanes] = {};
+  int32_t i = 0;
+  for (; i + kLanes <= n; i += kLanes)
+    for (int32_t k = 0; k < kLanes; ++k) {
+      peaks[k] = std::max(peaks[k], std::fabs(samples[i + k]));
+      sums[k] += static_cast<double>(samples[i + k]) * samples[i + k];
+    }
+  for (; i < n; ++i) {
+    peaks[0] = std::max(peaks[0], std::fabs(samples[i]));
+    sums[0] += static_cast<double>(samples[i]) * samples[i];
   }
+  peak = std::max({peak, static_cast<double>(peaks[0]), static_cast<double>(peaks[1]), static_cast<double>(peaks[2]), static_cast<double>(peaks[3])});
+  sumOfSquares += (sums[0] + sums[1]) + (sums[2] + sums[3]);
 }
 
 }  // namespace

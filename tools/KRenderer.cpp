@@ -5,9 +5,11 @@
 #include <cmath>
 #include <cstdio>
 #include <deque>
+#include <iterator>
 #include <optional>
 #include <random>
 
+#include "hosts/common/KHostRamp.h"
 #include "tools/KCliArguments.h"
 
 namespace {
@@ -32,6 +34,37 @@ private:
   std::vector<std::vector<float>> planes_;
   std::vector<float*> pointers_;
 };
+
+// A lane's break points at whole sample positions.
+struct SampleLane {
+  int32_t parameter;
+  std::vector<std::pair<int64_t, double>> corners;
+};
+
+SampleLane ToSamples(const KAutomationLane& lane, double rate) {
+  SampleLane samples{lane.parameter, {}};
+  for (const KAutomationLane::Point& point : lane.points) samples.corners.emplace_back(std::llround(point.seconds * rate), point.normalized);
+  return samples;
+}
+
+// The lane over the block [start, start + n) as a host's points: the corner at or before the
+// block start, every corner inside, and the first at or after its end, each at its own position.
+// So every segment, and every value on it, is the same whatever the block size. Before its
+// first corner and after its last the lane holds its value.
+void AddBlockRamp(KAudioPlugin& plugin, const SampleLane& lane, int64_t start, int32_t n) {
+  // Offsets far beyond a block (hours of audio) keep their sign and stay far.
+  const auto offset = [start](int64_t at) { return static_cast<int32_t>(std::clamp<int64_t>(at - start, -(1 << 30), 1 << 30)); };
+  const auto& c = lane.corners;
+  const auto after = std::upper_bound(c.begin(), c.end(), start, [](int64_t at, const auto& corner) { return at < corner.first; });
+  KHostRamp ramp(plugin, lane.parameter);
+  if (after == c.begin()) ramp.Add(0, c.front().second);
+  else ramp.Add(offset(std::prev(after)->first), std::prev(after)->second);
+  auto corner = after;
+  for (; corner != c.end() && corner->first < start + n; ++corner) ramp.Add(offset(corner->first), corner->second);
+  if (corner != c.end()) ramp.Add(offset(corner->first), corner->second);
+  else ramp.Add(n, c.back().second);
+  ramp.Commit();
+}
 
 // A source read in large chunks and handed out block by block as planes.
 class ChunkedSource {
@@ -72,48 +105,20 @@ private:
 
 // One plug-in of the chain with its buffers.
 struct Stage {
-  explicit Stage(const KRenderStage& from)
+  Stage(const KRenderStage& from, double rate)
       : plugin(*from.plugin),
-        automation(from.automation),
         mainInputs(plugin.GetShape().inputBuses > 0 ? plugin.ChannelsPerBus() : 0),
         in(std::max(plugin.InputChannelCount(), 1), kMaxBlock),
         out(plugin.OutputChannelCount(), kMaxBlock) {
+    for (const KAutomationLane& lane : from.automation) lanes.push_back(ToSamples(lane, rate));
     if (from.sideChain) sideChain.emplace(*from.sideChain);
   }
   KAudioPlugin& plugin;
-  const std::vector<KAutomationLane>& automation;
+  std::vector<SampleLane> lanes;
   int32_t mainInputs;
   BlockBuffers in, out;
   std::optional<ChunkedSource> sideChain;  // else the side-chain bus stays silent
 };
-
-// Value of a lane at a sample position, in the normalised domain.
-double LaneValue(const KAutomationLane& lane, double seconds) {
-  const auto& p = lane.points;
-  if (seconds <= p.front().seconds) return p.front().normalized;
-  for (size_t k = 1; k < p.size(); ++k) {
-    if (seconds < p[k].seconds) {
-      const double w = (seconds - p[k - 1].seconds) / (p[k].seconds - p[k - 1].seconds);
-      return p[k - 1].normalized + (p[k].normalized - p[k - 1].normalized) * w;
-    }
-  }
-  return p.back().normalized;
-}
-
-// The lane over one block as a ramp: its value at the block start, every break point inside
-// the block, and its value at the block end.
-void AddBlockRamp(KAudioPlugin& plugin, const KAutomationLane& lane, int64_t start, int32_t n, double rate) {
-  KAudioPluginBase::RampPoint points[ParameterRamp::kMaxPoints];
-  int32_t count = 0;
-  points[count++] = {0, LaneValue(lane, static_cast<double>(start) / rate)};
-  for (const KAutomationLane::Point& point : lane.points) {
-    const double at = point.seconds * rate - static_cast<double>(start);
-    if (at > 0.0 && at < n && count < ParameterRamp::kMaxPoints - 1) points[count++] = {static_cast<int32_t>(std::lround(at)), point.normalized};
-  }
-  points[count++] = {n, LaneValue(lane, static_cast<double>(start + n) / rate)};
-  // Fine sub-blocks: the rendered automation does not depend on the block size.
-  plugin.AddRamp(lane.parameter, std::span(points, static_cast<size_t>(count)), true);
-}
 
 class Progress {
 public:
@@ -164,7 +169,7 @@ KRenderSummary KRender(std::span<const KRenderStage> stages, KAudioSource& input
   std::deque<Stage> chain;  // stages hold references: built in place, never moved
   int64_t latency = 0;
   for (const KRenderStage& stage : stages) {
-    chain.emplace_back(stage);
+    chain.emplace_back(stage, rate);
     latency += stage.plugin->TotalLatency();
   }
   Stage& first = chain.front();
@@ -198,7 +203,7 @@ KRenderSummary KRender(std::span<const KRenderStage> stages, KAudioSource& input
         for (int32_t c = 0; c < stage.mainInputs; ++c) std::copy_n(before.Plane(std::min(c, before.Channels() - 1)), n, stage.in.Plane(c));
       }
       if (stage.sideChain) stage.sideChain->Fill(stage.in, stage.mainInputs, stage.in.Channels() - stage.mainInputs, n);
-      for (const KAutomationLane& lane : stage.automation) AddBlockRamp(stage.plugin, lane, position, n, rate);
+      for (const SampleLane& lane : stage.lanes) AddBlockRamp(stage.plugin, lane, position, n);
       stage.plugin.ProcessHostBlock(stage.plugin.InputChannelCount() > 0 ? stage.in.Pointers() : nullptr, stage.out.Pointers(), n);
     }
 

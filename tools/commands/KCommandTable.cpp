@@ -42,6 +42,7 @@ constexpr KCommand kCommands[] = {
      "  to standard error), save the settings given under NAME, print a preset's state document,\n"
      "  or delete it.\n",
      KRunPresets},
+    {"help", kHelpUsage, KRunHelp},
 };
 }  // namespace
 

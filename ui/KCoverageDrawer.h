@@ -41,6 +41,8 @@ protected:
   virtual int32_t TargetHeight() const noexcept = 0;
   // Paints `color` through the mask; the mask lies inside the target.
   virtual void PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t mode) = 0;
+  // Paints the glyphs of a line of text in one colour; by default as one mask.
+  virtual void PaintGlyphs(const std::vector<KGlyphInk>& glyphs, KColor color, uint8_t opacity, uint32_t mode);
 
 private:
   void Fill(const KPath& path, KColor color, uint8_t opacity, uint32_t mode);

@@ -30,10 +30,6 @@ enum KDrawerOperation : int32_t {
 inline constexpr uint32_t kDrawBlend = 0;
 inline constexpr uint32_t kDrawCopy = 1;
 
-// Alignment of AlignedTextOut: one horizontal and one vertical value, or-ed.
-inline constexpr uint32_t kAlignLeft = 0, kAlignCentre = 1, kAlignRight = 2;
-inline constexpr uint32_t kAlignTop = 0, kAlignMiddle = 4, kAlignBottom = 8;
-
 enum class KGradient : uint8_t { Vertical, Horizontal };
 
 // The one drawing interface of the editors. Coordinates are logical: the drawer's scale turns

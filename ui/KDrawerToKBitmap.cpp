@@ -3,6 +3,11 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <vector>
+
+#if defined(__SSE2__) || defined(_M_X64)
+#include <emmintrin.h>
+#endif
 
 #include "kernel/KException.h"
 #include "kernel/KGuard.h"
@@ -46,6 +51,49 @@ uint32_t Lerp(uint32_t a, uint32_t b, uint32_t w) noexcept {
 }
 
 int64_t Clamp(int64_t v, int64_t lo, int64_t hi) noexcept { return v < lo ? lo : v > hi ? hi : v; }
+
+// Lerp of two rows with one weight, four pixels at a time where SSE2 is there.
+void LerpRow(const uint32_t* a, const uint32_t* b, uint32_t w, uint32_t* out, int64_t n) noexcept {
+  int64_t i = 0;
+#if defined(__SSE2__) || defined(_M_X64)
+  const __m128i wb = _mm_set1_epi16(int16_t(w)), wa = _mm_set1_epi16(int16_t(256 - w)), half = _mm_set1_epi16(128);
+  const __m128i zero = _mm_setzero_si128();
+  for (; i + 4 <= n; i += 4) {
+    const __m128i va = _mm_loadu_si128(reinterpret_cast<const __m128i*>(a + i));
+    const __m128i vb = _mm_loadu_si128(reinterpret_cast<const __m128i*>(b + i));
+    const auto mix = [&](__m128i x, __m128i y) {
+      return _mm_srli_epi16(_mm_add_epi16(_mm_add_epi16(_mm_mullo_epi16(x, wa), _mm_mullo_epi16(y, wb)), half), 8);
+    };
+    const __m128i lo = mix(_mm_unpacklo_epi8(va, zero), _mm_unpacklo_epi8(vb, zero));
+    const __m128i hi = mix(_mm_unpackhi_epi8(va, zero), _mm_unpackhi_epi8(vb, zero));
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out + i), _mm_packus_epi16(lo, hi));
+  }
+#endif
+  for (; i < n; ++i) out[i] = Lerp(a[i], b[i], w);
+}
+
+// n pixels put over `out`; opaque pixels at full opacity are copied four at a time.
+void PutRow(uint32_t* out, const uint32_t* in, int64_t n, uint8_t opacity, bool copy) noexcept {
+  if (opacity == 255 && copy) {
+    std::memcpy(out, in, size_t(n) * 4);
+    return;
+  }
+  int64_t i = 0;
+#if defined(__SSE2__) || defined(_M_X64)
+  if (opacity == 255) {
+    const __m128i alphas = _mm_set1_epi32(int32_t(0xFF000000u));
+    for (; i + 4 <= n; i += 4) {
+      const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + i));
+      const int opaque = _mm_movemask_epi8(_mm_cmpeq_epi32(_mm_and_si128(v, alphas), alphas));
+      if (opaque == 0xFFFF)
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + i), v);
+      else
+        for (int64_t j = i; j < i + 4; ++j) Put(out[j], in[j], in[j] >> 24, false);
+    }
+  }
+#endif
+  for (; i < n; ++i) Put(out[i], in[i], KMulByte(in[i] >> 24, opacity), copy);
+}
 }  // namespace
 
 // Where blits read: a rectangle of a bitmap whose outside continues its edge texels (clamp)
@@ -82,36 +130,56 @@ void KDrawerToKBitmap::Stretch(const PixelBox& dest, const Source& source, uint8
   const int64_t y0 = std::max<int64_t>(dest.top, 0), y1 = std::min<int64_t>(dest.bottom, target_.Height());
   if (x1 <= x0 || y1 <= y0 || opacity == 0) return;
   const bool copy = mode & kDrawCopy;
-  // One texel per pixel at texel centres: a straight copy of rows, no filtering.
+  const int64_t count = x1 - x0;
   const double startU = source.u0 + double(x0 - dest.left) * source.du, startV = source.v0 + double(y0 - dest.top) * source.dv;
-  if (source.du == 1 && source.dv == 1 && startU - std::floor(startU) == 0.5 && startV - std::floor(startV) == 0.5) {
-    const int64_t u = int64_t(startU), v = int64_t(startV);
-    for (int64_t y = y0; y < y1; ++y) {
-      const uint32_t* in = source.bitmap.Row(int32_t(source.Y(v + y - y0)));
-      uint32_t* out = target_.Row(int32_t(y));
-      if (!source.wrap && u >= source.area.left && u + (x1 - x0) - 1 <= source.area.right) {
-        in += u - x0;
-        if (copy && opacity == 255) {
-          std::memcpy(out + x0, in + x0, size_t(x1 - x0) * 4);
-          continue;
-        }
-        for (int64_t x = x0; x < x1; ++x) Put(out[x], in[x], KMulByte(in[x] >> 24, opacity), copy);
-      } else {
-        for (int64_t x = x0; x < x1; ++x) {
-          const uint32_t s = in[source.X(u + x - x0)];
-          Put(out[x], s, KMulByte(s >> 24, opacity), copy);
-        }
-      }
-    }
-    return;
+  // Each source position as two texels and the weight of the second, once for all rows.
+  const auto split = [](double position, int64_t& first, uint32_t& weight) {
+    const double f = position - 0.5, whole = std::floor(f);
+    first = int64_t(whole);
+    weight = uint32_t((f - whole) * 256 + 0.5);
+    if (weight == 256) ++first, weight = 0;
+  };
+  std::vector<int64_t> columns(static_cast<size_t>(2 * count));
+  std::vector<uint32_t> weights(static_cast<size_t>(count));
+  bool unfiltered = true;  // every pixel centre on a texel centre
+  for (int64_t i = 0; i < count; ++i) {
+    int64_t first;
+    split(startU + double(i) * source.du, first, weights[size_t(i)]);
+    columns[size_t(2 * i)] = source.X(first);
+    columns[size_t(2 * i + 1)] = source.X(first + 1);
+    unfiltered = unfiltered && weights[size_t(i)] == 0;
   }
-  for (int64_t y = y0; y < y1; ++y) {
-    uint32_t* out = target_.Row(int32_t(y));
-    const double v = startV + double(y - y0) * source.dv;
-    for (int64_t x = x0; x < x1; ++x) {
-      const uint32_t s = source.At(startU + double(x - x0) * source.du, v);
-      Put(out[x], s, KMulByte(s >> 24, opacity), copy);
+  // Filtered rows: each source row is filtered across once into a line buffer, and two such
+  // lines are mixed for each target row (a row of a two-times enlargement serves two rows).
+  std::vector<uint32_t> upper(static_cast<size_t>(count)), lower(static_cast<size_t>(count)), mixed(static_cast<size_t>(count));
+  int64_t upperRow = INT64_MIN, lowerRow = INT64_MIN;
+  const auto filterRow = [&](int64_t row, std::vector<uint32_t>& into) {
+    const uint32_t* r = source.bitmap.Row(int32_t(source.Y(row)));
+    for (int64_t i = 0; i < count; ++i) {
+      const uint32_t w = weights[size_t(i)];
+      const uint32_t a = r[columns[size_t(2 * i)]];
+      into[size_t(i)] = w ? Lerp(a, r[columns[size_t(2 * i + 1)]], w) : a;
     }
+  };
+  for (int64_t y = y0; y < y1; ++y) {
+    int64_t first;
+    uint32_t wy;
+    split(startV + double(y - y0) * source.dv, first, wy);
+    uint32_t* out = target_.Row(int32_t(y)) + x0;
+    // One texel per pixel in order: the source row itself.
+    if (unfiltered && wy == 0 && source.du == 1 && columns[size_t(2 * count - 2)] - columns[0] == count - 1) {
+      PutRow(out, source.bitmap.Row(int32_t(source.Y(first))) + columns[0], count, opacity, copy);
+      continue;
+    }
+    if (first == lowerRow) std::swap(upper, lower), std::swap(upperRow, lowerRow);
+    if (first != upperRow) filterRow(first, upper), upperRow = first;
+    if (wy == 0) {
+      PutRow(out, upper.data(), count, opacity, copy);
+      continue;
+    }
+    if (first + 1 != lowerRow) filterRow(first + 1, lower), lowerRow = first + 1;
+    LerpRow(upper.data(), lower.data(), wy, mixed.data(), count);
+    PutRow(out, mixed.data(), count, opacity, copy);
   }
 }
 
@@ -316,10 +384,35 @@ void KDrawerToKBitmap::SetPixel(KPoint at, KColor color, uint8_t opacity, uint32
 
 void KDrawerToKBitmap::PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t) {
   const uint32_t alpha = KMulByte(KAlphaOf(color), opacity);
-  for (int32_t y = 0; y < mask.height; ++y) {
-    const uint8_t* in = &mask.values[size_t(y) * mask.width];
-    uint32_t* out = target_.Row(mask.y + y) + mask.x;
-    for (int32_t x = 0; x < mask.width; ++x)
+  if (alpha == 0) return;
+  mask.ForEachSpan([&](int32_t row, int32_t begin, int32_t end) {
+    const uint8_t* in = &mask.values[size_t(row) * mask.width];
+    uint32_t* out = target_.Row(mask.y + row) + mask.x;
+    int32_t x = begin;
+    // Masks of text and thin shapes are mostly empty: skip eight uncovered pixels at a time.
+    for (; x + 8 <= end; x += 8) {
+      uint64_t eight;
+      std::memcpy(&eight, in + x, 8);
+      if (eight == 0) continue;
+      for (int32_t i = x; i < x + 8; ++i)
+        if (in[i]) Blend(out[i], color, KMulByte(alpha, in[i]));
+    }
+    for (; x < end; ++x)
       if (in[x]) Blend(out[x], color, KMulByte(alpha, in[x]));
+  });
+}
+
+void KDrawerToKBitmap::PaintGlyphs(const std::vector<KGlyphInk>& glyphs, KColor color, uint8_t opacity, uint32_t) {
+  const uint32_t alpha = KMulByte(KAlphaOf(color), opacity);
+  if (alpha == 0) return;
+  for (const KGlyphInk& g : glyphs) {
+    const int64_t x0 = std::max<int64_t>(g.x, 0), x1 = std::min<int64_t>(g.x + g.width, target_.Width());
+    const int64_t y0 = std::max<int64_t>(g.y, 0), y1 = std::min<int64_t>(g.y + g.height, target_.Height());
+    for (int64_t y = y0; y < y1; ++y) {
+      const uint8_t* in = g.ink + size_t(y - g.y) * g.width - g.x;
+      uint32_t* out = target_.Row(int32_t(y));
+      for (int64_t x = x0; x < x1; ++x)
+        if (in[x]) Blend(out[x], color, alpha == 255 ? in[x] : KMulByte(alpha, in[x]));
+    }
   }
 }

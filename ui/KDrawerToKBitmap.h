@@ -31,6 +31,8 @@ protected:
   int32_t TargetWidth() const noexcept override { return target_.Width(); }
   int32_t TargetHeight() const noexcept override { return target_.Height(); }
   void PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t mode) override;
+  // Each glyph straight onto the target, without a mask of the whole line.
+  void PaintGlyphs(const std::vector<KGlyphInk>& glyphs, KColor color, uint8_t opacity, uint32_t mode) override;
 
 private:
   struct Source;

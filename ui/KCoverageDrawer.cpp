@@ -224,3 +224,21 @@ void KCoverageDrawer::PaintHorizontalIntervalGraph(const KRect& area, std::span<
     Fill(path, color, opacity, mode);
   });
 }
+
+void KCoverageDrawer::StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationStretchBltH), [&] {
+    const KRect d{dest.left, dest.top, dest.right, int32_t(std::min<int64_t>(INT32_MAX, dest.top + source.Height() - 1))};
+    StretchBlt(d, bitmap, source, opacity, mode);
+  });
+}
+
+void KCoverageDrawer::StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationStretchBltV), [&] {
+    const KRect d{dest.left, dest.top, int32_t(std::min<int64_t>(INT32_MAX, dest.left + source.Width() - 1)), dest.bottom};
+    StretchBlt(d, bitmap, source, opacity, mode);
+  });
+}
+
+void KCoverageDrawer::SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationSetPixel), [&] { FillRectangle({at.x, at.y, at.x, at.y}, color, opacity, mode); });
+}

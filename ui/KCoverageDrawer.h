@@ -3,10 +3,12 @@
 #include "ui/KCoverage.h"
 #include "ui/KDrawer.h"
 
-// The shapes, text and graphs of a drawer, made into coverage masks that the drawer paints in
+// The shapes, text and graphs of a drawer (and the operations made of others), made into coverage masks that the drawer paints in
 // one colour. Both drawers share this, so their shapes agree to the blending of a byte.
 class KCoverageDrawer : public KDrawer {
 public:
+  void StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) override;
+  void StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) override;
   void AlignedTextOut(const KRect& rect, const KString& text, const KFont& font, KColor color, uint32_t alignment,
                       uint8_t opacity, uint32_t mode) override;
   void LineTo(KPoint to, KColor color, uint8_t opacity, uint32_t mode) override;
@@ -29,6 +31,7 @@ public:
                             KColor line, KColor fill, uint8_t opacity, uint32_t mode) override;
   void PaintHorizontalIntervalGraph(const KRect& area, std::span<const double> lows, std::span<const double> highs,
                                     double top, double bottom, KColor color, uint8_t opacity, uint32_t mode) override;
+  void SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) override;
 
 protected:
   // `names`: the guarded operation names of the drawer, in slot order (kOperationCount texts).

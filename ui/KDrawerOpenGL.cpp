@@ -273,20 +273,6 @@ void KDrawerOpenGL::StretchBlt(const KRect& dest, const KBitmap& bitmap, const K
   });
 }
 
-void KDrawerOpenGL::StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationStretchBltH), [&] {
-    const KRect d{dest.left, dest.top, dest.right, int32_t(std::min<int64_t>(INT32_MAX, dest.top + source.Height() - 1))};
-    StretchBlt(d, bitmap, source, opacity, mode);
-  });
-}
-
-void KDrawerOpenGL::StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationStretchBltV), [&] {
-    const KRect d{dest.left, dest.top, int32_t(std::min<int64_t>(INT32_MAX, dest.left + source.Width() - 1)), dest.bottom};
-    StretchBlt(d, bitmap, source, opacity, mode);
-  });
-}
-
 void KDrawerOpenGL::PaintMesh(const KTexturedMesh& mesh, const KBitmap& bitmap, const KRect& source, uint8_t opacity,
                               uint32_t mode) {
   if (!mesh.IsFinite()) return;
@@ -363,10 +349,6 @@ void KDrawerOpenGL::FillRectangleGradient(const KRect& rect, KColor from, KColor
     glEnd();
     ThrowOnError("The graphics card could not fill the rectangle.");
   });
-}
-
-void KDrawerOpenGL::SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationSetPixel), [&] { FillRectangle({at.x, at.y, at.x, at.y}, color, opacity, mode); });
 }
 
 void KDrawerOpenGL::PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t) {

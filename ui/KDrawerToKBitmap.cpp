@@ -254,20 +254,6 @@ void KDrawerToKBitmap::StretchBlt(const KRect& dest, const KBitmap& bitmap, cons
   });
 }
 
-void KDrawerToKBitmap::StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationStretchBltH), [&] {
-    const KRect d{dest.left, dest.top, dest.right, int32_t(std::min<int64_t>(INT32_MAX, dest.top + source.Height() - 1))};
-    StretchBlt(d, bitmap, source, opacity, mode);
-  });
-}
-
-void KDrawerToKBitmap::StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationStretchBltV), [&] {
-    const KRect d{dest.left, dest.top, int32_t(std::min<int64_t>(INT32_MAX, dest.left + source.Width() - 1)), dest.bottom};
-    StretchBlt(d, bitmap, source, opacity, mode);
-  });
-}
-
 void KDrawerToKBitmap::PaintMesh(const KTexturedMesh& mesh, const KBitmap& bitmap, uint8_t opacity, uint32_t mode) {
   if (!mesh.IsFinite()) return;
   const Source from{bitmap, bitmap.Bounds(), 0, 0, 0, 0, false};
@@ -376,10 +362,6 @@ void KDrawerToKBitmap::FillRectangleGradient(const KRect& rect, KColor from, KCo
       }
     }
   });
-}
-
-void KDrawerToKBitmap::SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationSetPixel), [&] { FillRectangle({at.x, at.y, at.x, at.y}, color, opacity, mode); });
 }
 
 void KDrawerToKBitmap::PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t) {

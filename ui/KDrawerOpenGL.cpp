@@ -30,6 +30,33 @@ void ThrowOnError(const char* what) {
 
 // Far pixel coordinates are cut to what single-precision vertices carry exactly.
 double Vertex(int64_t v) { return double(std::clamp<int64_t>(v, -(1 << 23), 1 << 23)); }
+
+// Texture coordinates of a quad's corners: left, top, right, bottom.
+struct TextureArea {
+  double s0, t0, s1, t1;
+};
+
+// The texels `source` (inclusive) of a texture of width × height as texture coordinates.
+TextureArea AreaOf(const KRect& source, double width, double height) {
+  return {source.left / width, source.top / height, (source.right + 1.0) / width, (source.bottom + 1.0) / height};
+}
+
+// A quad over the pixels [left, right) × [top, bottom) textured with `area` of the texture, in
+// the current colour and blending.
+void TexturedQuad(GLuint texture, double left, double top, double right, double bottom, const TextureArea& area, GLint wrap) {
+  glEnable(GL_TEXTURE_2D);
+  glBindTexture(GL_TEXTURE_2D, texture);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, wrap);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, wrap);
+  glBegin(GL_QUADS);
+  glTexCoord2d(area.s0, area.t0), glVertex2d(left, top);
+  glTexCoord2d(area.s1, area.t0), glVertex2d(right, top);
+  glTexCoord2d(area.s1, area.t1), glVertex2d(right, bottom);
+  glTexCoord2d(area.s0, area.t1), glVertex2d(left, bottom);
+  glEnd();
+  glDisable(GL_TEXTURE_2D);
+  ThrowOnError("The graphics card could not paint the image.");
+}
 }  // namespace
 
 KDrawerOpenGL::KDrawerOpenGL(KOpenGLContext& context, double scale) : KCoverageDrawer(kNames, scale), context_(context) {}
@@ -168,22 +195,10 @@ void KDrawerOpenGL::SetBlending(uint32_t mode) {
 
 void KDrawerOpenGL::PaintTexture(const KOpenGLTexture& texture, const PixelBox& box, const KRect& source, uint8_t opacity,
                                  uint32_t mode) {
-  const double tw = texture.Width(), th = texture.Height();
   SetBlending(mode);
-  glEnable(GL_TEXTURE_2D);
-  glBindTexture(GL_TEXTURE_2D, texture.Name());
-  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_CLAMP_TO_EDGE);
-  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_CLAMP_TO_EDGE);
   glColor4ub(255, 255, 255, opacity);
-  const double s0 = source.left / tw, s1 = (source.right + 1.0) / tw, t0 = source.top / th, t1 = (source.bottom + 1.0) / th;
-  glBegin(GL_QUADS);
-  glTexCoord2d(s0, t0), glVertex2d(Vertex(box.left), Vertex(box.top));
-  glTexCoord2d(s1, t0), glVertex2d(Vertex(box.right), Vertex(box.top));
-  glTexCoord2d(s1, t1), glVertex2d(Vertex(box.right), Vertex(box.bottom));
-  glTexCoord2d(s0, t1), glVertex2d(Vertex(box.left), Vertex(box.bottom));
-  glEnd();
-  glDisable(GL_TEXTURE_2D);
-  ThrowOnError("The graphics card could not paint the image.");
+  TexturedQuad(texture.Name(), Vertex(box.left), Vertex(box.top), Vertex(box.right), Vertex(box.bottom),
+               AreaOf(source, texture.Width(), texture.Height()), GL_CLAMP_TO_EDGE);
 }
 
 void KDrawerOpenGL::PaintGLTexture(const KRect& dest, const KOpenGLTexture& texture, uint8_t opacity, uint32_t mode) {
@@ -207,19 +222,9 @@ void KDrawerOpenGL::PatBlt(const KRect& dest, const KBitmap& bitmap, const KRect
     const double repeatsX = double(dest.right - dest.left + 1) / texture->Width();
     const double repeatsY = double(dest.bottom - dest.top + 1) / texture->Height();
     SetBlending(mode);
-    glEnable(GL_TEXTURE_2D);
-    glBindTexture(GL_TEXTURE_2D, texture->Name());
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_REPEAT);
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_REPEAT);
     glColor4ub(255, 255, 255, opacity);
-    glBegin(GL_QUADS);
-    glTexCoord2d(0, 0), glVertex2d(Vertex(box.left), Vertex(box.top));
-    glTexCoord2d(repeatsX, 0), glVertex2d(Vertex(box.right), Vertex(box.top));
-    glTexCoord2d(repeatsX, repeatsY), glVertex2d(Vertex(box.right), Vertex(box.bottom));
-    glTexCoord2d(0, repeatsY), glVertex2d(Vertex(box.left), Vertex(box.bottom));
-    glEnd();
-    glDisable(GL_TEXTURE_2D);
-    ThrowOnError("The graphics card could not paint the pattern.");
+    TexturedQuad(texture->Name(), Vertex(box.left), Vertex(box.top), Vertex(box.right), Vertex(box.bottom),
+                 {0, 0, repeatsX, repeatsY}, GL_REPEAT);
   });
 }
 
@@ -244,22 +249,10 @@ void KDrawerOpenGL::AlphaMask(const KRect& dest, const KBitmap& mask, KPoint sou
     if (box.IsEmpty()) return;
     const KOpenGLTexture* texture = KOpenGLTexture::GetAlphaMask(mask, *this);
     if (!texture) return;
-    const double tw = texture->Width(), th = texture->Height();
-    const double s0 = s.left / tw, s1 = (s.right + 1.0) / tw, t0 = s.top / th, t1 = (s.bottom + 1.0) / th;
     SetBlending(mode);
-    glEnable(GL_TEXTURE_2D);
-    glBindTexture(GL_TEXTURE_2D, texture->Name());
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_CLAMP_TO_EDGE);
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_CLAMP_TO_EDGE);
     Color(color, KMulByte(KAlphaOf(color), opacity));
-    glBegin(GL_QUADS);
-    glTexCoord2d(s0, t0), glVertex2d(Vertex(box.left), Vertex(box.top));
-    glTexCoord2d(s1, t0), glVertex2d(Vertex(box.right), Vertex(box.top));
-    glTexCoord2d(s1, t1), glVertex2d(Vertex(box.right), Vertex(box.bottom));
-    glTexCoord2d(s0, t1), glVertex2d(Vertex(box.left), Vertex(box.bottom));
-    glEnd();
-    glDisable(GL_TEXTURE_2D);
-    ThrowOnError("The graphics card could not paint the mask.");
+    TexturedQuad(texture->Name(), Vertex(box.left), Vertex(box.top), Vertex(box.right), Vertex(box.bottom),
+                 AreaOf(s, texture->Width(), texture->Height()), GL_CLAMP_TO_EDGE);
   });
 }
 
@@ -367,16 +360,8 @@ void KDrawerOpenGL::PaintCoverage(const KCoverage& mask, KColor color, uint8_t o
   glPixelStorei(GL_UNPACK_ALIGNMENT, 1);
   glTexSubImage2D(GL_TEXTURE_2D, 0, 0, 0, mask.width, mask.height, GL_ALPHA, GL_UNSIGNED_BYTE, mask.values.data());
   glPixelStorei(GL_UNPACK_ALIGNMENT, 4);
-  const double s1 = double(mask.width) / maskWidth_, t1 = double(mask.height) / maskHeight_;
   glEnable(GL_BLEND);
-  glEnable(GL_TEXTURE_2D);
   Color(color, KMulByte(KAlphaOf(color), opacity));
-  glBegin(GL_QUADS);
-  glTexCoord2d(0, 0), glVertex2d(mask.x, mask.y);
-  glTexCoord2d(s1, 0), glVertex2d(mask.x + mask.width, mask.y);
-  glTexCoord2d(s1, t1), glVertex2d(mask.x + mask.width, mask.y + mask.height);
-  glTexCoord2d(0, t1), glVertex2d(mask.x, mask.y + mask.height);
-  glEnd();
-  glDisable(GL_TEXTURE_2D);
-  ThrowOnError("The graphics card could not paint the shape.");
+  TexturedQuad(maskTexture_, mask.x, mask.y, mask.x + mask.width, mask.y + mask.height,
+               {0, 0, double(mask.width) / maskWidth_, double(mask.height) / maskHeight_}, GL_CLAMP_TO_EDGE);
 }

@@ -169,7 +169,7 @@ std::vector<KPointF> KCoverageDrawer::CurvePoints(const KRect& area, std::span<c
   std::vector<KPointF> points;
   if (values.empty() || area.IsEmpty() || !(std::abs(top - bottom) > 1e-10)) return points;
   const double low = std::min(top, bottom), high = std::max(top, bottom);
-  const double stepX = values.size() > 1 ? double(area.right - area.left) / double(values.size() - 1) : 0;
+  const double stepX = values.size() > 1 ? (double(area.right) - area.left) / double(values.size() - 1) : 0;
   const double spanY = double(area.bottom) - area.top;
   points.reserve(values.size());
   for (size_t i = 0; i < values.size(); ++i) {

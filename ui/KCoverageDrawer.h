@@ -35,9 +35,7 @@ public:
 
 protected:
   // `names`: the guarded operation names of the drawer, in slot order (kOperationCount texts).
-  KCoverageDrawer(const KString* names, double scale) : KDrawer(scale), names_(names) {}
-
-  const KString& Name(KDrawerOperation operation) const noexcept { return names_[operation]; }
+  KCoverageDrawer(const KString* names, double scale) : KDrawer(names, scale) {}
 
   // The target's size in pixels.
   virtual int32_t TargetWidth() const noexcept = 0;
@@ -53,6 +51,4 @@ private:
   void Stroke(std::span<const KPointF> points, bool square, KColor color, uint8_t opacity, uint32_t mode);
   // The pixel points of a curve over `area` (see PaintHorizontalPolyLine).
   std::vector<KPointF> CurvePoints(const KRect& area, std::span<const double> values, double top, double bottom) const;
-
-  const KString* names_;
 };

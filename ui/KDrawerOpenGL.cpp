@@ -219,8 +219,8 @@ void KDrawerOpenGL::PatBlt(const KRect& dest, const KBitmap& bitmap, const KRect
     if (!texture) return;
     // Texture coordinates count whole patterns from the destination's corner; a whole-bitmap
     // texture of a rectangle that is not the whole bitmap cannot repeat, so it is never used.
-    const double repeatsX = double(dest.right - dest.left + 1) / texture->Width();
-    const double repeatsY = double(dest.bottom - dest.top + 1) / texture->Height();
+    const double repeatsX = double(dest.Width()) / texture->Width();
+    const double repeatsY = double(dest.Height()) / texture->Height();
     SetBlending(mode);
     glColor4ub(255, 255, 255, opacity);
     TexturedQuad(texture->Name(), Vertex(box.left), Vertex(box.top), Vertex(box.right), Vertex(box.bottom),

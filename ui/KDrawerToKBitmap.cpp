@@ -105,11 +105,11 @@ struct KDrawerToKBitmap::Source {
   bool wrap;
 
   int64_t X(int64_t x) const noexcept {
-    const int64_t w = area.right - area.left + 1;
+    const int64_t w = area.Width();
     return wrap ? area.left + ((x - area.left) % w + w) % w : Clamp(x, area.left, area.right);
   }
   int64_t Y(int64_t y) const noexcept {
-    const int64_t h = area.bottom - area.top + 1;
+    const int64_t h = area.Height();
     return wrap ? area.top + ((y - area.top) % h + h) % h : Clamp(y, area.top, area.bottom);
   }
   uint32_t At(double u, double v) const noexcept {

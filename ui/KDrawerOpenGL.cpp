@@ -69,8 +69,7 @@ KDrawerOpenGL::~KDrawerOpenGL() {
     if (set.alphaMask) names.push_back(set.alphaMask->Name());
     for (auto& part : set.parts) names.push_back(part->Name());
   }
-  for (GLuint name : {GLuint(maskTexture_), GLuint(framebufferTexture_)})
-    if (name) names.push_back(name);
+  if (framebufferTexture_) names.push_back(framebufferTexture_);
   if (!names.empty()) glDeleteTextures(GLsizei(names.size()), names.data());
   if (framebuffer_) glDeleteFramebuffers(1, &framebuffer_);
   context_.Release();
@@ -346,22 +345,23 @@ void KDrawerOpenGL::FillRectangleGradient(const KRect& rect, KColor from, KColor
 
 void KDrawerOpenGL::PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t) {
   CheckPainting();
-  // One scratch texture, grown to the largest mask so far.
-  if (!maskTexture_ || mask.width > maskWidth_ || mask.height > maskHeight_) {
-    maskWidth_ = std::max(maskWidth_, mask.width);
-    maskHeight_ = std::max(maskHeight_, mask.height);
-    if (!maskTexture_) glGenTextures(1, &maskTexture_);
-    glBindTexture(GL_TEXTURE_2D, maskTexture_);
-    glTexImage2D(GL_TEXTURE_2D, 0, GL_ALPHA8, maskWidth_, maskHeight_, 0, GL_ALPHA, GL_UNSIGNED_BYTE, nullptr);
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_NEAREST);
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, GL_NEAREST);
-  }
-  glBindTexture(GL_TEXTURE_2D, maskTexture_);
+  // A texture of its own for each mask: refilling one texture that painted quads still wait
+  // on would make the renderer finish them first.
+  GLuint texture = 0;
+  glGenTextures(1, &texture);
+  glBindTexture(GL_TEXTURE_2D, texture);
   glPixelStorei(GL_UNPACK_ALIGNMENT, 1);
-  glTexSubImage2D(GL_TEXTURE_2D, 0, 0, 0, mask.width, mask.height, GL_ALPHA, GL_UNSIGNED_BYTE, mask.values.data());
+  glTexImage2D(GL_TEXTURE_2D, 0, GL_ALPHA8, mask.width, mask.height, 0, GL_ALPHA, GL_UNSIGNED_BYTE, mask.values.data());
   glPixelStorei(GL_UNPACK_ALIGNMENT, 4);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_NEAREST);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, GL_NEAREST);
   glEnable(GL_BLEND);
   Color(color, KMulByte(KAlphaOf(color), opacity));
-  TexturedQuad(maskTexture_, mask.x, mask.y, mask.x + mask.width, mask.y + mask.height,
-               {0, 0, double(mask.width) / maskWidth_, double(mask.height) / maskHeight_}, GL_CLAMP_TO_EDGE);
+  try {
+    TexturedQuad(texture, mask.x, mask.y, mask.x + mask.width, mask.y + mask.height, {0, 0, 1, 1}, GL_CLAMP_TO_EDGE);
+  } catch (...) {
+    glDeleteTextures(1, &texture);
+    throw;
+  }
+  glDeleteTextures(1, &texture);
 }

@@ -76,7 +76,5 @@ private:
   int32_t textureCount_ = 0;
   uint32_t framebuffer_ = 0;
   uint32_t framebufferTexture_ = 0;
-  uint32_t maskTexture_ = 0;  // scratch texture of coverage masks
-  int32_t maskWidth_ = 0, maskHeight_ = 0;
   bool painting_ = false;
 };

@@ -102,6 +102,32 @@ void BlendCoverageRow(uint32_t* out, const uint8_t* coverage, int64_t n, KColor 
     if (coverage[i]) Blend(out[i], color, KMulByte(alpha, coverage[i]));
 }
 
+// One source row filtered across: out[i] mixes the texels columns[2i] and columns[2i+1] with
+// weights[i] of 256 for the second; two pixels at a time where the texels are neighbours.
+// `lanes` holds per pixel the eight 16-bit factors of that (four of 256 - w, four of w).
+void FilterRow(const uint32_t* row, const int64_t* columns, const uint32_t* weights, const int16_t* lanes, uint32_t* out,
+               int64_t n) noexcept {
+  int64_t i = 0;
+#if defined(__SSE2__) || defined(_M_X64)
+  const __m128i zero = _mm_setzero_si128(), half = _mm_set1_epi16(128);
+  const auto mix = [&](int64_t k) {
+    const __m128i m = _mm_mullo_epi16(_mm_unpacklo_epi8(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(row + columns[2 * k])), zero),
+                                      _mm_loadu_si128(reinterpret_cast<const __m128i*>(lanes + 8 * k)));
+    return _mm_add_epi16(m, _mm_srli_si128(m, 8));
+  };
+  for (; i + 2 <= n; i += 2) {
+    if (columns[2 * i + 1] != columns[2 * i] + 1 || columns[2 * i + 3] != columns[2 * i + 2] + 1) {
+      out[i] = Lerp(row[columns[2 * i]], row[columns[2 * i + 1]], weights[i]);
+      out[i + 1] = Lerp(row[columns[2 * i + 2]], row[columns[2 * i + 3]], weights[i + 1]);
+      continue;
+    }
+    const __m128i both = _mm_srli_epi16(_mm_add_epi16(_mm_unpacklo_epi64(mix(i), mix(i + 1)), half), 8);
+    _mm_storel_epi64(reinterpret_cast<__m128i*>(out + i), _mm_packus_epi16(both, zero));
+  }
+#endif
+  for (; i < n; ++i) out[i] = Lerp(row[columns[2 * i]], row[columns[2 * i + 1]], weights[i]);
+}
+
 // n pixels put over `out`; opaque pixels at full opacity are copied four at a time.
 void PutRow(uint32_t* out, const uint32_t* in, int64_t n, uint8_t opacity, bool copy) noexcept {
   if (opacity == 255 && copy) {
@@ -171,10 +197,13 @@ void KDrawerToKBitmap::Stretch(const PixelBox& dest, const Source& source, uint8
   };
   std::vector<int64_t> columns(static_cast<size_t>(2 * count));
   std::vector<uint32_t> weights(static_cast<size_t>(count));
+  std::vector<int16_t> lanes(static_cast<size_t>(8 * count));
   bool unfiltered = true;  // every pixel centre on a texel centre
   for (int64_t i = 0; i < count; ++i) {
     int64_t first;
     split(startU + double(i) * source.du, first, weights[size_t(i)]);
+    std::fill_n(&lanes[size_t(8 * i)], 4, int16_t(256 - weights[size_t(i)]));
+    std::fill_n(&lanes[size_t(8 * i + 4)], 4, int16_t(weights[size_t(i)]));
     columns[size_t(2 * i)] = source.X(first);
     columns[size_t(2 * i + 1)] = source.X(first + 1);
     unfiltered = unfiltered && weights[size_t(i)] == 0;
@@ -184,12 +213,7 @@ void KDrawerToKBitmap::Stretch(const PixelBox& dest, const Source& source, uint8
   std::vector<uint32_t> upper(static_cast<size_t>(count)), lower(static_cast<size_t>(count)), mixed(static_cast<size_t>(count));
   int64_t upperRow = INT64_MIN, lowerRow = INT64_MIN;
   const auto filterRow = [&](int64_t row, std::vector<uint32_t>& into) {
-    const uint32_t* r = source.bitmap.Row(int32_t(source.Y(row)));
-    for (int64_t i = 0; i < count; ++i) {
-      const uint32_t w = weights[size_t(i)];
-      const uint32_t a = r[columns[size_t(2 * i)]];
-      into[size_t(i)] = w ? Lerp(a, r[columns[size_t(2 * i + 1)]], w) : a;
-    }
+    FilterRow(source.bitmap.Row(int32_t(source.Y(row))), columns.data(), weights.data(), lanes.data(), into.data(), count);
   };
   for (int64_t y = y0; y < y1; ++y) {
     int64_t first;

@@ -427,9 +427,16 @@ void KDrawerToKBitmap::PaintCoverage(const KCoverage& mask, KColor color, uint8_
   });
 }
 
-void KDrawerToKBitmap::PaintGlyphs(const std::vector<KGlyphInk>& glyphs, KColor color, uint8_t opacity, uint32_t) {
+void KDrawerToKBitmap::PaintGlyphs(const std::vector<KGlyphInk>& glyphs, KColor color, uint8_t opacity, uint32_t mode) {
   const uint32_t alpha = KMulByte(KAlphaOf(color), opacity);
   if (alpha == 0) return;
+  // Where inks overlap (italics, tight pairs) their coverage must add up before it is blended
+  // once, as one mask; glyphs that stand apart go straight onto the target.
+  int64_t right = INT64_MIN;
+  for (const KGlyphInk& g : glyphs) {
+    if (g.x < right) return KCoverageDrawer::PaintGlyphs(glyphs, color, opacity, mode);
+    right = std::max(right, g.x + g.width);
+  }
   for (const KGlyphInk& g : glyphs) {
     const int64_t x0 = std::max<int64_t>(g.x, 0), x1 = std::min<int64_t>(g.x + g.width, target_.Width());
     const int64_t y0 = std::max<int64_t>(g.y, 0), y1 = std::min<int64_t>(g.y + g.height, target_.Height());

@@ -113,3 +113,28 @@ TEST(Text, ScaleTwoDrawsTheSameTextTwiceAsLarge) {
   EXPECT_NEAR(two.bottom - two.top, 2 * (one.bottom - one.top), 3);
   EXPECT_NEAR(two.left, 2 * one.left, 2);
 }
+
+TEST(Text, OverlappingInksAddUpBeforeTheyAreBlended) {
+  // Bold italic "ff" at this size: the inks of the two glyphs share pixels.
+  const KFont font(15, KFontStyle::BoldItalic);
+  const double box[4] = {0, 0, 60, 30};
+  const std::vector<KGlyphInk> glyphs = font.Place(KString("ff"), 1, box, kAlignLeft);
+  ASSERT_EQ(glyphs.size(), 2u);
+  const auto inkAt = [](const KGlyphInk& g, int32_t x, int32_t y) -> uint32_t {
+    return x >= g.x && x < g.x + g.width && y >= g.y && y < g.y + g.height ? g.ink[(y - g.y) * g.width + (x - g.x)] : 0;
+  };
+  // Painted in white at half opacity over black, a pixel shows half of the two inks' sum; blended
+  // one glyph after the other it would show 1 - (1 - a)(1 - b) of it instead.
+  KBitmap picture(60, 30);
+  picture.Fill(0xFF000000u);
+  KDrawerToKBitmap drawer(picture);
+  drawer.AlignedTextOut({0, 0, 59, 29}, KString("ff"), font, 0xFFFFFFFFu, kAlignLeft, 128, kDrawBlend);
+  int32_t shared = 0;
+  for (int32_t y = 0; y < 30; ++y)
+    for (int32_t x = 0; x < 60; ++x) {
+      const uint32_t a = inkAt(glyphs[0], x, y), b = inkAt(glyphs[1], x, y);
+      shared += a > 0 && b > 0;
+      ASSERT_EQ(KGreenOf(picture.Pixel(x, y)), KMulByte(128, std::min(255u, a + b))) << x << "," << y;
+    }
+  EXPECT_GT(shared, 0);
+}

@@ -17,7 +17,9 @@
 // A plug-in of the kernel as one LV2 instance. Ports follow KPortLayout. Control inputs carry
 // working units; a control whose value differs from the one seen at the previous run reaches the
 // plug-in as one point at the block start, as a VST 3 host's single point does. The state is
-// the plug-in's UTF-8 state text under one property.
+// the plug-in's UTF-8 state text under one property. Any block length runs: the processing
+// cycle takes long blocks in pieces, so neither the options nor the buffer-size feature is asked
+// for, and an unconnected side-chain reads as silence.
 //
 // The host's URID map is needed only for MIDI and for the state: an audio effect runs in a host
 // that offers no features at all. Run neither allocates nor waits for a lock; every entry is

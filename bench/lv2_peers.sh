@@ -13,7 +13,7 @@ SUDO=""
 [ "$(id -u)" -eq 0 ] || SUDO="sudo"
 export DEBIAN_FRONTEND=noninteractive
 dpkg -s zam-plugins lsp-plugins-lv2 >/dev/null 2>&1 ||
-  $SUDO apt-get install -y -q --no-install-recommends zam-plugins lsp-plugins-lv2 lv2file >/dev/null
+  $SUDO apt-get -o DPkg::Lock::Timeout=900 install -y -q --no-install-recommends zam-plugins lsp-plugins-lv2 lv2file >/dev/null
 
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT

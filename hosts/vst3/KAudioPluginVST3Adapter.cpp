@@ -180,11 +180,9 @@ TResult KAudioPluginVST3Adapter::Process(ProcessData& data) {
     const float* inputs[KAudioPlugin::kMaxChannels] = {};
     float* outputs[KAudioPlugin::kMaxChannels] = {};
     const bool mapped = buses_.MapBuffers(data, inputs, outputs, discard_.get(), discardLength_);
-    processing_ = &data;
     midiOut_.BeginBlock();
     plugin.ProcessHostBlock(inputs, mapped ? outputs : nullptr, data.numSamples);
     midiOut_.EndBlock();
-    processing_ = nullptr;
     if (mapped) KBusLayout::MarkSilence(data);
     midiOut_.Flush(data.outputEvents);
     return kResultOk;
@@ -348,16 +346,6 @@ void KAudioPluginVST3Adapter::BeginGesture(int32_t index) { host_.BeginEdit(stat
 
 void KAudioPluginVST3Adapter::SendAutomationValue(int32_t index, double normalized) {
   host_.PerformEdit(static_cast<ParamID>(index), normalized);
-}
-
-// The component handler belongs to the user-interface thread; from inside processing a value
-// goes out with the block's output parameter changes instead.
-void KAudioPluginVST3Adapter::SendAutomationValueFromProcess(int32_t index, double normalized) {
-  if (!processing_ || !processing_->outputParameterChanges) return;
-  int32_t queueIndex = 0, pointIndex = 0;
-  const auto id = static_cast<ParamID>(index);
-  if (IParamValueQueue* queue = processing_->outputParameterChanges->AddParameterData(id, queueIndex))
-    queue->AddPoint(0, normalized, pointIndex);
 }
 
 void KAudioPluginVST3Adapter::EndGesture(int32_t index) { host_.EndEdit(static_cast<ParamID>(index)); }

@@ -140,7 +140,6 @@ public:
   // ---- KAudioPluginInterface: the plug-in's way back to the host
   void BeginGesture(int32_t index) override;
   void SendAutomationValue(int32_t index, double normalized) override;
-  void SendAutomationValueFromProcess(int32_t index, double normalized) override;
   void EndGesture(int32_t index) override;
   void SendMIDIEvent(int32_t sampleOffset, const uint8_t bytes[4]) override;
   void ReportLatency(int32_t samples) override;
@@ -167,6 +166,4 @@ private:
   // Where outputs the host left out are written, sized at setupProcessing.
   std::unique_ptr<float[]> discard_;
   int32_t discardLength_ = 0;
-  // The block being processed, for values the plug-in sends from inside processing.
-  KVST3::ProcessData* processing_ = nullptr;
 };

@@ -3,6 +3,7 @@
 #include "hosts/vst3/KAudioPluginVST3Adapter.h"
 #include "hosts/vst3/KVST3ClassId.h"
 #include "kernel/KEntryPoints.h"
+#include "kernel/KPluginIdentifiers.h"
 #include "plugins/utility/KUtilityPlugin.h"
 #include "tests/core/AllocationCounter.h"
 #include "tests/core/RecordingPlugin.h"
@@ -11,16 +12,15 @@
 using namespace KVST3Test;
 
 namespace {
-// A key's bundle: the key without its "K" and without a trailing "Plugin".
-std::string BundleName(std::string key) { return key.ends_with("Plugin") ? key.substr(1, key.size() - 7) : key.substr(1); }
 ParamID Parameters(const char* key) { return static_cast<ParamID>(std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(KString::Static(key)))->ParameterCount()); }
 FUnknown* Adapt(KAudioPlugin* plugin) { return static_cast<IComponent*>(new KAudioPluginVST3Adapter(std::unique_ptr<KAudioPlugin>(plugin))); }
 }  // namespace
 
 TEST(VST3Bundles, EveryCataloguePluginHasABundleThatDescribesAndMakesIt) {
   for (const KString& key : GetTorvanePluginList()) {
-    const std::string name = BundleName(key.ToUtf8());
+    const std::string name = KPluginIds::BundleName(key.ToUtf8());
     KBundle bundle(name);
+    ASSERT_TRUE(bundle.factory) << name;
     PFactoryInfo factory{}; PClassInfoW info{};
     IPluginFactory3* factory3 = Query<IPluginFactory3>(bundle.factory);
     ASSERT_TRUE(factory3) << name;

@@ -34,6 +34,22 @@ TEST(VST3Bundles, EveryCataloguePluginHasABundleThatDescribesAndMakesIt) {
   }
 }
 
+// When a host unloads the last bundle, the kernel leaves the process with it (no symbol of it pins
+// it in memory), so that a second load starts from fresh globals; and it loads again.
+TEST(VST3Bundles, TheKernelUnloadsWithTheLastBundleAndLoadsAgain) {
+  const std::string binaries = BundleBinaries("Utility");
+  for (int round = 1; round <= 2; ++round) {
+    {
+      KBundle bundle("Utility");
+      ASSERT_TRUE(bundle.factory);
+      KInstance made(bundle.Create());
+      EXPECT_TRUE(KPlatform::IsLibraryLoaded(binaries + "libtorvane.so"));
+    }
+    EXPECT_FALSE(KPlatform::IsLibraryLoaded(binaries + "libtorvane.so")) << "round " << round;
+    EXPECT_FALSE(KPlatform::IsLibraryLoaded(binaries + "Utility.so")) << "round " << round;
+  }
+}
+
 // Two bundles at once, each with its own kernel. The compressor's buses and parameters; its state
 // restores another instance exactly (a broken one changes nothing); texts; audio through both.
 TEST(VST3Bundles, TwoBundlesAtOnceCompressorBusesParametersStateTextsAndAudio) {

@@ -1,0 +1,80 @@
+// The product's descriptions: whole and free of clashes, the identifiers of the released plug-ins
+// exactly as hosts saved them, and the README's table of plug-ins as the descriptions say.
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <fstream>
+#include <sstream>
+#include <string>
+
+#include "kernel/KCatalogue.h"
+#include "kernel/KPluginIdentifiers.h"
+
+namespace {
+std::string Hex(uint32_t value) {
+  char text[9];
+  std::snprintf(text, sizeof text, "%08X", value);
+  return text;
+}
+
+std::string ClassId(const char* identity) {
+  std::string id;
+  for (const uint32_t word : KPluginIds::VST3ClassWords(identity)) id += (id.empty() ? "" : " ") + Hex(word);
+  return id;
+}
+
+// The README's table, one row per plug-in in catalogue order.
+std::string PluginTable() {
+  std::string table = "| key | name | module (category) | VST 3 sub-categories | VST 2 id | VST 3 class id |\n|---|---|---|---|---|---|\n";
+  for (const KPluginDescription& plugin : KProductCatalogue().plugins) {
+    std::string subCategories = plugin.vst3SubCategories;
+    for (size_t bar = subCategories.find('|'); bar != std::string::npos; bar = subCategories.find('|', bar + 2))
+      subCategories.insert(bar, "\\");
+    const std::string module = plugin.moduleKey ? std::string(plugin.moduleKey) + " (" + plugin.category + ")" : "";
+    table += "| `" + std::string(plugin.key) + "` | " + plugin.name + " | " + module + " | " + subCategories + " | `" + plugin.vst2Id +
+             "` | `" + ClassId(plugin.identity) + "` |\n";
+  }
+  return table;
+}
+}  // namespace
+
+TEST(Descriptions, TheProductCatalogueHasNoFaults) {
+  std::string faults;
+  for (const KString& problem : KCatalogueProblems(KProductCatalogue())) faults += problem.ToUtf8() + "\n";
+  EXPECT_EQ(faults, "");
+}
+
+// Hosts saved projects under these: they never change. New plug-ins add rows here.
+TEST(Descriptions, ReleasedPluginsKeepTheirIdentifiers) {
+  struct Released {
+    const char* key;
+    const char* classId;
+    int32_t vst2;
+    int32_t aaxPlugin;
+  };
+  const Released released[] = {{"KUtilityPlugin", "DF0106AD B7E01744 F2F781A7 8CB082C4", 0x54765574, 0x02A3D501},
+                               {"KCompressorPlugin", "F1DE0DFF 0C09900F 11CFA2FC E8B122D9", 0x5476436F, static_cast<int32_t>(0xD221FEBB)},
+                               {"KEqualizerPlugin", "8FCBB6A5 CF3DD354 4B1A0A86 868302F4", 0x54764571, static_cast<int32_t>(0xBD0D05C2)},
+                               {"KSampleWarmer", "003667AA 3B1E4EFD E8BAC290 D213509B", 0x54765357, 0x16E13430}};
+  for (const Released& plugin : released) {
+    const KPluginDescription* found = nullptr;
+    for (const KPluginDescription& description : KProductCatalogue().plugins)
+      if (std::string(description.key) == plugin.key) found = &description;
+    ASSERT_TRUE(found) << plugin.key;
+    EXPECT_EQ(ClassId(found->identity), plugin.classId) << plugin.key;
+    EXPECT_EQ(KPluginIds::VST2UniqueId(found->vst2Id), plugin.vst2) << plugin.key;
+    EXPECT_EQ(KPluginIds::AAXProductId(found->vst2Id), plugin.vst2) << plugin.key;
+    EXPECT_EQ(KPluginIds::AAXPluginId(found->identity), plugin.aaxPlugin) << plugin.key;
+    EXPECT_EQ(KPluginIds::LV2URI(found->identity), "urn:torvane:" + std::string(plugin.key));
+    EXPECT_EQ(KPluginIds::CLAPId(found->identity), "torvane." + std::string(plugin.key));
+  }
+}
+
+TEST(Descriptions, TheReadmeListsEveryPluginAsItsDescriptionSays) {
+  std::ifstream file(TORVANE_SOURCE_DIR "/README.md");
+  ASSERT_TRUE(file) << "README.md not found";
+  std::stringstream readme;
+  readme << file.rdbuf();
+  const std::string table = PluginTable();
+  EXPECT_NE(readme.str().find(table), std::string::npos) << "README.md should hold this table of plug-ins:\n" << table;
+}

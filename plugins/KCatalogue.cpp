@@ -4,11 +4,12 @@
 // (kernel/KPluginDescription.h). Nothing else lists the plug-ins: the registries, the VST 3
 // bundles and the README's table all follow this list. Its order is the order in which hosts
 // and the command line list the plug-ins: add new plug-ins at the end.
-#define TORVANE_CATALOGUE(PLUGIN)   \
-  PLUGIN(kUtilityDescription)       \
-  PLUGIN(kCompressorDescription)    \
-  PLUGIN(kEqualizerDescription)     \
-  PLUGIN(kSampleWarmerDescription)
+#define TORVANE_CATALOGUE(PLUGIN) \
+  PLUGIN(kUtilityDescription)     \
+  PLUGIN(kCompressorDescription)  \
+  PLUGIN(kEqualizerDescription)   \
+  PLUGIN(kSampleWarmerDescription) \
+  /* new plug-ins above this line */
 
 #define TORVANE_DECLARE(description) extern const KPluginDescription description;
 #define TORVANE_LIST(description) description,

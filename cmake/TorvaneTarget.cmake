@@ -51,11 +51,17 @@ if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
 endif()
 
 # An object library of one subsystem, compiled once for both the shared and the static kernel:
-#   torvane_part(<target> <folder> SOURCES <files...> DEPENDS <subsystem targets...>)
-# It sees its own folder and, through DEPENDS, the folders of its dependencies, nothing else.
-function(torvane_part name folder)
+#   torvane_part(<target> [SOURCES] <files...> [DEPENDS <subsystem targets...>])
+# called in the subsystem's folder. It sees that folder and, through DEPENDS (torvane_kernel when
+# none are given), the folders of its dependencies, nothing else.
+function(torvane_part name)
   cmake_parse_arguments(PART "" "" "SOURCES;DEPENDS" ${ARGN})
-  add_library(${name} OBJECT ${PART_SOURCES})
+  file(RELATIVE_PATH folder "${PROJECT_SOURCE_DIR}" "${CMAKE_CURRENT_SOURCE_DIR}")
+  string(REGEX REPLACE "/.*" "" folder "${folder}")
+  if(NOT PART_DEPENDS AND NOT name STREQUAL "torvane_kernel")
+    set(PART_DEPENDS torvane_kernel)
+  endif()
+  add_library(${name} OBJECT ${PART_SOURCES} ${PART_UNPARSED_ARGUMENTS})
   torvane_defaults(${name})
   torvane_view(${folder} view)
   target_include_directories(${name} PUBLIC ${view})

@@ -35,6 +35,12 @@ private:
 };
 }  // namespace
 
+const KPluginDescription* KFindDescription(const KCatalogue& catalogue, std::string_view key) noexcept {
+  for (const KPluginDescription& plugin : catalogue.plugins)
+    if (plugin.key && key == plugin.key) return &plugin;
+  return nullptr;
+}
+
 KStringList KCatalogueProblems(const KCatalogue& catalogue) {
   KStringList problems;
   auto problem = [&](const std::string& text) { problems.Append(KString::FromUtf8(text)); };

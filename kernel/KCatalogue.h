@@ -1,6 +1,7 @@
 #pragma once
 
 #include <span>
+#include <string_view>
 
 #include "kernel/KExport.h"
 #include "kernel/KPluginDescription.h"
@@ -16,6 +17,9 @@ struct KCatalogue {
 
 // The product's catalogue (plugins/KCatalogue.cpp).
 TORVANE_API const KCatalogue& KProductCatalogue();
+
+// The description whose key is `key` exactly, or null.
+const KPluginDescription* KFindDescription(const KCatalogue& catalogue, std::string_view key) noexcept;
 
 // One sentence per fault of the catalogue's descriptions: a field left out, a VST 2 id that is
 // not four printable characters, a category that does not exist, or a key, module key, identity,

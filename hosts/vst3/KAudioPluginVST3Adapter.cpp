@@ -1,11 +1,13 @@
 #include "hosts/vst3/KAudioPluginVST3Adapter.h"
 
+#include <string>
 #include <utility>
 
 #include "hosts/vst3/KVST3ChannelContext.h"
 #include "hosts/vst3/KVST3ClassId.h"
 #include "hosts/vst3/KVST3ProcessInput.h"
 #include "hosts/vst3/KVST3Util.h"
+#include "kernel/KCatalogue.h"
 
 using namespace KVST3;
 
@@ -78,7 +80,9 @@ TResult KAudioPluginVST3Adapter::GetControllerClassId(char* classId) {
     if (!classId) return kInvalidArgument;
     // The controller is this same class: a host that insists on a controller object of its own
     // makes a second instance, which takes the component's state through SetComponentState.
-    KClassIdOf(plugin_->Identifier().ToUtf8()).CopyTo(classId);
+    const std::string key = plugin_->Identifier().ToUtf8();
+    const KPluginDescription* description = KFindDescription(KProductCatalogue(), key);
+    KClassIdOf(description && description->identity ? description->identity : key).CopyTo(classId);
     return kResultTrue;
   });
 }

@@ -32,11 +32,7 @@ std::string TableRow(const KPluginDescription& plugin) {
          ClassId(plugin.identity) + "` |";
 }
 
-const KPluginDescription* Find(const char* key) {
-  for (const KPluginDescription& description : KProductCatalogue().plugins)
-    if (std::string(description.key) == key) return &description;
-  return nullptr;
-}
+const KPluginDescription* Find(const char* key) { return KFindDescription(KProductCatalogue(), key); }
 
 // Hosts saved projects under these: they never change. Releasing a plug-in adds its row here and
 // to the README's table.

@@ -2,11 +2,13 @@
 
 #include <cstdint>
 
+#include "kernel/KExport.h"
+
 // What a plug-in may ask of the host that carries it, whatever the host format. The host layer
 // implements it (KAudioPluginInterface: gesture bookkeeping, the sending counter, latency
 // reports) and each adapter fills the slots with its format's calls; the plug-in holds a pointer
 // to it, null while no host is attached.
-class KAudioPluginHost {
+class TORVANE_API KAudioPluginHost {
 public:
   // Latency requests: report when changed, or report in any case.
   static constexpr int32_t kLatencyIfChanged = 1;

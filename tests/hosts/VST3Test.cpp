@@ -10,6 +10,7 @@
 #include "tests/core/RecordingPlugin.h"
 #include "tests/hosts/VST3Host.h"
 
+#include <filesystem>
 #include <random>
 
 using namespace KVST3Test;
@@ -60,6 +61,30 @@ TEST(VST3Bundles, TheKernelUnloadsWithTheLastBundleAndLoadsAgain) {
     EXPECT_FALSE(KPlatform::IsLibraryLoaded(binaries + "libtorvane.so")) << "round " << round;
     EXPECT_FALSE(KPlatform::IsLibraryLoaded(binaries + "Utility.so")) << "round " << round;
   }
+}
+
+// A bundle whose name the kernel does not know (renamed by hand) loads, offers no factory and
+// says why; nothing crashes.
+TEST(VST3Bundles, ABundleOfAnUnknownNameOffersNoFactory) {
+  namespace fs = std::filesystem;
+  const fs::path folder = TORVANE_VST3_DIR "-unknown";
+  const fs::path binaries = folder / "Nope.vst3/Contents" / TORVANE_VST3_ARCH;
+  fs::create_directories(binaries);
+  fs::copy_file(BundleBinaries("Utility") + "Utility.so", binaries / "Nope.so", fs::copy_options::overwrite_existing);
+  fs::copy_file(BundleBinaries("Utility") + "libtorvane.so", binaries / "libtorvane.so", fs::copy_options::overwrite_existing);
+  void* library = KPlatform::OpenLibrary(binaries / "Nope.so");
+  ASSERT_TRUE(library) << KPlatform::LibraryError();
+  const auto entry = reinterpret_cast<ModuleEntryFunction>(KPlatform::FindSymbol(library, "ModuleEntry"));
+  const auto get = reinterpret_cast<GetPluginFactoryFunction>(KPlatform::FindSymbol(library, "GetPluginFactory"));
+  const auto exit = reinterpret_cast<ModuleExitFunction>(KPlatform::FindSymbol(library, "ModuleExit"));
+  ASSERT_TRUE(entry && get && exit);
+  EXPECT_TRUE(entry(library));
+  testing::internal::CaptureStderr();
+  EXPECT_EQ(get(), nullptr);
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "Torvane: the kernel knows no plug-in of the bundle Nope\n");
+  EXPECT_TRUE(exit());
+  KPlatform::CloseLibrary(library);
+  fs::remove_all(folder);
 }
 
 // Two bundles at once, each with its own kernel. The compressor's buses and parameters; its state

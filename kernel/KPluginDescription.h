@@ -2,6 +2,8 @@
 
 #include "kernel/KPluginRegistry.h"
 
+struct KPluginHelp;
+
 // Everything hosts and the catalogue know of one plug-in, kept beside its class as data. The
 // identifiers host formats save projects under are derived from `identity` and `vst2Id` by the
 // rules of KPluginIdentifiers.h; neither field changes once the plug-in has been released.
@@ -17,6 +19,7 @@ struct KPluginDescription {
   const char* vst3SubCategories = nullptr;  // "Fx|Dynamics"
   const char* vst2Id = nullptr;             // four printable ASCII characters, unique in the catalogue
   const char* identity = nullptr;           // the key at first release; stays when the key is renamed
+  const KPluginHelp& (*help)() = nullptr;   // what the plug-in and each parameter are for (plugins/KPluginHelp.h)
   const char* vendor = kVendor;
   const char* version = TORVANE_VERSION;
 };

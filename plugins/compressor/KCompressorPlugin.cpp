@@ -119,6 +119,7 @@ constinit const KPluginDescription kCompressorDescription{
     .vst3SubCategories = "Fx|Dynamics",
     .vst2Id = "TvCo",
     .identity = "KCompressorPlugin",
+    .help = &KCompressorHelp,
 };
 
 std::span<const KCompressorPlugin::Point> KCompressorPlugin::DefaultCustomShape() noexcept { return kDefaultShape; }

@@ -93,5 +93,7 @@ private:
   int32_t reading_ = 2;  // audio thread
 };
 
-// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp).
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
+// help (beside it in this folder).
 extern const KPluginDescription kCompressorDescription;
+const KPluginHelp& KCompressorHelp();

@@ -197,6 +197,7 @@ constinit const KPluginDescription kEqualizerDescription{
     .vst3SubCategories = "Fx|EQ",
     .vst2Id = "TvEq",
     .identity = "KEqualizerPlugin",
+    .help = &KEqualizerHelp,
 };
 
 void KEqualizerPlugin::ProcessUpdate() {

@@ -70,5 +70,7 @@ private:
   bool tidy_ = false;      // a flat band still rings: look again at the next sub-block
 };
 
-// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp).
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
+// help (beside it in this folder).
 extern const KPluginDescription kEqualizerDescription;
+const KPluginHelp& KEqualizerHelp();

@@ -50,6 +50,7 @@ constinit const KPluginDescription kUtilityDescription{
     .vst3SubCategories = "Fx|Tools",
     .vst2Id = "TvUt",
     .identity = "KUtilityPlugin",
+    .help = &KUtilityHelp,
 };
 
 void KUtilityPlugin::TargetMatrix(double (&m)[4]) const {

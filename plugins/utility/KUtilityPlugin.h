@@ -32,5 +32,7 @@ private:
   bool jumpToTarget_ = true;
 };
 
-// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp).
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
+// help (beside it in this folder).
 extern const KPluginDescription kUtilityDescription;
+const KPluginHelp& KUtilityHelp();

@@ -76,6 +76,7 @@ constinit const KPluginDescription kSampleWarmerDescription{
     .vst3SubCategories = "Fx|Distortion",
     .vst2Id = "TvSW",
     .identity = "KSampleWarmer",
+    .help = &KSampleWarmerHelp,
 };
 
 bool KSampleWarmer::SetSampleRate(double sampleRate) {

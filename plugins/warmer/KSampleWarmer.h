@@ -89,5 +89,7 @@ private:
   float wet_[kChannels][kPiece] = {};
 };
 
-// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp).
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
+// help (beside it in this folder).
 extern const KPluginDescription kSampleWarmerDescription;
+const KPluginHelp& KSampleWarmerHelp();

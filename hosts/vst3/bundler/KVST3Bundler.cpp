@@ -1,11 +1,12 @@
 // Lays out one VST 3 bundle per plug-in of the kernel's catalogue, in the Linux layout:
 //   <dir>/<Name>.vst3/Contents/<arch>/<Name>.so       the loader, named after the bundle
 //   <dir>/<Name>.vst3/Contents/<arch>/libtorvane.so   a copy of the kernel
+//   <dir>/<Name>.vst3/Contents/<arch>/<file>          a copy of each further file (the fonts)
 // and lists the bundle names in <dir>/bundles.txt. Bundles of plug-ins the catalogue no longer
 // holds are removed. A catalogue with faults lays out nothing: each fault is printed and the
 // build fails.
 //
-//   torvane_vst3_bundler <kernel library> <loader> <dir> <arch>
+//   torvane_vst3_bundler <kernel library> <loader> <dir> <arch> [<file>...]
 
 #include <cstdio>
 #include <filesystem>
@@ -27,8 +28,8 @@ void CopyIfChanged(const fs::path& from, const fs::path& to) {
 }  // namespace
 
 int main(int argc, char** argv) {
-  if (argc != 5) {
-    std::fprintf(stderr, "usage: %s <kernel library> <loader> <dir> <arch>\n", argv[0]);
+  if (argc < 5) {
+    std::fprintf(stderr, "usage: %s <kernel library> <loader> <dir> <arch> [<file>...]\n", argv[0]);
     return 2;
   }
   const fs::path kernel = argv[1], loader = argv[2], dir = argv[3];
@@ -46,6 +47,7 @@ int main(int argc, char** argv) {
       fs::create_directories(binaries);
       CopyIfChanged(loader, binaries / (name + ".so"));
       CopyIfChanged(kernel, binaries / kernel.filename());
+      for (int i = 5; i < argc; ++i) CopyIfChanged(argv[i], binaries / fs::path(argv[i]).filename());
       names.insert(name);
       list << name << "\n";
     }

@@ -25,6 +25,10 @@ public:
   virtual void GestureNotice(int32_t index, int32_t kind) = 0;
   virtual void BeginGesture(int32_t index) = 0;
   virtual void SendAutomationValue(int32_t index, double normalized) = 0;
+  // A second form of the send; formats with a single automation call leave it as the first.
+  virtual void SendAutomationValueSecondForm(int32_t index, double normalized) {
+    SendAutomationValue(index, normalized);
+  }
   virtual void EndGesture(int32_t index) = 0;
   // Reserved: keeps the slots after it where every adapter expects them.
   virtual void Reserved() {}

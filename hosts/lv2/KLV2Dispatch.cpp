@@ -6,23 +6,15 @@
 #include <cstring>
 #include <deque>
 #include <mutex>
-#include <string_view>
+#include <string>
 
 #include "hosts/common/KHostEntry.h"
 #include "hosts/common/KHostGuard.h"
 #include "hosts/lv2/KAudioPluginLV2Adapter.h"
 #include "kernel/KCatalogue.h"
+#include "kernel/KPluginIdentifiers.h"
 
 namespace KLV2 {
-
-std::string KPluginURI(const char* identity) { return std::string("urn:torvane:") + identity; }
-
-std::string KBundleName(const char* key) {
-  std::string_view name(key);
-  if (name.starts_with('K')) name.remove_prefix(1);
-  if (name.size() > 6 && name.ends_with("Plugin")) name.remove_suffix(6);
-  return std::string(name);
-}
 
 namespace {
 constexpr const char* kCaption = "LV2 Plugin main";
@@ -92,9 +84,9 @@ constexpr LV2_State_Interface kState = {Save, Restore};
 const void* ExtensionData(const char* uri) { return std::strcmp(uri, LV2_STATE__interface) == 0 ? &kState : nullptr; }
 
 const LV2_Descriptor* Find(const char* bundleName) {
-  for (const KCatalogueEntry& plugin : KProductCatalogue().plugins) {
-    if (KBundleName(plugin.key) != bundleName) continue;
-    const std::string uri = KPluginURI(plugin.key);
+  for (const KPluginDescription& plugin : KProductCatalogue().plugins) {
+    if (KPluginIds::BundleName(plugin.key) != bundleName) continue;
+    const std::string uri = KPluginIds::LV2URI(plugin.identity);
     std::lock_guard<std::mutex> lock(gEntriesLock);
     for (const KEntry& entry : gEntries)
       if (entry.uri == uri) return &entry.descriptor;

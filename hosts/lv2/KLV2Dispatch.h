@@ -2,21 +2,15 @@
 
 #include <lv2/core/lv2.h>
 
-#include <string>
-
 #include "kernel/KExport.h"
 
 // The kernel's LV2 entry, which each bundle's loader resolves by this name: the descriptor of
 // the plug-in whose bundle is named `bundleName` ("Compressor" for Compressor.lv2), or null
-// when the catalogue holds none of that name. Descriptors live as long as the kernel.
+// when the catalogue holds none of that name. The URI and the bundle name follow
+// kernel/KPluginIdentifiers.h. Descriptors live as long as the kernel.
 extern "C" TORVANE_API const LV2_Descriptor* KLV2DispatchDescriptor(const char* bundleName);
 
 namespace KLV2 {
 inline constexpr const char* kDispatchName = "KLV2DispatchDescriptor";
 using DispatchFunction = const LV2_Descriptor* (*)(const char* bundleName);
-
-// The plug-in's URI, which hosts save projects under: stable once released.
-std::string KPluginURI(const char* identity);
-// The bundle's name: the key without its leading "K" and without a trailing "Plugin".
-std::string KBundleName(const char* key);
 }  // namespace KLV2

@@ -18,6 +18,7 @@
 #include "core/KParameter.h"
 #include "hosts/common/KHostEntry.h"
 #include "hosts/lv2/KLV2Dispatch.h"
+#include "kernel/KPluginIdentifiers.h"
 #include "hosts/lv2/KLV2Ports.h"
 
 namespace KLV2Test {
@@ -67,7 +68,7 @@ struct KInstance {
   LV2_Handle handle = nullptr;
 
   KInstance(const std::string& key, const LV2_Feature* const* features)
-      : descriptor(KLV2DispatchDescriptor(KLV2::KBundleName(key.c_str()).c_str())), described(KHostCreatePlugin(key.c_str(), "")) {
+      : descriptor(KLV2DispatchDescriptor(KPluginIds::BundleName(key.c_str()).c_str())), described(KHostCreatePlugin(key.c_str(), "")) {
     described->SetChannelsPerBus(2);
     EXPECT_TRUE(descriptor) << key;
     handle = descriptor ? descriptor->instantiate(descriptor, 48000.0, "", features) : nullptr;

@@ -30,7 +30,7 @@ TEST(LV2Adapter, EveryPluginLoadsWithoutFeaturesAndRunsAnyBlockLengthWithoutAllo
     KInstance instance(key.ToUtf8(), nullptr);
     ASSERT_TRUE(instance.handle) << key.ToUtf8();
     EXPECT_EQ(std::string(instance.descriptor->URI), "urn:torvane:" + key.ToUtf8());
-    EXPECT_EQ(instance.descriptor, KLV2DispatchDescriptor(KLV2::KBundleName(key.ToUtf8().c_str()).c_str()));  // one per plug-in
+    EXPECT_EQ(instance.descriptor, KLV2DispatchDescriptor(KPluginIds::BundleName(key.ToUtf8().c_str()).c_str()));  // one per plug-in
     instance.Run(64);  // first run: every control lands once
     float& control = instance.buffers[static_cast<size_t>(instance.layout.First(KPort::Kind::kParameter))][0];
     const float low = static_cast<float>(instance.described->GetParameter(0).Kind().Minimum());
@@ -170,7 +170,7 @@ TEST(LV2Bundles, EachLoaderAnswersThePluginItsBundleIsNamedAfter) {
   namespace fs = std::filesystem;
   using Entry = const LV2_Descriptor* (*)(uint32_t);
   for (const KString& key : GetTorvanePluginList()) {
-    const std::string name = KLV2::KBundleName(key.ToUtf8().c_str());
+    const std::string name = KPluginIds::BundleName(key.ToUtf8().c_str());
     void* library = KPlatform::OpenLibrary(TORVANE_LV2_DIR "/" + name + ".lv2/" + name + ".so");
     ASSERT_TRUE(library) << KPlatform::LibraryError();
     const auto entry = reinterpret_cast<Entry>(KPlatform::FindSymbol(library, "lv2_descriptor"));

@@ -18,6 +18,7 @@
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
 #include "hosts/lv2/KLV2Dispatch.h"
+#include "kernel/KPluginIdentifiers.h"
 #include "kernel/KEntryPoints.h"
 
 namespace fs = std::filesystem;
@@ -132,7 +133,7 @@ TEST_F(LV2Tools, TheValidatorFindsNoErrorInAnyBundle) {
 // lv2info lists every port of every bundle, each control with its range.
 TEST_F(LV2Tools, LV2InfoListsEveryPortWithItsRange) {
   for (const KString& key : GetTorvanePluginList()) {
-    const std::string uri = KLV2::KPluginURI(key.ToUtf8().c_str());
+    const std::string uri = KPluginIds::LV2URI(key.ToUtf8().c_str());
     const auto [ok, output] = RunTool(kLV2Path + "lv2info " + uri);
     ASSERT_TRUE(ok) << output;
     std::unique_ptr<KAudioPlugin> plugin(CreateTorvanePlugin(key));
@@ -154,7 +155,7 @@ TEST_F(LV2Tools, RendersEqualTorvaneRenderBitForBit) {
   WriteInput(input, 2);
   WriteInput(withSideChain, 4);
   for (const KCase& test : kCases) {
-    const std::string uri = KLV2::KPluginURI(test.key);
+    const std::string uri = KPluginIds::LV2URI(test.key);
     std::string set, file, apply;
     for (const KSetting& setting : test.settings) {
       set += std::string(" --set ") + setting.key + "=" + setting.value;

@@ -15,9 +15,9 @@
 
 #include "core/KAudioPlugin.h"
 #include "hosts/common/KHostEntry.h"
-#include "hosts/lv2/KLV2Dispatch.h"
 #include "hosts/lv2/bundler/KLV2Turtle.h"
 #include "kernel/KCatalogue.h"
+#include "kernel/KPluginIdentifiers.h"
 
 namespace fs = std::filesystem;
 
@@ -47,17 +47,17 @@ int main(int argc, char** argv) {
   const fs::path kernel = argv[1], loader = argv[2], dir = argv[3], names = argv[4];
   try {
     std::ofstream list(names.string() + ".new");
-    for (const KCatalogueEntry& entry : KProductCatalogue().plugins) {
+    for (const KPluginDescription& entry : KProductCatalogue().plugins) {
       const std::unique_ptr<KAudioPlugin> plugin = KHostCreatePlugin(entry.key, "");
       if (!plugin || !plugin->SetChannelsPerBus(KAudioPlugin::kChannelCounts[0])) {
         std::fprintf(stderr, "Torvane LV2 bundles: %s cannot be made in stereo\n", entry.key);
         return 1;
       }
-      const std::string name = KLV2::KBundleName(entry.key), uri = KLV2::KPluginURI(entry.key);
+      const std::string name = KPluginIds::BundleName(entry.key), uri = KPluginIds::LV2URI(entry.identity);
       const fs::path bundle = dir / (name + ".lv2");
       fs::create_directories(bundle);
       WriteIfChanged(bundle / "manifest.ttl", KLV2::KManifestTurtle(uri, name));
-      WriteIfChanged(bundle / (name + ".ttl"), KLV2::KPluginTurtle(*plugin, uri, name));
+      WriteIfChanged(bundle / (name + ".ttl"), KLV2::KPluginTurtle(*plugin, uri, entry.name));
       CopyIfChanged(loader, bundle / (name + ".so"));
       CopyIfChanged(kernel, bundle / kernel.filename());
       list << name << "\n";

@@ -4,6 +4,8 @@
 #include <cmath>
 #include <limits>
 
+#include "dsp/KDecibels.h"
+
 namespace {
 
 // Guards every division by a product or difference that may be near zero.
@@ -12,14 +14,6 @@ constexpr double kTiny = 1e-10;
 // decaying on through the slow denormal range.
 constexpr double kSilent = 1e-20;
 constexpr double kLargest = std::numeric_limits<double>::max();
-
-double Linear(double decibels) noexcept { return std::exp(0.11512925464970228 * decibels); }
-
-// The one-pole coefficient of a time constant; 0 (instant) for a time too short to divide by.
-double Smoothing(double rate, double seconds) noexcept {
-  const double span = rate * seconds;
-  return std::abs(span) < kTiny ? 0.0 : std::exp(-1.0 / span);
-}
 
 // The slow averages divide in the other order, so that their coefficients are exactly
 // exp(−10/fs) and exp(−0.4/fs).
@@ -53,11 +47,11 @@ void KDynamicsProcessor::Prepare(int32_t maxChannels, int32_t maxFrames) {
 
 void KDynamicsProcessor::Update(const KDynamicsSettings& settings) noexcept {
   const double fs = settings.sampleRate;
-  gIn_ = Linear(settings.gainDb);
-  gOut_ = Linear(settings.outputGainDb);
-  attack_ = Smoothing(fs, settings.attack);
-  release_ = Smoothing(fs, settings.release);
-  meanSquare_.coefficient = Smoothing(fs, settings.rmsLength);
+  gIn_ = KDecibelsToLinear(settings.gainDb);
+  gOut_ = KDecibelsToLinear(settings.outputGainDb);
+  attack_ = KSmoothingCoefficient(fs, settings.attack);
+  release_ = KSmoothingCoefficient(fs, settings.release);
+  meanSquare_.coefficient = KSmoothingCoefficient(fs, settings.rmsLength);
   meanSquare_.complement = 1.0 - meanSquare_.coefficient;
   shortAverage_ = Average(fs, 0.1);
   longAverage_ = Average(fs, 2.5);

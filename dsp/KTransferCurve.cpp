@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cmath>
 
+#include "dsp/KDecibels.h"
+
 namespace {
 
 // Differences and detector values below this count as zero.
@@ -98,7 +100,7 @@ struct KTransferLaws {
 
 void KTransferCurve::Configure(const Settings& settings) noexcept {
   t_ = settings.threshold * settings.threshold;
-  full_ = std::exp(0.11512925464970228 * (1.0 - 1.0 / settings.ratio) * 8.685889638065037 * std::log(t_));
+  full_ = KDecibelsToLinear((1.0 - 1.0 / settings.ratio) * KLinearToDecibels(t_));
   m_ = std::abs(t_ - 1.0) < kTiny ? 1.0 : (full_ - t_) / (1.0 - t_);
   b_ = t_ * (1.0 - m_);
   makeUp_ = settings.maximize && !settings.customShape ? 1.0 / full_ : 1.0;

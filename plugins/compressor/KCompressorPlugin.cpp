@@ -8,47 +8,9 @@
 
 #include "core/Element.h"
 #include "core/KParameter.h"
+#include "dsp/KDecibels.h"
 
 namespace {
-const KDecibelKind kGainKind(-24.0, 24.0);
-const KTimeKind kAttackKind(0.00001, 1.0);
-const KTimeKind kReleaseKind(0.001, 5.0);
-const KTimeKind kRmsLengthKind(0.00001, 0.5);
-// Not down to 0: a threshold of 0 leaves no full-scale output to make up from, and "Maximize to
-// 0dB" would divide by it. 0.001 is −60 dB.
-const KLinearKind kThresholdKind(0.001, 1.0, "", "{0.3}");
-const KRatioKind kRatioKind(1.0, 20.0);
-constexpr const char* kKneeNames[] = {"Hard", "Linear", "Soft"};
-const KListKind kKneeKind(kKneeNames);
-const KLinearKind kKneeSizeKind(0.0, 1.0, "", "{0.2}");
-const KSwitchKind kSwitch;
-// The ends switch their limit off.
-const KFrequencyKind kBandLimitKind(20.0, 20000.0);
-constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
-// Where the detector listens and whether it is auditioned are routing choices made while setting
-// up, not performance moves: hosts do not automate them.
-constexpr uint32_t kRouting = 0;
-
-constexpr KParameterInfo kParameters[] = {
-    {"gain", "Gain", &kGainKind, 0.0, kAutomatable},
-    {"outputgain", "Output gain", &kGainKind, 0.0, kAutomatable},
-    {"attack", "Attack", &kAttackKind, 0.01, kAutomatable},
-    {"release", "Release", &kReleaseKind, 0.05, kAutomatable},
-    {"rmslength", "RMS length", &kRmsLengthKind, 0.001, kAutomatable},
-    {"threshold", "Threshold", &kThresholdKind, 0.5, kAutomatable},
-    {"ratio", "Ratio", &kRatioKind, 1.8, kAutomatable},
-    {"kneemode", "Knee mode", &kKneeKind, KTransferCurve::kHardKnee, kAutomatable},
-    {"kneesize", "Knee size", &kKneeSizeKind, 0.25, kAutomatable},
-    {"linkchannels", "Link channels", &kSwitch, 1.0, kAutomatable},
-    {"maximize", "Maximize to 0dB", &kSwitch, 0.0, kAutomatable},
-    {"customshape", "Custom shape", &kSwitch, 0.0, kAutomatable},
-    {"SideChainInput", "Side-chain input", &kSwitch, 0.0, kRouting},
-    {"SideChainPlay", "Side-chain play", &kSwitch, 0.0, kRouting},
-    {"SideChainMinFrequency", "Side-chain min frequency", &kBandLimitKind, 20.0, kAutomatable},
-    {"SideChainMaxFrequency", "Side-chain max frequency", &kBandLimitKind, 20000.0, kAutomatable},
-};
-static_assert(std::size(kParameters) == KCompressorPlugin::kParameterCount);
-
 // A main bus and a side-chain bus in, one bus out.
 constexpr KAudioPlugin::Shape kShape{2, 1, false, false, false};
 constexpr int32_t kMaxChannelsPerBus =
@@ -221,6 +183,6 @@ void KCompressorPlugin::MeterGainReduction(int32_t n) noexcept {
     const float* gains = engine_.GainBuffer(row);
     for (int32_t i = 0; i < n; ++i) lowest = gains[i] < lowest ? gains[i] : lowest;
   }
-  const double decibels = lowest < total ? 8.685889638065037 * std::log(static_cast<double>(lowest) / total) : 0.0;
+  const double decibels = lowest < total ? KLinearToDecibels(static_cast<double>(lowest) / total) : 0.0;
   gainReduction_.store(static_cast<float>(std::max(decibels, -200.0)), std::memory_order_relaxed);
 }

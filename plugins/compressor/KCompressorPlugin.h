@@ -1,11 +1,13 @@
 #pragma once
 
 #include <atomic>
+#include <iterator>
 #include <mutex>
 #include <span>
 #include <vector>
 
 #include "core/KAudioPlugin.h"
+#include "core/KParameterInfo.h"
 #include "dsp/KDynamicsProcessor.h"
 #include "dsp/KSectionRunner.h"
 #include "dsp/KTransferCurve.h"
@@ -19,26 +21,62 @@
 // through three slots handed round without a lock on the audio side, so the engine never reads a
 // graph while it is being rebuilt.
 class KCompressorPlugin final : public KAudioPlugin {
+  static inline const KDecibelKind kGainKind{-24.0, 24.0};
+  static inline const KTimeKind kAttackKind{0.00001, 1.0};
+  static inline const KTimeKind kReleaseKind{0.001, 5.0};
+  static inline const KTimeKind kRmsLengthKind{0.00001, 0.5};
+  // Not down to 0: a threshold of 0 leaves no full-scale output to make up from, and "Maximize
+  // to 0dB" would divide by it. 0.001 is −60 dB.
+  static inline const KNumberKind kThresholdKind{0.001, 1.0, "", "{0.3}"};
+  static inline const KRatioKind kRatioKind{1.0, 20.0};
+  static constexpr const char* kKneeNames[] = {"Hard", "Linear", "Soft"};
+  static inline const KListKind kKneeKind{kKneeNames};
+  static inline const KNumberKind kKneeSizeKind{0.0, 1.0, "", "{0.2}"};
+  static inline const KSwitchKind kSwitch{};
+  // The ends switch their limit off.
+  static inline const KFrequencyKind kBandLimitKind{20.0, 20000.0};
+  static constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
+  // Where the detector listens and whether it is auditioned are routing choices made while
+  // setting up, not performance moves: hosts do not automate them.
+  static constexpr uint32_t kRouting = 0;
+
 public:
-  enum ParameterIndex : int32_t {
-    kGain,
-    kOutputGain,
-    kAttack,
-    kRelease,
-    kRmsLength,
-    kThreshold,
-    kRatio,
-    kKneeMode,
-    kKneeSize,
-    kLinkChannels,
-    kMaximize,
-    kCustomShape,
-    kSideChainInput,
-    kSideChainPlay,
-    kSideChainMinFrequency,
-    kSideChainMaxFrequency,
-    kParameterCount
+  // The parameter table; each index below is its key's row.
+  static constexpr KParameterInfo kParameters[] = {
+      {"gain", "Gain", &kGainKind, 0.0, kAutomatable},
+      {"outputgain", "Output gain", &kGainKind, 0.0, kAutomatable},
+      {"attack", "Attack", &kAttackKind, 0.01, kAutomatable},
+      {"release", "Release", &kReleaseKind, 0.05, kAutomatable},
+      {"rmslength", "RMS length", &kRmsLengthKind, 0.001, kAutomatable},
+      {"threshold", "Threshold", &kThresholdKind, 0.5, kAutomatable},
+      {"ratio", "Ratio", &kRatioKind, 1.8, kAutomatable},
+      {"kneemode", "Knee mode", &kKneeKind, KTransferCurve::kHardKnee, kAutomatable},
+      {"kneesize", "Knee size", &kKneeSizeKind, 0.25, kAutomatable},
+      {"linkchannels", "Link channels", &kSwitch, 1.0, kAutomatable},
+      {"maximize", "Maximize to 0dB", &kSwitch, 0.0, kAutomatable},
+      {"customshape", "Custom shape", &kSwitch, 0.0, kAutomatable},
+      {"SideChainInput", "Side-chain input", &kSwitch, 0.0, kRouting},
+      {"SideChainPlay", "Side-chain play", &kSwitch, 0.0, kRouting},
+      {"SideChainMinFrequency", "Side-chain min frequency", &kBandLimitKind, 20.0, kAutomatable},
+      {"SideChainMaxFrequency", "Side-chain max frequency", &kBandLimitKind, 20000.0, kAutomatable},
   };
+  static constexpr int32_t kGain = KParameterRow(kParameters, "gain");
+  static constexpr int32_t kOutputGain = KParameterRow(kParameters, "outputgain");
+  static constexpr int32_t kAttack = KParameterRow(kParameters, "attack");
+  static constexpr int32_t kRelease = KParameterRow(kParameters, "release");
+  static constexpr int32_t kRmsLength = KParameterRow(kParameters, "rmslength");
+  static constexpr int32_t kThreshold = KParameterRow(kParameters, "threshold");
+  static constexpr int32_t kRatio = KParameterRow(kParameters, "ratio");
+  static constexpr int32_t kKneeMode = KParameterRow(kParameters, "kneemode");
+  static constexpr int32_t kKneeSize = KParameterRow(kParameters, "kneesize");
+  static constexpr int32_t kLinkChannels = KParameterRow(kParameters, "linkchannels");
+  static constexpr int32_t kMaximize = KParameterRow(kParameters, "maximize");
+  static constexpr int32_t kCustomShape = KParameterRow(kParameters, "customshape");
+  static constexpr int32_t kSideChainInput = KParameterRow(kParameters, "SideChainInput");
+  static constexpr int32_t kSideChainPlay = KParameterRow(kParameters, "SideChainPlay");
+  static constexpr int32_t kSideChainMinFrequency = KParameterRow(kParameters, "SideChainMinFrequency");
+  static constexpr int32_t kSideChainMaxFrequency = KParameterRow(kParameters, "SideChainMaxFrequency");
+  static constexpr int32_t kParameterCount = static_cast<int32_t>(std::size(kParameters));
   using Point = KTransferShape::Point;
 
   KCompressorPlugin();

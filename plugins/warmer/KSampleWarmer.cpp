@@ -2,29 +2,12 @@
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
 
 #include "core/KParameter.h"
+#include "dsp/KDecibels.h"
 
 namespace {
-constexpr const char* kShapeNames[] = {"Soft clip", "Tanh", "Tube"};
-static_assert(std::size(kShapeNames) == KSampleWarmer::kShapeCount);
-
-const KDecibelKind kDriveKind(0.0, 36.0);
-const KListKind kShapeKind(kShapeNames);
-const KLinearKind kToneKind(-100.0, 100.0, "%", "{0.0}");
-const KDecibelKind kOutputKind(-24.0, 12.0);
-const KLinearKind kMixKind(0.0, 100.0, "%", "{0.0}");
-constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
-
-constexpr KParameterInfo kParameters[] = {
-    {"drive", "Drive", &kDriveKind, 6.0, kAutomatable},
-    {"shape", "Shape", &kShapeKind, KSampleWarmer::kTube, kAutomatable},
-    {"tone", "Tone", &kToneKind, 0.0, kAutomatable},
-    {"outputgain", "Output gain", &kOutputKind, 0.0, kAutomatable},
-    {"mix", "Dry/wet", &kMixKind, 100.0, kAutomatable},
-};
-static_assert(std::size(kParameters) == KSampleWarmer::kParameterCount);
-
 constexpr KAudioPlugin::Shape kPluginShape{1, 1, false, false, false};
 
 // A gentle slope: the tilt's shelves blend over several octaves about the pivot.
@@ -32,8 +15,6 @@ constexpr double kTiltQ = 0.5;
 // The tube curve's bias: the positive half saturates sooner than the negative one, which adds
 // even harmonics and a level-dependent DC offset (removed behind the curve).
 constexpr double kTubeBias = 0.25;
-
-double Linear(double decibels) { return std::exp(0.11512925464970228 * decibels); }
 
 // x − 4x³/27 up to |x| = 1.5, where it meets ±1 with zero slope.
 void SoftClip(double* samples, int32_t count) noexcept {
@@ -97,32 +78,12 @@ void KSampleWarmer::ResetState() {
   jump_ = true;
 }
 
-void KSampleWarmer::Glide::Aim(double to, int32_t samples, bool jump) noexcept {
-  target = to;
-  if (jump) {
-    value = to;
-    left = 0;
-  } else {
-    left = samples;
-    step = (to - value) / samples;
-  }
-}
-
-void KSampleWarmer::Glide::Fill(double* values, int32_t count) noexcept {
-  const int32_t gliding = std::min(left, count);
-  for (int32_t i = 0; i < gliding; ++i) values[i] = value += step;
-  left -= gliding;
-  if (left == 0) value = target;  // no rounding drift past the glide
-  std::fill(values + gliding, values + count, value);
-}
-
 void KSampleWarmer::ProcessUpdate() {
   const double rate = SampleRate();
-  const int32_t glide = std::max(1, static_cast<int32_t>(rate * kGlideSeconds));
-  drive_.Aim(Linear(GetParameter(kDrive).Working()), glide, jump_);
-  output_.Aim(Linear(GetParameter(kOutputGain).Working()), glide, jump_);
-  mix_.Aim(GetParameter(kMix).Working() / 100.0, glide, jump_);
-  jump_ = false;
+  const double targets[kGlides] = {KDecibelsToLinear(GetParameter(kDrive).Working()),
+                                    KDecibelsToLinear(GetParameter(kOutputGain).Working()),
+                                    GetParameter(kMix).Working() / 100.0};
+  glides_.Aim(targets, static_cast<int32_t>(rate * kGlideSeconds), std::exchange(jump_, false));
 
   const int32_t shape = static_cast<int32_t>(std::lround(GetParameter(kShape).Working()));
   curve_ = CurveOf(shape);
@@ -151,9 +112,10 @@ void KSampleWarmer::Process(const float* const* inputs, float* const* outputs, i
 
 void KSampleWarmer::ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels,
                                  int32_t frames) noexcept {
-  drive_.Fill(driveGain_, frames);
-  output_.Fill(outputGain_, frames);
-  mix_.Fill(wetShare_, frames);
+  glides_.Fill(kDriveGlide, driveGain_, frames);
+  glides_.Fill(kOutputGlide, outputGain_, frames);
+  glides_.Fill(kMixGlide, wetShare_, frames);
+  glides_.Passed(frames);
   const int32_t factor = oversamplers_[0].Factor();
   constexpr int32_t kMask = kDelaySize - 1;
 

@@ -1,5 +1,7 @@
 #include "dsp/KDynamicsProcessor.h"
 
+#include <emmintrin.h>
+
 #include <algorithm>
 #include <cmath>
 #include <limits>
@@ -34,6 +36,7 @@ void KDynamicsProcessor::Prepare(int32_t maxChannels, int32_t maxFrames) {
   e_.assign(channels, 0.0);
   envelope_.assign(channels * frames, 0.0f);
   gains_.assign(channels * frames, 0.0f);
+  work_.assign(frames, 0.0);
   filtered_.assign(filtered * frames, 0.0f);
   filteredRows_.resize(filtered);
   for (size_t ch = 0; ch < filtered; ++ch) filteredRows_[ch] = filtered_.data() + ch * frames;
@@ -90,6 +93,7 @@ void KDynamicsProcessor::DesignBandLimits(const KDynamicsSettings& settings) noe
 void KDynamicsProcessor::Process(int32_t n, const float* const* in, float* const* out, const float* const* sideChain,
                                  int32_t channels) noexcept {
   if (n <= 0 || channels <= 0) return;
+  lowestGain_ = static_cast<float>(curve_.TotalGain());
   if (idle_) {
     Amplify(n, in, out, channels);
     return;
@@ -115,67 +119,110 @@ void KDynamicsProcessor::Process(int32_t n, const float* const* in, float* const
   }
 }
 
-// One detector fed by the mean square of all channels; every channel gets its gain.
-void KDynamicsProcessor::DetectLinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept {
-  const float* const* x = self.pieceDetect_.data();
-  const float* const* in = self.pieceIn_.data();
-  float* const* out = self.pieceOut_.data();
-  float* envelope = self.envelope_.data();
-  float* gains = self.gains_.data();
-  KTransferCurve& curve = self.curve_;
-  const double gIn = self.gIn_, c = self.meanSquare_.coefficient, attack = self.attack_, release = self.release_;
-  // The mean over the channels rides on the smoothing's complement, in single precision.
-  const double share = self.meanSquare_.complement * (1.0f / static_cast<float>(channels));
-  double p = self.p_[0], e = self.e_[0];
-  for (int32_t i = 0; i < frames; ++i) {
+namespace {
+
+// Two floats into the low half of a register.
+__m128 LoadTwo(const float* at) noexcept { return _mm_castsi128_ps(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(at))); }
+
+// The mean square's input of every sample: share · Σ over the channels of (gIn · x)², summed in
+// channel order. Independent across samples, so it runs two samples per instruction.
+void SquareSum(const float* const* x, int32_t channels, int32_t frames, double gIn, double share, double* sums) noexcept {
+  const __m128d g = _mm_set1_pd(gIn), k = _mm_set1_pd(share);
+  int32_t i = 0;
+  for (; i + 2 <= frames; i += 2) {
+    __m128d s = _mm_setzero_pd();
+    for (int32_t ch = 0; ch < channels; ++ch) {
+      const __m128d v = _mm_mul_pd(g, _mm_cvtps_pd(LoadTwo(x[ch] + i)));
+      s = _mm_add_pd(s, _mm_mul_pd(v, v));
+    }
+    _mm_storeu_pd(sums + i, _mm_mul_pd(k, s));
+  }
+  for (; i < frames; ++i) {
     double s = 0.0;
     for (int32_t ch = 0; ch < channels; ++ch) {
       const double v = gIn * x[ch][i];
       s += v * v;
     }
-    p = c * p + share * s;
-    const double r = std::sqrt(p);
-    e = r + (e < r ? attack : release) * (e - r);
-    const double g = curve.Gain(e);
-    envelope[i] = static_cast<float>(e);
-    gains[i] = static_cast<float>(g);
-    int32_t ch = 0;
-    for (; ch + 4 <= channels; ch += 4) {
-      out[ch][i] = static_cast<float>(g * in[ch][i]);
-      out[ch + 1][i] = static_cast<float>(g * in[ch + 1][i]);
-      out[ch + 2][i] = static_cast<float>(g * in[ch + 2][i]);
-      out[ch + 3][i] = static_cast<float>(g * in[ch + 3][i]);
-    }
-    for (; ch < channels; ++ch) out[ch][i] = static_cast<float>(g * in[ch][i]);
+    sums[i] = share * s;
   }
-  self.p_[0] = p;
-  self.e_[0] = e;
+}
+
+// The detector proper, the one part that runs sample after sample: mean square, square root,
+// attack/release envelope. Takes the sums of SquareSum and leaves the envelope in their place.
+void Envelope(double* levels, float* envelope, int32_t frames, double c, double attack, double release, double& power,
+              double& level) noexcept {
+  double p = power, e = level;  // in registers: the rows might alias the state
+  for (int32_t i = 0; i < frames; ++i) {
+    p = c * p + levels[i];
+    const double r = std::sqrt(p);
+    // A branch rather than a select: it is taken in long runs, and keeps the compare off the
+    // chain from one envelope value to the next, which bounds the whole detector.
+    if (e < r) e = r + attack * (e - r);
+    else e = r + release * (e - r);
+    levels[i] = e;
+    envelope[i] = static_cast<float>(e);
+  }
+  power = p;
+  level = e;
+}
+
+// Stores the gains as float for the meters and answers the lowest (compared in single
+// precision, as stored; a NaN never counts).
+float StoreGains(const double* gains, float* stored, int32_t frames, float lowest) noexcept {
+  __m128 low = _mm_set1_ps(lowest);
+  int32_t i = 0;
+  for (; i + 4 <= frames; i += 4) {
+    const __m128 g = _mm_movelh_ps(_mm_cvtpd_ps(_mm_loadu_pd(gains + i)), _mm_cvtpd_ps(_mm_loadu_pd(gains + i + 2)));
+    _mm_storeu_ps(stored + i, g);
+    low = _mm_min_ps(g, low);
+  }
+  float lanes[4];
+  _mm_storeu_ps(lanes, low);
+  for (float lane : lanes) lowest = lane < lowest ? lane : lowest;
+  for (; i < frames; ++i) {
+    stored[i] = static_cast<float>(gains[i]);
+    lowest = stored[i] < lowest ? stored[i] : lowest;
+  }
+  return lowest;
+}
+
+// out = gain · in, in double, two samples per instruction.
+void ApplyGains(const double* gains, const float* in, float* out, int32_t frames) noexcept {
+  int32_t i = 0;
+  for (; i + 2 <= frames; i += 2) {
+    const __m128d x = _mm_cvtps_pd(LoadTwo(in + i));
+    _mm_storel_epi64(reinterpret_cast<__m128i*>(out + i), _mm_castps_si128(_mm_cvtpd_ps(_mm_mul_pd(_mm_loadu_pd(gains + i), x))));
+  }
+  for (; i < frames; ++i) out[i] = static_cast<float>(gains[i] * in[i]);
+}
+
+}  // namespace
+
+// One detector fed by the mean square of all channels; every channel gets its gain. The work
+// goes in passes over the piece so that all but the envelope itself run two samples at a time.
+void KDynamicsProcessor::DetectLinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept {
+  double* work = self.work_.data();
+  // The mean over the channels rides on the smoothing's complement, in single precision.
+  const double share = self.meanSquare_.complement * (1.0f / static_cast<float>(channels));
+  SquareSum(self.pieceDetect_.data(), channels, frames, self.gIn_, share, work);
+  Envelope(work, self.envelope_.data(), frames, self.meanSquare_.coefficient, self.attack_, self.release_, self.p_[0],
+           self.e_[0]);
+  self.curve_.Gains(work, work, frames);
+  self.lowestGain_ = StoreGains(work, self.gains_.data(), frames, self.lowestGain_);
+  for (int32_t ch = 0; ch < channels; ++ch) ApplyGains(work, self.pieceIn_[ch], self.pieceOut_[ch], frames);
 }
 
 // A detector, an envelope row and a gain row per channel.
 void KDynamicsProcessor::DetectUnlinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept {
-  KTransferCurve& curve = self.curve_;
-  const double gIn = self.gIn_, c = self.meanSquare_.coefficient, share = self.meanSquare_.complement;
-  const double attack = self.attack_, release = self.release_;
+  double* work = self.work_.data();
   for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) {
-    const float* x = self.pieceDetect_[ch];
-    const float* in = self.pieceIn_[ch];
-    float* out = self.pieceOut_[ch];
-    float* envelope = self.envelope_.data() + ch * static_cast<size_t>(self.maxFrames_);
-    float* gains = self.gains_.data() + ch * static_cast<size_t>(self.maxFrames_);
-    double p = self.p_[ch], e = self.e_[ch];
-    for (int32_t i = 0; i < frames; ++i) {
-      const double v = gIn * x[i];
-      p = c * p + share * (v * v);
-      const double r = std::sqrt(p);
-      e = r + (e < r ? attack : release) * (e - r);
-      const double g = curve.Gain(e);
-      envelope[i] = static_cast<float>(e);
-      gains[i] = static_cast<float>(g);
-      out[i] = static_cast<float>(g * in[i]);
-    }
-    self.p_[ch] = p;
-    self.e_[ch] = e;
+    const size_t row = ch * static_cast<size_t>(self.maxFrames_);
+    SquareSum(self.pieceDetect_.data() + ch, 1, frames, self.gIn_, self.meanSquare_.complement, work);
+    Envelope(work, self.envelope_.data() + row, frames, self.meanSquare_.coefficient, self.attack_, self.release_,
+             self.p_[ch], self.e_[ch]);
+    self.curve_.Gains(work, work, frames);
+    self.lowestGain_ = StoreGains(work, self.gains_.data() + row, frames, self.lowestGain_);
+    ApplyGains(work, self.pieceIn_[ch], self.pieceOut_[ch], frames);
   }
 }
 

@@ -85,6 +85,9 @@ public:
   // Envelope and gain of every sample of the last piece processed (row 0 when linked).
   const float* EnvelopeBuffer(int32_t channel) const noexcept { return Row(envelope_, channel); }
   const float* GainBuffer(int32_t channel) const noexcept { return Row(gains_, channel); }
+  // The lowest gain of the last Process over every sample and channel, in single precision as
+  // the gain rows hold it; the total gain G when the engine is idle.
+  float LowestGain() const noexcept { return lowestGain_; }
 
 private:
   using Detector = void (*)(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
@@ -115,6 +118,8 @@ private:
   int32_t channels_ = 0;  // of the last Process, for Decay
   std::vector<double> p_, e_;
   std::vector<float> envelope_, gains_, filtered_;
+  std::vector<double> work_;  // one piece's detector values, then its gains
+  float lowestGain_ = 1.0f;
   std::vector<float*> filteredRows_, pieceOut_;
   std::vector<const float*> pieceIn_, pieceDetect_;
 };

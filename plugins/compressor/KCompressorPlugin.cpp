@@ -139,19 +139,18 @@ void KCompressorPlugin::ProcessUpdate() {
   if (engine_.LowPassActive()) limits[count++] = engine_.LowPass();
   audition_.SetSections(limits, count);
   render_ = on(kSideChainPlay) ? &KCompressorPlugin::Audition : &KCompressorPlugin::Compress;
-  meteredRows_ = engine_.IsIdle() ? 0 : (s.linkChannels ? 1 : ChannelsPerBus());
 }
 
 void KCompressorPlugin::ResetState() {
   engine_.Reset();
   audition_.Reset();
-  gainReduction_.store(0.0f, std::memory_order_relaxed);
+  gainReduction_.store(1.0, std::memory_order_relaxed);
 }
 
 // The first ChannelsPerBus() inputs are the main bus, the next as many the side-chain.
 void KCompressorPlugin::Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) {
   (this->*render_)(inputs, outputs, sampleCount);
-  MeterGainReduction(sampleCount);
+  MeterGainReduction();
 }
 
 void KCompressorPlugin::Compress(const float* const* inputs, float* const* outputs, int32_t n) noexcept {
@@ -175,14 +174,15 @@ void KCompressorPlugin::Audition(const float* const* inputs, float* const* outpu
   }
 }
 
-void KCompressorPlugin::MeterGainReduction(int32_t n) noexcept {
+float KCompressorPlugin::GainReductionDecibels() const noexcept {
+  const double ratio = gainReduction_.load(std::memory_order_relaxed);
+  return ratio < 1.0 ? static_cast<float>(std::max(KLinearToDecibels(ratio), -200.0)) : 0.0f;
+}
+
+void KCompressorPlugin::MeterGainReduction() noexcept {
   // Compared in single precision, as the engine stored the gains, so that no reduction reads 0.
+  // The audio thread keeps the ratio; the reader turns it into decibels.
   const auto total = static_cast<float>(engine_.Transfer().TotalGain());
-  float lowest = total;
-  for (int32_t row = 0; row < meteredRows_; ++row) {
-    const float* gains = engine_.GainBuffer(row);
-    for (int32_t i = 0; i < n; ++i) lowest = gains[i] < lowest ? gains[i] : lowest;
-  }
-  const double decibels = lowest < total ? KLinearToDecibels(static_cast<double>(lowest) / total) : 0.0;
-  gainReduction_.store(static_cast<float>(std::max(decibels, -200.0)), std::memory_order_relaxed);
+  const float lowest = engine_.LowestGain();
+  gainReduction_.store(lowest < total ? static_cast<double>(lowest) / total : 1.0, std::memory_order_relaxed);
 }

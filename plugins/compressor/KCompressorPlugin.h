@@ -90,7 +90,7 @@ public:
 
   // Deepest gain reduction of the latest block in dB (0 or below; make-up and the input and
   // output gains are not reductions). For the editor's meter; any thread.
-  float GainReductionDecibels() const noexcept { return gainReduction_.load(std::memory_order_relaxed); }
+  float GainReductionDecibels() const noexcept;
 
   // The engine as the latest block left it: its law for the editor's graph, its detector for
   // tests. Read it only while no block is being processed.
@@ -111,16 +111,15 @@ private:
 
   void Compress(const float* const* inputs, float* const* outputs, int32_t n) noexcept;
   void Audition(const float* const* inputs, float* const* outputs, int32_t n) noexcept;
-  void MeterGainReduction(int32_t n) noexcept;
+  void MeterGainReduction() noexcept;
   void TakePublishedShape() noexcept;
 
   KDynamicsProcessor engine_;
   KSectionRunner audition_;  // the detector's band limits again, for the audition
   Render render_ = &KCompressorPlugin::Compress;
   bool sideChain_ = false;
-  int32_t meteredRows_ = 0;  // gain rows the engine wrote: 0 when idle, 1 when linked
   std::vector<float> scratch_;  // the engine's output while the audition plays
-  std::atomic<float> gainReduction_{0.0f};
+  std::atomic<double> gainReduction_{1.0};  // the lowest gain over the total gain
 
   // The graph: the writer's slot, the spare slot between the sides, the engine's slot.
   KTransferShape shapes_[3];

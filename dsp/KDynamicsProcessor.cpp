@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <limits>
 
 #include "dsp/KDecibels.h"
@@ -270,6 +271,17 @@ void KDynamicsProcessor::Settle(int32_t states) noexcept {
     if (p_[j] < kSilent * kSilent) p_[j] = 0.0;
     if (e_[j] < kSilent) e_[j] = 0.0;
   }
+}
+
+// The square root of the mean square falls by √c a sample and the envelope follows it at the
+// release: counting first until the root is under half the rest and then until the envelope has
+// come within the other half is a bound for both together. A coefficient of 0 takes no time.
+uint32_t KDynamicsProcessor::ReleaseSamples() const noexcept {
+  const double from = gIn_, rest = curve_.Rest();
+  if (idle_ || !(from > rest)) return 0;
+  const double fall = std::log(rest / (2.0 * from));
+  const double samples = fall / std::log(std::sqrt(meanSquare_.coefficient)) + fall / std::log(release_);
+  return samples < 4e9 ? static_cast<uint32_t>(std::ceil(samples)) : UINT32_MAX;
 }
 
 void KDynamicsProcessor::Reset() noexcept {

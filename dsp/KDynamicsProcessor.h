@@ -58,6 +58,11 @@ public:
   // Advances the detector through n samples of silence.
   void Decay(int32_t n) noexcept;
   void Reset() noexcept;
+  // Samples of silence after which a detector that stood at full scale (times the input gain)
+  // has released to the law's rest, where the gain no longer depends on the past: how long the
+  // engine must go on running after its input stops before the next sound finds it at rest.
+  // 0 when idle.
+  uint32_t ReleaseSamples() const noexcept;
 
   // The chosen law, for the editor's graph and meters.
   double Gain(double d) noexcept { return curve_.Gain(d); }

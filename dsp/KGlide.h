@@ -5,8 +5,8 @@
 
 // N values that travel together in straight lines to their targets over a set number of
 // samples, so that no change of a setting clicks: gains, matrix entries, filter coefficients.
-// A step is taken before the sample that uses it, so the glide's last sample sits exactly on
-// the target. Per-sample loops read `value` and `step`, move their own copies and hand the
+// A step is taken before the sample that uses it, so the glide's last sample reaches the target
+// (within the steps' rounding, which the landing then drops). Per-sample loops read `value` and `step`, move their own copies and hand the
 // count back through Passed.
 template <int N>
 struct KGlide {

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cstdint>
 #include <cmath>
 #include <cstring>
 #include <limits>
@@ -137,6 +138,22 @@ void KSectionRunner::Engage() noexcept {
       std::memset(state_[j], 0, sizeof state_[j]);
     }
   }
+}
+
+uint32_t KSectionRunner::RingSamples(const Row* rows, int32_t count, double fall) noexcept {
+  double samples = 0.0;
+  for (int32_t j = 0; j < count; ++j) {
+    const double* k = rows[j];
+    if (Flat(k)) continue;
+    // Poles: roots of z² + a1·z + a2, with a1 = −(−a1) and a2 = −(−a2) as stored.
+    const double a1 = -k[kMinusA1], a2 = -k[kMinusA2];
+    const double discriminant = a1 * a1 - 4.0 * a2;
+    const double root = std::sqrt(std::abs(discriminant));
+    const double radius = discriminant < 0.0 ? std::sqrt(a2) : std::max(std::abs(-a1 + root), std::abs(-a1 - root)) / 2.0;
+    if (!(radius < 1.0)) return UINT32_MAX;
+    samples += 2.0 + (radius > 0.0 ? std::log(fall) / std::log(radius) : 0.0);  // two for the numerator's taps
+  }
+  return samples < 4e9 ? static_cast<uint32_t>(std::ceil(samples)) : UINT32_MAX;
 }
 
 void KSectionRunner::Reset() noexcept {

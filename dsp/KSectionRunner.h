@@ -49,6 +49,11 @@ public:
 
   void Reset() noexcept;
 
+  // Samples after which the impulse response of `count` sections in series has fallen below
+  // `fall` of its start, taking each section's slowest pole; flat sections ring not at all.
+  // UINT32_MAX for a section that is not stable.
+  static uint32_t RingSamples(const Row* rows, int32_t count, double fall) noexcept;
+
   // Filters `frames` samples of each channel; channels beyond kMaxChannels are left alone. An
   // output may be its own input's buffer. A NaN or infinity spoils the rest of its block only.
   void Process(const float* const* inputs, float* const* outputs, int32_t channels, int32_t frames) noexcept;

@@ -4,6 +4,7 @@
 #include <immintrin.h>
 
 #include <cmath>
+#include <limits>
 
 #include "dsp/KDecibels.h"
 
@@ -216,6 +217,17 @@ void KTransferCurve::Configure(const Settings& settings) noexcept {
   } else {
     ShapeKnee(settings.kneeMode, settings.kneeSize);
   }
+}
+
+double KTransferCurve::Rest() const noexcept {
+  switch (variant_) {
+    case kIdle: return std::numeric_limits<double>::infinity();
+    case kHard: return t_;
+    case kCustom: return kTiny;
+    case kLinear:
+    case kSoft: break;
+  }
+  return s0_;
 }
 
 void KTransferCurve::ShapeKnee(int32_t kneeMode, double kneeSize) noexcept {

@@ -92,6 +92,9 @@ public:
   double TotalGain() const noexcept { return g_; }  // make-up · input gain · output gain
   double InverseGain() const noexcept { return inverseG_; }
   double KneeStart() const noexcept { return s0_; }  // of the linear and soft knees
+  // The detector value at and below which the law gives the plain gain G: where a detector has
+  // come to rest as far as the output can tell. Infinite when idle (any value will do).
+  double Rest() const noexcept;
   double KneeEnd() const noexcept { return s1_; }
 
 private:

@@ -108,10 +108,9 @@ void KCompressorPlugin::TakePublishedShape() noexcept {
     reading_ = spare_.exchange(reading_, std::memory_order_acq_rel) & ~kFresh;
 }
 
-void KCompressorPlugin::ProcessUpdate() {
+KDynamicsSettings KCompressorPlugin::Settings() const noexcept {
   auto value = [this](int32_t p) { return GetParameter(p).Working(); };
   auto on = [&](int32_t p) { return value(p) >= 0.5; };
-  TakePublishedShape();
   KDynamicsSettings s;
   s.gainDb = value(kGain);
   s.outputGainDb = value(kOutputGain);
@@ -125,12 +124,27 @@ void KCompressorPlugin::ProcessUpdate() {
   s.linkChannels = on(kLinkChannels);
   s.maximize = on(kMaximize);
   s.customShape = on(kCustomShape);
-  s.shape = &shapes_[reading_];
-  s.sideChain = sideChain_ = on(kSideChainInput);
+  s.sideChain = on(kSideChainInput);
   s.sideChainFilters = true;
   s.sideChainMinFrequency = value(kSideChainMinFrequency);
   s.sideChainMaxFrequency = value(kSideChainMaxFrequency);
   s.sampleRate = SampleRate();
+  return s;
+}
+
+// The output follows the input at once (gain times input), but the detector needs its release
+// to come to rest: a host that stopped sooner would start the next sound compressed.
+uint32_t KCompressorPlugin::TailSamples() const noexcept {
+  KDynamicsProcessor engine;
+  engine.Update(Settings());
+  return engine.ReleaseSamples();
+}
+
+void KCompressorPlugin::ProcessUpdate() {
+  TakePublishedShape();
+  KDynamicsSettings s = Settings();
+  s.shape = &shapes_[reading_];
+  sideChain_ = s.sideChain;
   engine_.Update(s);
 
   KFilterSection limits[2];
@@ -138,7 +152,7 @@ void KCompressorPlugin::ProcessUpdate() {
   if (engine_.HighPassActive()) limits[count++] = engine_.HighPass();
   if (engine_.LowPassActive()) limits[count++] = engine_.LowPass();
   audition_.SetSections(limits, count);
-  render_ = on(kSideChainPlay) ? &KCompressorPlugin::Audition : &KCompressorPlugin::Compress;
+  render_ = GetParameter(kSideChainPlay).Working() >= 0.5 ? &KCompressorPlugin::Audition : &KCompressorPlugin::Compress;
 }
 
 void KCompressorPlugin::ResetState() {

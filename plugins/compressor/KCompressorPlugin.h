@@ -99,6 +99,7 @@ public:
   // The graph, as the attribute "CustomShape" of the plug-in's section ("level,output" pairs
   // separated by spaces); the default graph is not written.
   void StorePluginSettings(Element& section, uint32_t flags) override;
+  uint32_t TailSamples() const noexcept override;
 
 protected:
   void ProcessUpdate() override;
@@ -109,6 +110,8 @@ private:
   using Render = void (KCompressorPlugin::*)(const float* const* inputs, float* const* outputs, int32_t n) noexcept;
   static constexpr int32_t kFresh = 4;  // on the spare slot's index: written and not yet taken
 
+  // The engine's settings as the parameters give them (the custom graph aside).
+  KDynamicsSettings Settings() const noexcept;
   void Compress(const float* const* inputs, float* const* outputs, int32_t n) noexcept;
   void Audition(const float* const* inputs, float* const* outputs, int32_t n) noexcept;
   void MeterGainReduction() noexcept;

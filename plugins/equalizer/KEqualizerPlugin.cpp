@@ -100,21 +100,33 @@ KEqualizerPlugin::KEqualizerPlugin() : KAudioPlugin(kParameters, kShape) {}
 
 KAudioPlugin* KEqualizerPlugin::Create(KModule*, const KPluginRecord*) { return new KEqualizerPlugin; }
 
-void KEqualizerPlugin::ProcessUpdate() {
+void KEqualizerPlugin::Design(KSectionRunner::Row (&targets)[kBandCount], KFilterSection (&designs)[kBandCount]) const noexcept {
   const double rate = SampleRate();
   // The designer takes any frequency; above 0.499 of the rate its sections stop making sense.
   const double top = 0.499 * rate;
-  KSectionRunner::Row targets[kBandCount];
   for (int32_t band = 0; band < kBandCount; ++band) {
     auto value = [&](BandField field) { return GetParameter(Index(band, field)).Working(); };
     const int32_t type = std::clamp(static_cast<int32_t>(value(kType)), 0, KFilterSection::kTypeCount - 1);
-    KFilterSection& design = designs_[band];
+    KFilterSection& design = designs[band];
     design.Design(type, value(kGain), std::min(value(kFrequency), top), rate, value(kQ));
     const double on[5] = {design.b0, design.minusA1, design.b1, design.minusA2, design.b2};
     std::copy_n(value(kEnable) >= 0.5 ? on : KSectionRunner::kPassThrough, 5, targets[band]);
   }
+}
+
+void KEqualizerPlugin::ProcessUpdate() {
+  KSectionRunner::Row targets[kBandCount];
+  Design(targets, designs_);
   const double gain = KDecibelsToLinear(GetParameter(kOutputGain).Working());
-  bands_.Aim(targets, kBandCount, gain, static_cast<int32_t>(rate * kGlideSeconds), std::exchange(jump_, false));
+  bands_.Aim(targets, kBandCount, gain, static_cast<int32_t>(SampleRate() * kGlideSeconds), std::exchange(jump_, false));
+}
+
+// The bands' ring-out down to −140 dB, whatever the gains ahead of it.
+uint32_t KEqualizerPlugin::TailSamples() const noexcept {
+  KSectionRunner::Row targets[kBandCount];
+  KFilterSection designs[kBandCount];
+  Design(targets, designs);
+  return KSectionRunner::RingSamples(targets, kBandCount, 1e-7);
 }
 
 void KEqualizerPlugin::ResetState() {

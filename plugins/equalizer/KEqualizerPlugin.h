@@ -33,12 +33,18 @@ public:
   // Frequencies above 0.499 of the sample rate are designed at that limit.
   const KFilterSection& BandDesign(int32_t band) const noexcept { return designs_[band]; }
 
+  uint32_t TailSamples() const noexcept override;
+
 protected:
   void ProcessUpdate() override;
   void Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) override;
   void ResetState() override;
 
 private:
+  // Every band's design from the parameters, and the coefficients it runs with (a pass-through
+  // when switched off).
+  void Design(KSectionRunner::Row (&targets)[kBandCount], KFilterSection (&designs)[kBandCount]) const noexcept;
+
   KFilterSection designs_[kBandCount];
   KSectionRunner bands_;  // band b at position b, then the output gain
   bool jump_ = true;      // the next update lands at once (first block, reset)

@@ -44,6 +44,9 @@ public:
   KUtilityPlugin();
   static KAudioPlugin* Create(KModule* context, const KPluginRecord* record);
 
+  // Output is a matrix times the input of the same sample: nothing rings.
+  uint32_t TailSamples() const noexcept override { return 0; }
+
 protected:
   void ProcessUpdate() override;
   void Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) override;

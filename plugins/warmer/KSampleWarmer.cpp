@@ -85,16 +85,34 @@ void KSampleWarmer::ProcessUpdate() {
                                     GetParameter(kMix).Working() / 100.0};
   glides_.Aim(targets, static_cast<int32_t>(rate * kGlideSeconds), std::exchange(jump_, false));
 
-  const int32_t shape = static_cast<int32_t>(std::lround(GetParameter(kShape).Working()));
-  curve_ = CurveOf(shape);
+  curve_ = CurveOf(static_cast<int32_t>(std::lround(GetParameter(kShape).Working())));
+  filters_.SetSections(sections_, DesignFilters(sections_));
+}
+
+int32_t KSampleWarmer::DesignFilters(KFilterSection (&sections)[3]) const noexcept {
+  const double rate = SampleRate();
   // At very low rates the pivot stays well below the Nyquist frequency.
   const double pivot = std::min(kTiltHz, 0.25 * rate);
   const double tilt = kTiltDb * GetParameter(kTone).Working() / 100.0;
-  sections_[0].Design(KFilterSection::kLowShelf, -tilt, pivot, rate, kTiltQ);
-  sections_[1].Design(KFilterSection::kHighShelf, tilt, pivot, rate, kTiltQ);
-  sections_[2].Design(KFilterSection::kBilinearHighPass, 0.0, kDCBlockerHz, rate, 1.0);
+  sections[0].Design(KFilterSection::kLowShelf, -tilt, pivot, rate, kTiltQ);
+  sections[1].Design(KFilterSection::kHighShelf, tilt, pivot, rate, kTiltQ);
+  sections[2].Design(KFilterSection::kBilinearHighPass, 0.0, kDCBlockerHz, rate, 1.0);
   // Only the asymmetric curve makes DC; the others keep their low end untouched.
-  filters_.SetSections(sections_, shape == kTube ? 3 : 2);
+  return std::lround(GetParameter(kShape).Working()) == kTube ? 3 : 2;
+}
+
+// The dry path's delay, the oversampler's filters on the way up and down (each about as long
+// as the latency), then the tilt and the DC blocker ringing out to −140 dB.
+uint32_t KSampleWarmer::TailSamples() const noexcept {
+  KFilterSection sections[3];
+  const int32_t count = DesignFilters(sections);
+  KSectionRunner::Row rows[3];
+  for (int32_t j = 0; j < count; ++j) {
+    const double row[5] = {sections[j].b0, sections[j].minusA1, sections[j].b1, sections[j].minusA2, sections[j].b2};
+    std::copy_n(row, 5, rows[j]);
+  }
+  const uint32_t ring = KSectionRunner::RingSamples(rows, count, 1e-7);
+  return ring == UINT32_MAX ? ring : ring + 2u * static_cast<uint32_t>(KHalfBandOversampler::LatencyFor(OversamplingFor(SampleRate())));
 }
 
 void KSampleWarmer::Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) {

@@ -67,6 +67,7 @@ public:
   static KAudioPlugin* Create(KModule* context, const KPluginRecord* record);
 
   bool SetSampleRate(double sampleRate) override;
+  uint32_t TailSamples() const noexcept override;
 
 protected:
   void ProcessUpdate() override;
@@ -87,6 +88,8 @@ private:
 
   // Sets the oversampling factor and the latency for the current sample rate; clears state.
   void Configure() noexcept;
+  // The tilt's shelves and the DC blocker as the parameters ask for them; answers how many run.
+  int32_t DesignFilters(KFilterSection (&sections)[3]) const noexcept;
   void ClearDelay() noexcept;
   void ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels, int32_t frames) noexcept;
 

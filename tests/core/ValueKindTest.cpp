@@ -28,6 +28,10 @@ struct KKindRow {
 
 const KKindRow kRows[] = {
     {KNumberKind(0.0, 200.0, "%", "{0.1}"), "%", 0, {{0.5, 100.0}}, {{12.345, "12.3"}}, {{"50|50%|50 %", 50.0}}, "50 dB|% 50"},
+    // Any curve with a number's text: a logarithmic Q, a squared fader in decibels.
+    {KNumberKind(0.1, 20.0, "", "{0.2}", KValueCurve::kLogarithmic), "", 0, {{0.5, std::sqrt(2.0)}, {0.0, 0.1}}, {{0.71, "0.71"}},
+     {{"0.71| 0.71 ", 0.71}}, "Q|0.71 Hz"},
+    {KNumberKind(-60.0, 0.0, "dB", "{0.1}", KValueCurve::kSquare), "dB", 0, {{0.5, -45.0}}, {{-6.0, "-6.0"}}, {{"-6|-6 dB", -6.0}}, "-6 Hz"},
     {KDecibelKind(-60.0, 24.0), "dB", 0, {{0.5, -18.0}}, {{-6.0, "-6.0"}, {-0.04, "0.0"}},
      {{"-6|-6.0|-6 dB|-6dB|  -6 db |-6e0", -6.0}, {"+3|3", 3.0}, {"100", 24.0}}, "| |abc|-6 Hz|-6 dBs|+-6|--6|nan|inf|dB"},
     {KRatioKind(1.0, 21.0), "", 0, {{0.5, 6.0}}, {{4.0, "4.00 : 1"}, {1.5, "1.50 : 1"}},  // quadratic

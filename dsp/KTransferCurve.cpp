@@ -1,12 +1,10 @@
 #include "dsp/KTransferCurve.h"
 
-#include <algorithm>
 #include <immintrin.h>
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
-
-#include "dsp/KDecibels.h"
 
 namespace {
 
@@ -183,7 +181,9 @@ struct KTransferLaws {
 
 void KTransferCurve::Configure(const Settings& settings) noexcept {
   t_ = settings.threshold * settings.threshold;
-  full_ = KDecibelsToLinear((1.0 - 1.0 / settings.ratio) * KLinearToDecibels(t_));
+  // T^(1 − 1/ratio) through decibels, multiplied out in exactly this order: every setting's
+  // curve, and so every render, depends on its last bit.
+  full_ = std::exp(0.11512925464970228 * (1.0 - 1.0 / settings.ratio) * 8.685889638065037 * std::log(t_));
   m_ = std::abs(t_ - 1.0) < kTiny ? 1.0 : (full_ - t_) / (1.0 - t_);
   b_ = t_ * (1.0 - m_);
   makeUp_ = settings.maximize && !settings.customShape ? 1.0 / full_ : 1.0;

@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # Installs every package the build, the tests and the benchmarks need (Debian 12).
-# With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in.
+# With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in;
+# with --peers other makers' plug-ins that the VST 3 timing host sets beside ours (bench/README.md).
 set -euo pipefail
 SUDO=""
 [ "$(id -u)" -eq 0 ] || SUDO="sudo"
@@ -8,6 +9,12 @@ export DEBIAN_FRONTEND=noninteractive
 packages=(ca-certificates g++ cmake ninja-build pkg-config
   libgtest-dev libgmock-dev libbenchmark-dev libsndfile1-dev
   clang libclang-rt-14-dev)
-[ "${1:-}" = "--hosts" ] && packages+=(ardour)
+for option in "$@"; do
+  case "$option" in
+    --hosts) packages+=(ardour) ;;
+    --peers) packages+=(zam-plugins) ;;
+    *) echo "unknown option $option" >&2; exit 2 ;;
+  esac
+done
 $SUDO apt-get update -q
 $SUDO apt-get install -y -q --no-install-recommends "${packages[@]}"

@@ -29,15 +29,22 @@ constexpr double kRate = 48000.0;
 constexpr int32_t kBlock = 64;
 constexpr int32_t kNoiseFrames = 1 << 16;  // a power of two, many blocks long
 
-// Host objects live as long as the program; their reference counts are not kept.
-class KHostApplication final : public IHostApplication {
+// A host object of one interface. Host objects live as long as the program; their reference
+// counts are not kept.
+template <class Face>
+class KHostObject : public Face {
 public:
+  virtual ~KHostObject() = default;
   TResult QueryInterface(const char* iid, void** object) override {
-    *object = IHostApplication::kIID.Is(iid) || FUnknown::kIID.Is(iid) ? this : nullptr;
+    *object = Face::kIID.Is(iid) || FUnknown::kIID.Is(iid) ? this : nullptr;
     return *object ? kResultOk : kNoInterface;
   }
   uint32_t AddRef() override { return 1; }
   uint32_t Release() override { return 1; }
+};
+
+class KHostApplication final : public KHostObject<IHostApplication> {
+public:
   TResult GetName(String128 name) override {
     const char16_t text[] = u"Torvane timing host";
     std::copy(std::begin(text), std::end(text), name);
@@ -51,18 +58,12 @@ public:
 KHostApplication gHost;
 
 // A parameter's points of one block, kept as a host keeps them (without allocating).
-class KPointQueue final : public IParamValueQueue {
+class KPointQueue final : public KHostObject<IParamValueQueue> {
 public:
   static constexpr int32_t kCapacity = 64;
   ParamID id = 0;
   int32_t count = 0;
 
-  TResult QueryInterface(const char* iid, void** object) override {
-    *object = IParamValueQueue::kIID.Is(iid) || FUnknown::kIID.Is(iid) ? this : nullptr;
-    return *object ? kResultOk : kNoInterface;
-  }
-  uint32_t AddRef() override { return 1; }
-  uint32_t Release() override { return 1; }
   ParamID GetParameterId() override { return id; }
   int32_t GetPointCount() override { return count; }
   TResult GetPoint(int32_t index, int32_t& sampleOffset, ParamValue& value) override {
@@ -84,17 +85,11 @@ private:
 
 // The parameter changes of one block: none come in; what a plug-in sends out (its meters, say)
 // is taken and dropped before the next block, as a host would read and forget it.
-class KParameterChanges final : public IParameterChanges {
+class KParameterChanges final : public KHostObject<IParameterChanges> {
 public:
   static constexpr int32_t kCapacity = 256;
   void Clear() noexcept { count_ = 0; }
 
-  TResult QueryInterface(const char* iid, void** object) override {
-    *object = IParameterChanges::kIID.Is(iid) || FUnknown::kIID.Is(iid) ? this : nullptr;
-    return *object ? kResultOk : kNoInterface;
-  }
-  uint32_t AddRef() override { return 1; }
-  uint32_t Release() override { return 1; }
   int32_t GetParameterCount() override { return count_; }
   IParamValueQueue* GetParameterData(int32_t index) override { return index >= 0 && index < count_ ? &queues_[index] : nullptr; }
   IParamValueQueue* AddParameterData(const ParamID& id, int32_t& index) override {
@@ -111,14 +106,8 @@ private:
 };
 
 // An event list that stays empty: no MIDI comes in, and what goes out is dropped.
-class KEventList final : public IEventList {
+class KEventList final : public KHostObject<IEventList> {
 public:
-  TResult QueryInterface(const char* iid, void** object) override {
-    *object = IEventList::kIID.Is(iid) || FUnknown::kIID.Is(iid) ? this : nullptr;
-    return *object ? kResultOk : kNoInterface;
-  }
-  uint32_t AddRef() override { return 1; }
-  uint32_t Release() override { return 1; }
   int32_t GetEventCount() override { return 0; }
   TResult GetEvent(int32_t, Event&) override { return kInvalidArgument; }
   TResult AddEvent(Event&) override { return kResultOk; }

@@ -1,5 +1,6 @@
 #include "core/KAudioPluginBase.h"
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
 
@@ -60,8 +61,23 @@ void KAudioPluginBase::ApplyLast(ParameterRamp& ramp) noexcept {
   Apply(ramp.parameter, ramp.points[ramp.pointCount - 1].value);
 }
 
-int32_t KAudioPluginBase::NextBreak(const ParameterRamp& ramp) noexcept {
+int32_t KAudioPluginBase::NextBreak(const ParameterRamp& ramp) const noexcept {
+  if (ramp.fine) return ToGrid();
   return ramp.points[0].time > 0 ? ramp.points[0].time : ramp.points[1].time;
+}
+
+bool KAudioPluginBase::Settle(ParameterRamp* ramp) noexcept {
+  // Drops the corners already passed, so that points 0 and 1 hold the present position.
+  while (ramp->points[1].time < 1 && ramp->pointCount >= 3) {
+    for (int32_t i = 1; i < ramp->pointCount; ++i) ramp->points[i - 1] = ramp->points[i];
+    --ramp->pointCount;
+  }
+  // A fine ramp moves only on the grid: between lines its parameter keeps the value of the last.
+  if (ramp->fine && !OnGrid()) return false;
+  ApplyCurrent(*ramp);
+  if (ramp->points[1].time >= 1) return false;
+  Retire(ramp);
+  return true;
 }
 
 void KAudioPluginBase::Retire(ParameterRamp* ramp) noexcept {
@@ -100,20 +116,23 @@ void KAudioPluginBase::ResolveBlockEnd(int32_t blockLength) noexcept {
 int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept {
   int32_t limit = blockLength < subBlockCap ? blockLength : subBlockCap;
   const bool jump = (stateFlags_.load(std::memory_order_acquire) & kJump) != 0;
+  grid_ = fineCap > 0 ? fineCap : 1;
   if (!jump && !active_.IsEmpty()) {
     ResolveBlockEnd(blockLength);
     rampsAdded_ = false;
     bool anyFine = false;
-    for (ParameterRamp* ramp = active_.Head(); ramp; ramp = ramp->next) {
-      const int32_t next = NextBreak(*ramp);
-      if (next < limit) limit = next;
-      anyFine |= ramp->fine != 0;
+    for (ParameterRamp* ramp = active_.Head(); ramp;) {
+      ParameterRamp* next = ramp->next;
+      if (!Settle(ramp)) {
+        limit = std::min(limit, NextBreak(*ramp));
+        anyFine |= ramp->fine != 0;
+      }
+      ramp = next;
     }
     if (anyFine) {
       subBlockCap = fineCap;
       if (fineCap < limit) limit = fineCap;
     }
-    for (ParameterRamp* ramp = active_.Head(); ramp; ramp = ramp->next) ApplyCurrent(*ramp);
     remaining_ = limit < blockLength ? blockLength : 0;
     return limit;
   }
@@ -124,36 +143,19 @@ int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& sub
     ApplyLast(*ramp);
     Retire(ramp);
   }
+  if (jump) position_ = 0;  // the grid starts again where values landed at once
   remaining_ = 0;
   rampsAdded_ = false;
   return limit;
 }
 
 int32_t KAudioPluginBase::InterpolationProcess(int32_t processedLength, int32_t remainingLength) noexcept {
+  position_ += processedLength;
   int32_t limit = remainingLength;
   for (ParameterRamp* ramp = active_.Head(); ramp;) {
     ParameterRamp* next = ramp->next;
     for (int32_t i = 0; i < ramp->pointCount; ++i) ramp->points[i].time -= processedLength;
-    ApplyCurrent(*ramp);
-    bool retired = false;
-    bool passedCorner = false;
-    while (ramp->points[1].time < 1) {
-      if (ramp->pointCount < 3) {
-        ApplyCurrent(*ramp);
-        Retire(ramp);
-        retired = true;
-        break;
-      }
-      for (int32_t i = 1; i < ramp->pointCount; ++i) ramp->points[i - 1] = ramp->points[i];
-      --ramp->pointCount;
-      passedCorner = true;
-    }
-    if (!retired) {
-      // A corner passed inside the sub-block: the value now lies on the next segment.
-      if (passedCorner) ApplyCurrent(*ramp);
-      const int32_t breakPoint = NextBreak(*ramp);
-      if (breakPoint < limit) limit = breakPoint;
-    }
+    if (!Settle(ramp)) limit = std::min(limit, NextBreak(*ramp));
     ramp = next;
   }
   remaining_ -= processedLength;
@@ -163,8 +165,7 @@ int32_t KAudioPluginBase::InterpolationProcess(int32_t processedLength, int32_t 
 void KAudioPluginBase::InterpolationFinish() noexcept {
   for (ParameterRamp* ramp = active_.Head(); ramp;) {
     ParameterRamp* next = ramp->next;
-    ApplyCurrent(*ramp);
-    if (ramp->pointCount < 3 && ramp->points[1].time < 1) Retire(ramp);
+    Settle(ramp);
     ramp = next;
   }
   remaining_ = 0;

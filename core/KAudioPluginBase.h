@@ -30,7 +30,10 @@ public:
   // the hand-over from other threads.
   static constexpr int32_t kAudioRampCapacity = 128;
   static constexpr int32_t kPostedRampCapacity = 64;
-  // Longest sub-block normally and while a fine ramp lives.
+  // Longest sub-block normally and while a fine ramp lives. A fine ramp moves on a grid of
+  // fine-cap cells counted from the stream's start (the last jump), not from the host block:
+  // between grid lines its parameter holds, and it ends on a line; so the same automation sounds
+  // the same whatever block size the host uses.
   static constexpr int32_t kDefaultSubBlockCap = 1024;
   static constexpr int32_t kDefaultFineSubBlockCap = 32;
 
@@ -101,7 +104,11 @@ private:
   void Retire(ParameterRamp* ramp) noexcept;
   void RetireRampsOf(int32_t parameter) noexcept;
   void ApplyOverflowValues() noexcept;
-  static int32_t NextBreak(const ParameterRamp& ramp) noexcept;
+  int32_t NextBreak(const ParameterRamp& ramp) const noexcept;
+  // Brings a ramp to the present position and applies its value; answers whether it retired.
+  bool Settle(ParameterRamp* ramp) noexcept;
+  bool OnGrid() const noexcept { return position_ % grid_ == 0; }
+  int32_t ToGrid() const noexcept { return grid_ - static_cast<int32_t>(position_ % grid_); }
 
   KArray<Parameter*> parameters_;
   std::unique_ptr<ParameterRamp[]> records_;
@@ -112,6 +119,8 @@ private:
   KRampList postedReturns_;  // retired posted records, given back at the next accept
   int32_t remaining_ = 0;
   bool rampsAdded_ = false;
+  int64_t position_ = 0;  // samples processed since the last jump
+  int32_t grid_ = kDefaultFineSubBlockCap;
 
   // Guarded by rampMutex_.
   std::mutex rampMutex_;

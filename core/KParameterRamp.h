@@ -20,7 +20,7 @@ struct ParameterRamp {
   int32_t parameter = 0;
   Point points[kMaxPoints];
   int8_t pointCount = 0;
-  uint8_t fine = 0;  // cut the audio into fine sub-blocks while this ramp lives
+  uint8_t fine = 0;  // moves on the plug-in's fine grid (KAudioPluginBase), cut into fine sub-blocks
   uint8_t posted = 0;  // came through the hand-over from another thread (returns to that pool)
 };
 

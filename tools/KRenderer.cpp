@@ -4,8 +4,10 @@
 #include <chrono>
 #include <cmath>
 #include <cstdio>
+#include <iterator>
 #include <random>
 
+#include "hosts/common/KHostRamp.h"
 #include "tools/KCliArguments.h"
 
 namespace {
@@ -41,32 +43,35 @@ private:
   std::vector<float*> pointers_;
 };
 
-// Value of a lane at a sample position, in the normalised domain.
-double LaneValue(const KAutomationLane& lane, double seconds) {
-  const auto& p = lane.points;
-  if (seconds <= p.front().seconds) return p.front().normalized;
-  for (size_t k = 1; k < p.size(); ++k) {
-    if (seconds < p[k].seconds) {
-      const double w = (seconds - p[k - 1].seconds) / (p[k].seconds - p[k - 1].seconds);
-      return p[k - 1].normalized + (p[k].normalized - p[k - 1].normalized) * w;
-    }
-  }
-  return p.back().normalized;
+// A lane's break points at whole sample positions.
+struct SampleLane {
+  int32_t parameter;
+  std::vector<std::pair<int64_t, double>> corners;
+};
+
+SampleLane ToSamples(const KAutomationLane& lane, double rate) {
+  SampleLane samples{lane.parameter, {}};
+  for (const KAutomationLane::Point& point : lane.points) samples.corners.emplace_back(std::llround(point.seconds * rate), point.normalized);
+  return samples;
 }
 
-// The lane over one block as a ramp: its value at the block start, every break point inside
-// the block, and its value at the block end.
-void AddBlockRamp(KAudioPlugin& plugin, const KAutomationLane& lane, int64_t start, int32_t n, double rate) {
-  KAudioPluginBase::RampPoint points[ParameterRamp::kMaxPoints];
-  int32_t count = 0;
-  points[count++] = {0, LaneValue(lane, static_cast<double>(start) / rate)};
-  for (const KAutomationLane::Point& point : lane.points) {
-    const double at = point.seconds * rate - static_cast<double>(start);
-    if (at > 0.0 && at < n && count < ParameterRamp::kMaxPoints - 1) points[count++] = {static_cast<int32_t>(std::lround(at)), point.normalized};
-  }
-  points[count++] = {n, LaneValue(lane, static_cast<double>(start + n) / rate)};
-  // Fine sub-blocks: the rendered automation does not depend on the block size.
-  plugin.AddRamp(lane.parameter, std::span(points, static_cast<size_t>(count)), true);
+// The lane over the block [start, start + n) as a host's points: the corner at or before the
+// block start, every corner inside, and the first at or after its end, each at its own position.
+// So every segment, and every value on it, is the same whatever the block size. Before its
+// first corner and after its last the lane holds its value.
+void AddBlockRamp(KAudioPlugin& plugin, const SampleLane& lane, int64_t start, int32_t n) {
+  // Offsets far beyond a block (hours of audio) keep their sign and stay far.
+  const auto offset = [start](int64_t at) { return static_cast<int32_t>(std::clamp<int64_t>(at - start, -(1 << 30), 1 << 30)); };
+  const auto& c = lane.corners;
+  const auto after = std::upper_bound(c.begin(), c.end(), start, [](int64_t at, const auto& corner) { return at < corner.first; });
+  KHostRamp ramp(plugin, lane.parameter);
+  if (after == c.begin()) ramp.Add(0, c.front().second);
+  else ramp.Add(offset(std::prev(after)->first), std::prev(after)->second);
+  auto corner = after;
+  for (; corner != c.end() && corner->first < start + n; ++corner) ramp.Add(offset(corner->first), corner->second);
+  if (corner != c.end()) ramp.Add(offset(corner->first), corner->second);
+  else ramp.Add(n, c.back().second);
+  ramp.Commit();
 }
 
 class Progress {
@@ -110,6 +115,8 @@ KRenderSummary KRender(KAudioPlugin& plugin, KAudioSource& input, KAudioFileWrit
 
   BlockBuffers in(std::max(inputs, 1), kMaxBlock), out(outputs, kMaxBlock), sideChain(inputs - mainInputs, kMaxBlock);
   std::vector<float> scratch, interleaved(static_cast<size_t>(kMaxBlock * outputs));
+  std::vector<SampleLane> lanes;
+  for (const KAutomationLane& lane : options.automation) lanes.push_back(ToSamples(lane, rate));
   std::mt19937 randomSizes(20261121u);
   std::uniform_int_distribution<int32_t> anySize(1, kMaxBlock);
   Progress progress(options.showProgress);
@@ -126,7 +133,7 @@ KRenderSummary KRender(KAudioPlugin& plugin, KAudioSource& input, KAudioFileWrit
       sideChain.Fill(*options.sideChain, n, scratch, sideChain.Channels());
       for (int32_t c = 0; c < sideChain.Channels(); ++c) std::copy_n(sideChain.Plane(c).data(), n, in.Plane(mainInputs + c).data());
     }
-    for (const KAutomationLane& lane : options.automation) AddBlockRamp(plugin, lane, position, n, rate);
+    for (const SampleLane& lane : lanes) AddBlockRamp(plugin, lane, position, n);
     plugin.ProcessHostBlock(inputs > 0 ? in.Pointers() : nullptr, out.Pointers(), n);
 
     // Drop the first `latency` frames so that the output lines up with the input.

@@ -5,6 +5,7 @@
 
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
+#include "hosts/common/KHostRamp.h"
 #include "plugins/utility/KUtilityPlugin.h"
 
 // The cost of the processing cycle. The utility plug-in (a 2x2 matrix gain) runs through
@@ -53,6 +54,25 @@ void BM_ProcessUtility(benchmark::State& state, int32_t length, int32_t ramps) {
   for (auto _ : state) {
     AddHostAutomation(plugin, ramps, length, count++);
     plugin.ProcessHostBlock(block.inputs, block.outputs, length);
+    benchmark::ClobberMemory();
+  }
+  state.SetItemsProcessed(state.iterations() * length);
+}
+
+// One parameter automated as hosts send it (KHostRamp: a point at the block's first and last
+// sample), which moves on the fine grid: the block runs in grid cells, and every cell
+// recomputes the matrix.
+void BM_ProcessUtilityHostRamp(benchmark::State& state, int32_t length) {
+  KUtilityPlugin plugin;
+  KStereoBlock block(length);
+  int64_t start = 0;
+  for (auto _ : state) {
+    KHostRamp ramp(plugin, 0);
+    ramp.Add(0, 0.3 + 0.4 * static_cast<double>(start % 48000) / 48000.0);
+    ramp.Add(length - 1, 0.3 + 0.4 * static_cast<double>((start + length - 1) % 48000) / 48000.0);
+    ramp.Commit();
+    plugin.ProcessHostBlock(block.inputs, block.outputs, length);
+    start += length;
     benchmark::ClobberMemory();
   }
   state.SetItemsProcessed(state.iterations() * length);
@@ -119,6 +139,7 @@ const bool kRegistered = [] {
     for (int32_t ramps : kRampCounts)
       benchmark::RegisterBenchmark(("BM_ProcessUtility/" + size + "/ramps:" + std::to_string(ramps)).c_str(),
                                    BM_ProcessUtility, length, ramps);
+    benchmark::RegisterBenchmark(("BM_ProcessUtilityHostRamp/" + size).c_str(), BM_ProcessUtilityHostRamp, length);
   }
   return true;
 }();

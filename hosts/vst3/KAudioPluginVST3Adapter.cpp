@@ -2,8 +2,10 @@
 
 #include <utility>
 
+#include "hosts/common/KHostGuard.h"
 #include "hosts/vst3/KVST3ChannelContext.h"
 #include "hosts/vst3/KVST3ClassId.h"
+#include "hosts/vst3/KVST3MIDIOutput.h"
 #include "hosts/vst3/KVST3ProcessInput.h"
 #include "hosts/vst3/KVST3Util.h"
 
@@ -51,7 +53,7 @@ uint32_t KAudioPluginVST3Adapter::Release() {
 }
 
 TResult KAudioPluginVST3Adapter::Initialize(FUnknown* context) {
-  return KGuarded("KAudioPluginVST3Adapter::Initialize", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::Initialize", kResultFalse, [&] {
     // A host that initializes the processor and the controller gets one object set up once.
     if (initializations_ == 0) {
       host_.Attach(context);
@@ -64,7 +66,7 @@ TResult KAudioPluginVST3Adapter::Initialize(FUnknown* context) {
 }
 
 TResult KAudioPluginVST3Adapter::Terminate() {
-  return KGuarded("KAudioPluginVST3Adapter::Terminate", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::Terminate", kResultFalse, [&] {
     if (initializations_ == 0) return kResultFalse;
     if (--initializations_ == 0) host_.Detach();
     return kResultOk;
@@ -74,7 +76,7 @@ TResult KAudioPluginVST3Adapter::Terminate() {
 // ---- IComponent
 
 TResult KAudioPluginVST3Adapter::GetControllerClassId(char* classId) {
-  return KGuarded("KAudioPluginVST3Adapter::GetControllerClassId", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetControllerClassId", kResultFalse, [&] {
     if (!classId) return kInvalidArgument;
     // The controller is this same class: a host that insists on a controller object of its own
     // makes a second instance, which takes the component's state through SetComponentState.
@@ -86,23 +88,23 @@ TResult KAudioPluginVST3Adapter::GetControllerClassId(char* classId) {
 TResult KAudioPluginVST3Adapter::SetIoMode(int32_t) { return kNotImplemented; }
 
 int32_t KAudioPluginVST3Adapter::GetBusCount(int32_t type, int32_t direction) {
-  return KGuarded("KAudioPluginVST3Adapter::GetBusCount", 0, [&] { return buses_.Count(type, direction); });
+  return KHostGuarded("KAudioPluginVST3Adapter::GetBusCount", 0, [&] { return buses_.Count(type, direction); });
 }
 
 TResult KAudioPluginVST3Adapter::GetBusInfo(int32_t type, int32_t direction, int32_t index, BusInfo& info) {
-  return KGuarded("KAudioPluginVST3Adapter::GetBusInfo", kResultFalse,
-                  [&] { return buses_.Describe(type, direction, index, info) ? kResultTrue : kInvalidArgument; });
+  return KHostGuarded("KAudioPluginVST3Adapter::GetBusInfo", kResultFalse,
+                      [&] { return buses_.Describe(type, direction, index, info) ? kResultTrue : kInvalidArgument; });
 }
 
 TResult KAudioPluginVST3Adapter::GetRoutingInfo(RoutingInfo&, RoutingInfo&) { return kNotImplemented; }
 
 TResult KAudioPluginVST3Adapter::ActivateBus(int32_t type, int32_t direction, int32_t index, TBool state) {
-  return KGuarded("KAudioPluginVST3Adapter::ActivateBus", kResultFalse,
-                  [&] { return buses_.Activate(type, direction, index, state != 0) ? kResultTrue : kInvalidArgument; });
+  return KHostGuarded("KAudioPluginVST3Adapter::ActivateBus", kResultFalse,
+                      [&] { return buses_.Activate(type, direction, index, state != 0) ? kResultTrue : kInvalidArgument; });
 }
 
 TResult KAudioPluginVST3Adapter::SetActive(TBool state) {
-  return KGuarded("KAudioPluginVST3Adapter::SetActive", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::SetActive", kResultFalse, [&] {
     if (state) {
       plugin_->Reset();
       // A latency that changed while inactive is told before the host asks for it.
@@ -113,17 +115,17 @@ TResult KAudioPluginVST3Adapter::SetActive(TBool state) {
 }
 
 TResult KAudioPluginVST3Adapter::LoadComponentState(IBStream* state) {
-  return KGuarded("KAudioPluginVST3Adapter::SetState", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::SetState", kResultFalse, [&] {
     if (!state) return kInvalidArgument;
-    plugin_->ReadState(KReadAll(*state));  // all or nothing
+    KHostState::Load(*plugin_, KReadAll(*state));
     return kResultOk;
   });
 }
 
 TResult KAudioPluginVST3Adapter::StoreComponentState(IBStream* state) {
-  return KGuarded("KAudioPluginVST3Adapter::GetState", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetState", kResultFalse, [&] {
     if (!state) return kInvalidArgument;
-    return KWriteAll(*state, plugin_->WriteState()) ? kResultOk : kResultFalse;
+    return KWriteAll(*state, state_.Store(*plugin_)) ? kResultOk : kResultFalse;
   });
 }
 
@@ -131,13 +133,13 @@ TResult KAudioPluginVST3Adapter::StoreComponentState(IBStream* state) {
 
 TResult KAudioPluginVST3Adapter::SetBusArrangements(SpeakerArrangement* inputs, int32_t inputCount, SpeakerArrangement* outputs,
                                                     int32_t outputCount) {
-  return KGuarded("KAudioPluginVST3Adapter::SetBusArrangements", kResultFalse,
-                  [&] { return buses_.Arrange(inputs, inputCount, outputs, outputCount) ? kResultTrue : kResultFalse; });
+  return KHostGuarded("KAudioPluginVST3Adapter::SetBusArrangements", kResultFalse,
+                      [&] { return buses_.Arrange(inputs, inputCount, outputs, outputCount) ? kResultTrue : kResultFalse; });
 }
 
 TResult KAudioPluginVST3Adapter::GetBusArrangement(int32_t direction, int32_t index, SpeakerArrangement& arrangement) {
-  return KGuarded("KAudioPluginVST3Adapter::GetBusArrangement", kResultFalse,
-                  [&] { return buses_.Arrangement(direction, index, arrangement) ? kResultTrue : kInvalidArgument; });
+  return KHostGuarded("KAudioPluginVST3Adapter::GetBusArrangement", kResultFalse,
+                      [&] { return buses_.Arrangement(direction, index, arrangement) ? kResultTrue : kInvalidArgument; });
 }
 
 TResult KAudioPluginVST3Adapter::CanProcessSampleSize(int32_t symbolicSampleSize) {
@@ -145,20 +147,17 @@ TResult KAudioPluginVST3Adapter::CanProcessSampleSize(int32_t symbolicSampleSize
 }
 
 uint32_t KAudioPluginVST3Adapter::GetLatencySamples() {
-  return KGuarded("KAudioPluginVST3Adapter::GetLatencySamples", 0u,
-                  [&] { return static_cast<uint32_t>(plugin_->TotalLatency() > 0 ? plugin_->TotalLatency() : 0); });
+  return KHostGuarded("KAudioPluginVST3Adapter::GetLatencySamples", 0u,
+                      [&] { return static_cast<uint32_t>(plugin_->TotalLatency() > 0 ? plugin_->TotalLatency() : 0); });
 }
 
 TResult KAudioPluginVST3Adapter::SetupProcessing(ProcessSetup& setup) {
-  return KGuarded("KAudioPluginVST3Adapter::SetupProcessing", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::SetupProcessing", kResultFalse, [&] {
     if (setup.symbolicSampleSize != kSample32 || setup.maxSamplesPerBlock < 0) return kResultFalse;
     if (!plugin_->SetSampleRate(setup.sampleRate)) return kResultFalse;
-    // The plug-in takes blocks of any length; the block size only sizes the place where
-    // outputs the host leaves out are written.
-    if (setup.maxSamplesPerBlock > discardLength_) {
-      discard_.reset(new float[static_cast<size_t>(setup.maxSamplesPerBlock)]);
-      discardLength_ = setup.maxSamplesPerBlock;
-    }
+    // The plug-in takes blocks of any length; the block size only sizes what stands in for
+    // buses the host leaves out.
+    channels_.Prepare(setup.maxSamplesPerBlock);
     SetOffline(setup.processMode == kOffline);
     return kResultOk;
   });
@@ -167,7 +166,7 @@ TResult KAudioPluginVST3Adapter::SetupProcessing(ProcessSetup& setup) {
 TResult KAudioPluginVST3Adapter::SetProcessing(TBool) { return kResultOk; }
 
 TResult KAudioPluginVST3Adapter::Process(ProcessData& data) {
-  return KGuarded("KAudioPluginVST3Adapter::Process", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::Process", kResultFalse, [&] {
     if (data.symbolicSampleSize != kSample32) return kResultFalse;
     KAudioPlugin& plugin = *plugin_;
     const bool offline = data.processMode == kOffline;
@@ -179,14 +178,14 @@ TResult KAudioPluginVST3Adapter::Process(ProcessData& data) {
 
     const float* inputs[KAudioPlugin::kMaxChannels] = {};
     float* outputs[KAudioPlugin::kMaxChannels] = {};
-    const bool mapped = buses_.MapBuffers(data, inputs, outputs, discard_.get(), discardLength_);
+    const bool mapped = buses_.MapBuffers(data, channels_, inputs, outputs);
     processing_ = &data;
     midiOut_.BeginBlock();
     plugin.ProcessHostBlock(inputs, mapped ? outputs : nullptr, data.numSamples);
     midiOut_.EndBlock();
     processing_ = nullptr;
     if (mapped) KBusLayout::MarkSilence(data);
-    midiOut_.Flush(data.outputEvents);
+    KFlushMIDI(midiOut_, data.outputEvents);
     return kResultOk;
   });
 }
@@ -206,16 +205,16 @@ TResult KAudioPluginVST3Adapter::LoadControllerState(IBStream*) { return kResult
 TResult KAudioPluginVST3Adapter::StoreControllerState(IBStream*) { return kResultOk; }
 
 int32_t KAudioPluginVST3Adapter::GetParameterCount() {
-  return KGuarded("KAudioPluginVST3Adapter::GetParameterCount", 0, [&] { return table_.Count(); });
+  return KHostGuarded("KAudioPluginVST3Adapter::GetParameterCount", 0, [&] { return table_.Count(); });
 }
 
 TResult KAudioPluginVST3Adapter::GetParameterInfo(int32_t index, ParameterInfo& info) {
-  return KGuarded("KAudioPluginVST3Adapter::GetParameterInfo", kResultFalse,
-                  [&] { return table_.Describe(index, info) ? kResultOk : kInvalidArgument; });
+  return KHostGuarded("KAudioPluginVST3Adapter::GetParameterInfo", kResultFalse,
+                      [&] { return table_.Describe(index, info) ? kResultOk : kInvalidArgument; });
 }
 
 TResult KAudioPluginVST3Adapter::GetParamStringByValue(ParamID id, double normalized, String128 text) {
-  return KGuarded("KAudioPluginVST3Adapter::GetParamStringByValue", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetParamStringByValue", kResultFalse, [&] {
     KString value;
     if (!text || !table_.Text(id, normalized, value)) return kInvalidArgument;
     KCopyText(value, text, 128);
@@ -224,26 +223,26 @@ TResult KAudioPluginVST3Adapter::GetParamStringByValue(ParamID id, double normal
 }
 
 TResult KAudioPluginVST3Adapter::GetParamValueByString(ParamID id, TChar* text, double& normalized) {
-  return KGuarded("KAudioPluginVST3Adapter::GetParamValueByString", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetParamValueByString", kResultFalse, [&] {
     return text && table_.Value(id, KTextOf(text, 128), normalized) ? kResultOk : kResultFalse;
   });
 }
 
 double KAudioPluginVST3Adapter::NormalizedParamToPlain(ParamID id, double normalized) {
-  return KGuarded("KAudioPluginVST3Adapter::NormalizedParamToPlain", normalized, [&] { return table_.ToPlain(id, normalized); });
+  return KHostGuarded("KAudioPluginVST3Adapter::NormalizedParamToPlain", normalized, [&] { return table_.ToPlain(id, normalized); });
 }
 
 double KAudioPluginVST3Adapter::PlainParamToNormalized(ParamID id, double plain) {
-  return KGuarded("KAudioPluginVST3Adapter::PlainParamToNormalized", 0.0, [&] { return table_.ToNormalized(id, plain); });
+  return KHostGuarded("KAudioPluginVST3Adapter::PlainParamToNormalized", 0.0, [&] { return table_.ToNormalized(id, plain); });
 }
 
 double KAudioPluginVST3Adapter::GetParamNormalized(ParamID id) {
-  return KGuarded("KAudioPluginVST3Adapter::GetParamNormalized", 0.0, [&] { return table_.Normalized(id); });
+  return KHostGuarded("KAudioPluginVST3Adapter::GetParamNormalized", 0.0, [&] { return table_.Normalized(id); });
 }
 
 TResult KAudioPluginVST3Adapter::SetParamNormalized(ParamID id, double normalized) {
-  return KGuarded("KAudioPluginVST3Adapter::SetParamNormalized", kResultFalse,
-                  [&] { return table_.SetNormalized(id, normalized) ? kResultOk : kInvalidArgument; });
+  return KHostGuarded("KAudioPluginVST3Adapter::SetParamNormalized", kResultFalse,
+                      [&] { return table_.SetNormalized(id, normalized) ? kResultOk : kInvalidArgument; });
 }
 
 TResult KAudioPluginVST3Adapter::SetComponentHandler(IComponentHandler* handler) {
@@ -268,7 +267,7 @@ TResult KAudioPluginVST3Adapter::OpenAboutBox(TBool) { return kResultFalse; }
 // ---- IMidiMapping
 
 TResult KAudioPluginVST3Adapter::GetMidiControllerAssignment(int32_t busIndex, int16_t channel, int16_t controller, ParamID& id) {
-  return KGuarded("KAudioPluginVST3Adapter::GetMidiControllerAssignment", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetMidiControllerAssignment", kResultFalse, [&] {
     if (busIndex != 0 || buses_.Count(kEvent, kInput) == 0) return kResultFalse;
     return table_.ControllerId(channel, controller, id) ? kResultTrue : kResultFalse;
   });
@@ -287,7 +286,7 @@ KStringList KAudioPluginVST3Adapter::PresetNames() const {
 int32_t KAudioPluginVST3Adapter::GetUnitCount() { return 1; }
 
 TResult KAudioPluginVST3Adapter::GetUnitInfo(int32_t unitIndex, UnitInfo& info) {
-  return KGuarded("KAudioPluginVST3Adapter::GetUnitInfo", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetUnitInfo", kResultFalse, [&] {
     if (unitIndex != 0) return kInvalidArgument;
     info = UnitInfo{kRootUnit, UnitInfo::kNoParentUnitId, {}, KParameterTable::kPresetList};
     KCopyText("Root", info.name, 128);
@@ -298,7 +297,7 @@ TResult KAudioPluginVST3Adapter::GetUnitInfo(int32_t unitIndex, UnitInfo& info) 
 int32_t KAudioPluginVST3Adapter::GetProgramListCount() { return 1; }
 
 TResult KAudioPluginVST3Adapter::GetProgramListInfo(int32_t listIndex, ProgramListInfo& info) {
-  return KGuarded("KAudioPluginVST3Adapter::GetProgramListInfo", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetProgramListInfo", kResultFalse, [&] {
     if (listIndex != 0) return kInvalidArgument;
     info = ProgramListInfo{KParameterTable::kPresetList, {}, PresetNames().Count()};
     KCopyText("Presets", info.name, 128);
@@ -307,7 +306,7 @@ TResult KAudioPluginVST3Adapter::GetProgramListInfo(int32_t listIndex, ProgramLi
 }
 
 TResult KAudioPluginVST3Adapter::GetProgramName(int32_t listId, int32_t programIndex, String128 name) {
-  return KGuarded("KAudioPluginVST3Adapter::GetProgramName", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetProgramName", kResultFalse, [&] {
     const KStringList names = listId == KParameterTable::kPresetList ? PresetNames() : KStringList();
     if (!name || programIndex < 0 || programIndex >= names.Count()) return kInvalidArgument;
     KCopyText(names[programIndex], name, 128);
@@ -332,7 +331,7 @@ TResult KAudioPluginVST3Adapter::SetUnitProgramData(int32_t, int32_t, IBStream*)
 // ---- ChannelContext::IInfoListener
 
 TResult KAudioPluginVST3Adapter::SetChannelContextInfos(IAttributeList* list) {
-  return KGuarded("KAudioPluginVST3Adapter::SetChannelContextInfos", kResultFalse, [&] {
+  return KHostGuarded("KAudioPluginVST3Adapter::SetChannelContextInfos", kResultFalse, [&] {
     if (!list) return kInvalidArgument;
     KChannelContext context = plugin_->ChannelContext();
     KReadChannelContext(*list, context);

@@ -6,10 +6,12 @@
 
 #include "core/KAudioPlugin.h"
 #include "hosts/KAudioPluginInterface.h"
+#include "hosts/common/KHostChannelMap.h"
+#include "hosts/common/KHostMIDIList.h"
+#include "hosts/common/KHostState.h"
 #include "hosts/vst3/KVST3Buses.h"
 #include "hosts/vst3/KVST3Controller.h"
 #include "hosts/vst3/KVST3HostContext.h"
-#include "hosts/vst3/KVST3MIDIOutput.h"
 #include "hosts/vst3/KVST3Parameters.h"
 #include "hosts/vst3/KVST3Processing.h"
 
@@ -44,7 +46,9 @@ protected:
 // and the plug-in and keeps no logic of its own; the concerns live beside it: buses
 // (KVST3Buses), parameter identifiers and texts (KVST3Parameters), the processing call's input
 // (KVST3ProcessInput), MIDI output (KVST3MIDIOutput), the host's objects (KVST3HostContext)
-// and the channel the host puts the plug-in on (KVST3ChannelContext).
+// and the channel the host puts the plug-in on (KVST3ChannelContext). What every host format
+// shares (the method guard, transport rules, ramps from host points, echo recognition, channel
+// mapping, MIDI lists, the state text) lives in hosts/common.
 // No editor yet: CreateView answers none, and help and the about box are not offered.
 //
 // Every method the host calls is guarded: a KException gives the neutral answer, anything else
@@ -163,10 +167,10 @@ private:
   KVST3::KParameterTable table_;
   KVST3::KBusLayout buses_;
   KVST3::KHostContext host_;
-  KVST3::KMIDIOutput midiOut_;
-  // Where outputs the host left out are written, sized at setupProcessing.
-  std::unique_ptr<float[]> discard_;
-  int32_t discardLength_ = 0;
+  KHostMIDIList midiOut_;
+  // Silence and the discard buffer for buses the host leaves out, sized at setupProcessing.
+  KHostChannelMap channels_;
+  KHostState state_;
   // The block being processed, for values the plug-in sends from inside processing.
   KVST3::ProcessData* processing_ = nullptr;
 };

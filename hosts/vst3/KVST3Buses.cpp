@@ -90,28 +90,17 @@ bool KBusLayout::Arrangement(int32_t direction, int32_t index, SpeakerArrangemen
   return true;
 }
 
-bool KBusLayout::MapBuffers(const ProcessData& data, const float** inputs, float** outputs, float* discard,
-                            int32_t discardLength) const noexcept {
+bool KBusLayout::MapBuffers(const ProcessData& data, const KHostChannelMap& map, const float** inputs, float** outputs) const noexcept {
   const int32_t channels = plugin_.ChannelsPerBus();
   for (int32_t b = 0; b < inputBuses_; ++b) {
+    // An inactive bus, or one the host left out, reads as silence.
     const AudioBusBuffers* bus = b < data.numInputs && data.inputs && inputActive_[b] ? &data.inputs[b] : nullptr;
-    for (int32_t c = 0; c < channels; ++c) {
-      // A host bus with fewer channels lends its last channel to the ones it lacks.
-      const float* buffer = nullptr;
-      if (bus && bus->numChannels > 0 && bus->channelBuffers32) buffer = bus->channelBuffers32[std::min(c, bus->numChannels - 1)];
-      inputs[b * channels + c] = buffer;
-    }
+    map.MapInputs(bus ? bus->channelBuffers32 : nullptr, bus ? bus->numChannels : 0, channels, data.numSamples, inputs + b * channels);
   }
   for (int32_t b = 0; b < outputBuses_; ++b) {
     const AudioBusBuffers* bus = b < data.numOutputs && data.outputs ? &data.outputs[b] : nullptr;
-    for (int32_t c = 0; c < channels; ++c) {
-      float* buffer = bus && c < bus->numChannels && bus->channelBuffers32 ? bus->channelBuffers32[c] : nullptr;
-      if (!buffer) {
-        if (!discard || data.numSamples > discardLength) return false;
-        buffer = discard;
-      }
-      outputs[b * channels + c] = buffer;
-    }
+    if (!map.MapOutputs(bus ? bus->channelBuffers32 : nullptr, bus ? bus->numChannels : 0, channels, data.numSamples, outputs + b * channels))
+      return false;
   }
   return true;
 }

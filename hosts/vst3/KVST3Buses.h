@@ -3,6 +3,7 @@
 #include <cstdint>
 
 #include "core/KAudioPlugin.h"
+#include "hosts/common/KHostChannelMap.h"
 #include "hosts/vst3/KVST3Processing.h"
 
 namespace KVST3 {
@@ -28,10 +29,10 @@ public:
   bool Arrange(const SpeakerArrangement* inputs, int32_t inputCount, const SpeakerArrangement* outputs, int32_t outputCount) noexcept;
   bool Arrangement(int32_t direction, int32_t index, SpeakerArrangement& arrangement) const noexcept;
 
-  // The plug-in's channel pointers for one block of the host's buffers: a bus or channel the
-  // host left out reads as silence (null input) and writes into `discard` (which has room for
-  // `discardLength` samples). False when an output has nowhere to go.
-  bool MapBuffers(const ProcessData& data, const float** inputs, float** outputs, float* discard, int32_t discardLength) const noexcept;
+  // The plug-in's channel pointers for one block of the host's buffers, bus by bus through
+  // `map`: a bus the host left out or did not activate reads as silence. False when an output
+  // has nowhere to go.
+  bool MapBuffers(const ProcessData& data, const KHostChannelMap& map, const float** inputs, float** outputs) const noexcept;
   // Raises the silence flag of every output channel whose block is all zeros.
   static void MarkSilence(ProcessData& data) noexcept;
 

@@ -3,33 +3,13 @@
 #include <memory>
 
 #include "core/KAudioPlugin.h"
+#include "hosts/common/KHostEntry.h"
 #include "hosts/vst3/KAudioPluginVST3Adapter.h"
-#include "kernel/KException.h"
-#include "kernel/KFormat.h"
-#include "kernel/KModule.h"
-#include "kernel/KRegistries.h"
-#include "kernel/KUserMessage.h"
 
 KVST3::FUnknown* KVST3DispatchCreateInstance(KVST3::FUnknown*, const char* pluginName, const char* subName) {
-  try {
-    KString name = KString::Widen(pluginName ? pluginName : "");
-    name.Append(KString::Widen(subName ? subName : ""));
-    // Through the registry itself: a name it does not know is a KException, answered silently.
-    KModule* module = KModuleMap::Instance().Acquire(name);
-    KRegistries& registries = KRegistries::Instance();
-    registries.EnsureBuilt();
-    std::unique_ptr<KAudioPlugin> plugin(registries.Main().Create(name, module));
+  return KHostEntryGuarded<KVST3::FUnknown>("VST3 Plugin main", KVST3::kDispatchName, [&]() -> KVST3::FUnknown* {
+    std::unique_ptr<KAudioPlugin> plugin = KHostCreatePlugin(pluginName, subName);
     if (!plugin) return nullptr;
-    auto* adapter = new KAudioPluginVST3Adapter(std::move(plugin));
-    return static_cast<KVST3::IComponent*>(adapter);
-  } catch (const KException&) {
-    return nullptr;
-  } catch (...) {
-    try {
-      // The user message has no title of its own: the caption leads the text.
-      KShowUserMessage(KFormatText("VST3 Plugin main\n\nSYSTEM EXCEPTION! {0}", KString("KVST3DispatchCreateInstance")));
-    } catch (...) {
-    }
-    return nullptr;
-  }
+    return static_cast<KVST3::IComponent*>(new KAudioPluginVST3Adapter(std::move(plugin)));
+  });
 }

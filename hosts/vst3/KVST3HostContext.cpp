@@ -1,6 +1,7 @@
 #include "hosts/vst3/KVST3HostContext.h"
 
 #include "hosts/KAudioPluginInterface.h"
+#include "hosts/common/KHostGuard.h"
 
 namespace KVST3 {
 
@@ -44,7 +45,7 @@ TResult KHostContext::KIdleTimer::QueryInterface(const char* iid, void** object)
 }
 
 void KHostContext::KIdleTimer::OnTimer() {
-  KGuarded("KAudioPluginVST3Adapter::OnTimer", 0, [&] {
+  KHostGuarded("KAudioPluginVST3Adapter::OnTimer", 0, [&] {
     target_.Idle();
     return 0;
   });

@@ -6,33 +6,19 @@ float Unit(uint8_t value) noexcept { return static_cast<float>(value & 127) / 12
 int8_t Byte(uint8_t value) noexcept { return static_cast<int8_t>(value & 127); }
 }  // namespace
 
-void KMIDIOutput::Append(int32_t sampleOffset, const uint8_t bytes[4]) noexcept {
-  std::unique_lock<std::mutex> lock(lock_, std::defer_lock);
-  if (processThread_.load(std::memory_order_acquire) == std::this_thread::get_id()) {
-    if (!lock.try_lock()) return;
-  } else {
-    lock.lock();
-  }
-  if (count_ == kCapacity) return;
-  bytes_[count_] = {bytes[0], bytes[1], bytes[2], bytes[3]};
-  offsets_[count_++] = sampleOffset;
-}
-
-void KMIDIOutput::Flush(IEventList* events) noexcept {
-  std::unique_lock<std::mutex> lock(lock_, std::try_to_lock);
-  if (!lock.owns_lock()) return;  // the next block takes them
-  for (int32_t i = 0; events && i < count_; ++i) {
+void KFlushMIDI(KHostMIDIList& pending, IEventList* events) noexcept {
+  pending.Drain([events](const KHostMIDIList::Message& message) {
     Event event;
-    if (ToEvent(offsets_[i], bytes_[i].data(), event)) events->AddEvent(event);
-  }
-  count_ = 0;
+    if (events && KEventOf(message, event)) events->AddEvent(event);
+  });
 }
 
-bool KMIDIOutput::ToEvent(int32_t sampleOffset, const uint8_t bytes[4], Event& event) noexcept {
+bool KEventOf(const KHostMIDIList::Message& message, Event& event) noexcept {
+  const KMIDIBytes& bytes = message.bytes;
   const uint8_t status = bytes[0] & 0xF0;
   if (status < 0x80 || status == 0xF0) return false;
   event = Event{};
-  event.sampleOffset = sampleOffset;
+  event.sampleOffset = message.sampleOffset;
   const auto channel = static_cast<int16_t>(bytes[0] & 0x0F);
   if (status == 0x90 && (bytes[2] & 127) > 0) {
     event.type = Event::kNoteOnEvent;

@@ -5,6 +5,7 @@
 
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
+#include "hosts/common/KHostEcho.h"
 #include "hosts/vst3/KVST3Util.h"
 #include "kernel/KFormat.h"
 
@@ -80,7 +81,8 @@ bool KParameterTable::Describe(int32_t index, ParameterInfo& info) const {
     KCopyText(parameter.Unit(), info.units, 128);
     info.stepCount = parameter.Steps();
     info.defaultNormalizedValue = parameter.DefaultNormalized();
-    info.flags = parameter.IsAutomatable() ? ParameterInfo::kCanAutomate : ParameterInfo::kNoFlags;
+    // Every plug-in parameter: a host hides the others from its generic controls and lanes.
+    info.flags = ParameterInfo::kCanAutomate;
   } else if (index == pluginCount_) {
     info.id = kBypass;
     KCopyText("Bypass", info.title, 128);
@@ -186,8 +188,7 @@ bool KParameterTable::SetNormalized(ParamID id, double normalized) noexcept {
   const Decoded parameter = Decode(id);
   normalized = std::clamp(normalized, 0.0, 1.0);
   if (parameter.kind == Kind::kPlugin) {
-    // The host's echo of a value the plug-in is sending it changes nothing.
-    if (plugin_.AutomationSending().load(std::memory_order_acquire) <= 0) plugin_.GetParameter(parameter.index).SetNormalized(normalized);
+    KTakeHostValue(plugin_, parameter.index, normalized);
   } else if (parameter.kind == Kind::kBypass) {
     plugin_.SetBypass(normalized >= 0.5);
   } else if (std::atomic<double>* stored = Stored(parameter)) {

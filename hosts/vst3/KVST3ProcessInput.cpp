@@ -2,62 +2,59 @@
 
 #include <algorithm>
 #include <cmath>
-#include <span>
+#include <utility>
 
 #include "core/KAudioPlugin.h"
-#include "core/KParameter.h"
+#include "hosts/common/KHostRamp.h"
+#include "hosts/common/KHostTime.h"
 #include "hosts/vst3/KVST3Parameters.h"
 
 namespace KVST3 {
 namespace {
-constexpr double kEpsilon = 1e-10;
-
 uint8_t SevenBits(double normalized, int32_t lowest) noexcept {
   return static_cast<uint8_t>(std::clamp<long>(std::lround(normalized * 127.0), lowest, 127));
 }
 
-// The points of one queue as a ramp of plug-in parameter `index`, starting from its present
-// value when the first point lies after the block start. Offsets keep inside the block and
-// never run backwards; beyond the ramp's room the last point still wins.
+// The points of one queue as a ramp of plug-in parameter `index`. VST 3 offsets lie inside the
+// block; a host's stray one is taken to the nearest end.
 void RampThrough(IParamValueQueue& queue, int32_t first, int32_t points, int32_t blockLength, KAudioPlugin& plugin, int32_t index) noexcept {
-  KAudioPluginBase::RampPoint ramp[ParameterRamp::kMaxPoints];
-  int32_t count = 0;
+  KHostRamp ramp(plugin, index);
   for (int32_t p = first; p < points; ++p) {
     int32_t offset = 0;
     double value = 0.0;
-    if (queue.GetPoint(p, offset, value) != kResultOk) continue;
-    offset = std::clamp(offset, count > 0 ? ramp[count - 1].time : 0, std::max(blockLength, 0));
-    if (count == 0 && offset > 0) ramp[count++] = {0, plugin.GetParameter(index).Normalized()};
-    ramp[count < ParameterRamp::kMaxPoints ? count++ : count - 1] = {offset, value};
+    if (queue.GetPoint(p, offset, value) == kResultOk) ramp.Add(std::clamp(offset, 0, std::max(blockLength, 0)), value);
   }
-  // A lone point lands at once. Ramps run in fine sub-blocks, so that automation sounds the
-  // same whatever block size the host happens to use.
-  if (count > 0) plugin.AddRamp(index, std::span(ramp, static_cast<size_t>(count)), true);
+  ramp.Commit();
+}
+
+// Each state flag of the process context and the validity it gives.
+constexpr std::pair<uint32_t, uint32_t> kValidity[] = {
+    {ProcessContext::kTempoValid, KHostTime::kTempoValid},       {ProcessContext::kProjectTimeMusicValid, KHostTime::kSongPositionValid},
+    {ProcessContext::kBarPositionValid, KHostTime::kBarStartValid}, {ProcessContext::kTimeSigValid, KHostTime::kSignatureValid},
+    {ProcessContext::kCycleValid, KHostTime::kCycleValid},       {ProcessContext::kPlaying, KHostTime::kPlaying},
+};
+
+// What the process context reports, with the validity its state flags give.
+KHostTime TimeOf(const ProcessContext& context) noexcept {
+  KHostTime time;
+  for (const auto& [flag, valid] : kValidity)
+    if (context.state & flag) time.valid |= valid;
+  time.samplePosition = static_cast<double>(context.projectTimeSamples);
+  time.tempo = context.tempo;
+  time.songPosition = context.projectTimeMusic;
+  time.barStart = context.barPositionMusic;
+  time.numerator = context.timeSigNumerator;
+  time.denominator = context.timeSigDenominator;
+  time.cycleStart = context.cycleStartMusic;
+  time.cycleEnd = context.cycleEndMusic;
+  return time;
 }
 }  // namespace
 
 void KReadTransport(const ProcessContext* context, bool offline, KTransport& transport) noexcept {
-  transport.Reset();
-  if (!context) return;
-  const uint32_t state = context->state;
-  // An offline pass that reports position 0 has no position at all.
-  if (!offline || context->projectTimeSamples > 0) transport.samplePosition = context->projectTimeSamples;
-  if ((state & ProcessContext::kTempoValid) && context->tempo > 1.0) transport.tempo = context->tempo;
-  if ((state & ProcessContext::kProjectTimeMusicValid) && (!offline || context->projectTimeMusic > kEpsilon))
-    transport.songPosition = context->projectTimeMusic;
-  if ((state & ProcessContext::kTimeSigValid) && context->timeSigNumerator != 0) {
-    transport.numerator = context->timeSigNumerator;
-    transport.denominator = context->timeSigDenominator;
-  }
-  if (state & ProcessContext::kBarPositionValid) {
-    const double beat = std::max(1, transport.denominator / 4);
-    transport.barStart = std::round(beat * context->barPositionMusic) / beat;
-  }
-  if ((state & ProcessContext::kCycleValid) && context->cycleEndMusic - context->cycleStartMusic > kEpsilon) {
-    transport.cycleStart = context->cycleStartMusic;
-    transport.cycleEnd = context->cycleEndMusic;
-  }
-  if (offline || (state & ProcessContext::kPlaying)) transport.flags |= KTransport::kPlaying;
+  if (!context) return KAcceptTransport(nullptr, offline, transport);
+  const KHostTime time = TimeOf(*context);
+  KAcceptTransport(&time, offline, transport);
 }
 
 void KApplyParameterChanges(IParameterChanges* changes, int32_t blockLength, KAudioPlugin& plugin, KParameterTable& table) noexcept {

@@ -14,15 +14,13 @@ class KParameterTable;
 // What the host's processing call brings, handed to the plug-in. All of it runs on the audio
 // thread: nothing allocates, nothing waits.
 
-// The transport snapshot from the host's process context, as far as its validity flags allow:
-// the tempo only above 1.0, the bar start only with kBarPositionValid (snapped to the beat grid
-// of the signature), the signature only with a numerator other than 0, the cycle only when it
-// ends more than 1e-10 after it starts; playing when offline or when the host plays.
+// The transport snapshot from the host's process context, as far as its state flags allow (the
+// bar start only with kBarPositionValid), under the rules every host format shares
+// (KAcceptTransport).
 void KReadTransport(const ProcessContext* context, bool offline, KTransport& transport) noexcept;
 
 // The block's parameter changes. Up to kEveryPointLimit queues, every point counts: a plug-in
-// parameter moves through its points as a sample-accurate ramp (from its present value up to
-// the first point, then from point to point); bypass takes the last point; program and MIDI
+// parameter moves through its points as a sample-accurate ramp (KHostRamp); bypass takes the last point; program and MIDI
 // controller points become MIDI messages at their offsets. With more queues (or a block without
 // samples) only each queue's last point is read.
 inline constexpr int32_t kEveryPointLimit = 100;

@@ -4,27 +4,12 @@
 #include <string_view>
 
 #include "hosts/vst3/KVST3Base.h"
-#include "kernel/KException.h"
-#include "kernel/KGuard.h"
 #include "kernel/KString.h"
 
-// Helpers of the VST 3 adapter: the guard around every host-called method, texts in and out of
-// the interface's fixed UTF-16 fields, and whole-stream reads and writes.
+// Helpers of the VST 3 adapter: texts in and out of the interface's fixed UTF-16 fields, and
+// whole-stream reads and writes. The guard around every host-called method is the hosts' own
+// (hosts/common/KHostGuard.h).
 namespace KVST3 {
-
-// Runs the body of a method the host called so that nothing escapes into the host: a
-// KException gives the neutral answer silently; anything else is traced as
-// "SYSTEM EXCEPTION! <operation>" and gives the neutral answer too.
-template <class Result, class Body>
-Result KGuarded(const KString& operation, Result neutral, Body&& body) noexcept {
-  try {
-    return body();
-  } catch (const KException&) {
-  } catch (...) {
-    KReportSystemException(operation);
-  }
-  return neutral;
-}
 
 // `text` into a field of `capacity` units, cut to fit, always terminated.
 void KCopyText(const KString& text, TChar* out, int32_t capacity) noexcept;

@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <initializer_list>
+#include <random>
 #include <span>
 
 #include "tests/core/AllocationCounter.h"
@@ -36,6 +38,10 @@ TEST_F(RampTest, RampsCutTheBlockAtTheirBreakPointsAndEndOnTheirLastValue) {
   struct Ramp { int32_t parameter; std::vector<Point> points; bool fine = false; };
   struct Row { std::vector<Ramp> ramps; std::vector<int32_t> blocks; const char* pieces; double last; bool jump = false; };
   const Row rows[] = {
+      // Fine: pieces on a grid of 32 counted from the stream's start, moving only on its lines;
+      // one that ends between lines holds its last value until the next, in the next block.
+      {{{0, {{0, 0.0}, {kEnd, 1.0}}, true}}, {128}, "32@0 32@0.25 32@0.5 32@0.75", 1.0},
+      {{{0, {{0, 0.0}, {kEnd, 1.0}}, true}}, {100, 60}, "32@0 32@0.32 32@0.64 4@0.96 | 28@0.96 32@1", 1.0},
       {{{0, {{0, 0.2}, {64, 0.6}}}}, {64}, "64@0.2", 0.6},
       {{{0, {{0, 0.2}, {kEnd, 0.6}}}}, {64}, "64@0.2", 0.6},
       {{{0, {{10, 0.2}, {40, 0.6}}}}, {64}, "10@0.2 30@0.2 24@0.6", 0.6},  // the first value until it starts
@@ -44,7 +50,6 @@ TEST_F(RampTest, RampsCutTheBlockAtTheirBreakPointsAndEndOnTheirLastValue) {
       {{{0, {{0, 0.0}, {20, 0.5}, {20, 0.9}, {40, 0.1}}}}, {64}, "20@0 20@0.9 24@0.1", 0.1},  // equal times: a step
       {{{0, {{0, 0.0}, {48, 0.6}, {96, 0.2}}}}, {64, 64}, "48@0 16@0.6 | 32@0.466667 32@0.2", 0.2},  // past its corner
       {{{0, {{0, 0.0}, {200, 1.0}}}, {0, {{0, 0.5}, {32, 0.25}}}}, {64}, "32@0.5 32@0.25", 0.25},  // replaced
-      {{{0, {{0, 0.0}, {kEnd, 1.0}}, true}}, {128}, "32@0 32@0.25 32@0.5 32@0.75", 1.0},  // fine pieces while it lives
       {{{0, {{0, 0.0}, {kEnd, 1.0}}}}, {128}, "128@0", 1.0},
       // A jump applies every last value at once, without a split.
       {{{0, {{10, 0.1}, {20, 0.5}, {30, 0.9}}}, {1, {{0, 0.2}, {32, 0.6}}}}, {64}, "64@0.9", 0.9, true},
@@ -103,4 +108,49 @@ TEST_F(RampTest, PostedRampsStartAtTheNextBlockAndNeverLoseTheirFinalValue) {
   plugin.Run(buffers, 64);
   EXPECT_EQ(plugin.Pieces(kPostedPool - 1), "32@0 32@1");
   ExpectEveryRecordSpare();
+}
+
+// A host's lane fed block by block as its own corners (the one before the block, those inside,
+// the first after it): every sample sees the lane's value at the grid line before it, the same
+// whatever the block size, so the audio cannot depend on where blocks begin.
+TEST(FineRampGrid, EverySampleSeesTheSameValueWhateverTheBlockSize) {
+  const std::vector<Point> lane = {{1000, 0.5}, {3000, 0.1}, {3000, 0.8}, {7777, 0.3}, {9001, 0.9}};  // a step at 3000
+  constexpr int32_t kLength = 10000;
+  const auto valuesIn = [&](auto nextBlock) {
+    KRecordingPlugin plugin(1);
+    plugin.GetParameter(0).SetNormalized(lane.front().value);
+    KBlockBuffers buffers(2, 2, 4096);
+    std::vector<double> values;
+    for (int32_t start = 0, n = 0; start < kLength; start += n) {
+      n = std::min(nextBlock(), kLength - start);
+      // While the lane holds, before its first corner and after its last, the host sends nothing.
+      if (start + n > lane.front().time && start <= lane.back().time) {
+        const auto after = std::find_if(lane.begin(), lane.end(), [&](const Point& p) { return p.time > start; });
+        std::vector<Point> points = {after == lane.begin() ? Point{0, lane.front().value} : Point{after[-1].time - start, after[-1].value}};
+        auto corner = after;
+        for (; corner != lane.end() && corner->time < start + n; ++corner) points.push_back({corner->time - start, corner->value});
+        points.push_back(corner != lane.end() ? Point{corner->time - start, corner->value} : Point{n, lane.back().value});
+        EXPECT_TRUE(plugin.AddRamp(0, points, true));
+      }
+      plugin.Run(buffers, n);
+      for (int32_t call = 0; const KRecordingPlugin::Entry& e : plugin.Log())
+        if (e.kind == KRecordingPlugin::Entry::kProcess) values.insert(values.end(), static_cast<size_t>(e.length), plugin.Seen(call++, 0));
+    }
+    return values;
+  };
+  const std::vector<double> reference = valuesIn([] { return 512; });
+  ASSERT_EQ(reference.size(), static_cast<size_t>(kLength));
+  // Each sample holds the lane's value at the grid line at or before it.
+  const auto laneAt = [&](int32_t t) {
+    const auto next = std::upper_bound(lane.begin(), lane.end(), t, [](int32_t at, const Point& p) { return at < p.time; });
+    if (next == lane.begin() || next == lane.end()) return next == lane.end() ? lane.back().value : lane.front().value;
+    return next[-1].value + (next->value - next[-1].value) * (t - next[-1].time) / (next->time - next[-1].time);
+  };
+  for (int32_t s = 0; s < kLength; ++s) EXPECT_NEAR(reference[static_cast<size_t>(s)], laneAt(s / 32 * 32), 1e-12) << s;
+  EXPECT_EQ(reference[4000 / 32 * 32], reference[4000 / 32 * 32 + 31]);  // held through a cell
+  EXPECT_NE(reference[4000 / 32 * 32], reference[4000 / 32 * 32 + 32]);  // moved at its line
+  std::mt19937 random(7);
+  std::uniform_int_distribution<int32_t> anySize(1, 4096);
+  for (int32_t block : {32, 500, 4096, 0})
+    EXPECT_TRUE(valuesIn([&] { return block > 0 ? block : anySize(random); }) == reference) << "blocks of " << (block > 0 ? std::to_string(block) : "random size");
 }

@@ -2,11 +2,14 @@
 #include "core/KAudioPlugin.h"
 #include "hosts/vst3/KAudioPluginVST3Adapter.h"
 #include "hosts/vst3/KVST3ClassId.h"
+#include "hosts/vst3/KVST3Parameters.h"
 #include "kernel/KEntryPoints.h"
 #include "plugins/utility/KUtilityPlugin.h"
 #include "tests/core/AllocationCounter.h"
 #include "tests/core/RecordingPlugin.h"
 #include "tests/hosts/VST3Host.h"
+
+#include <random>
 
 using namespace KVST3Test;
 
@@ -30,7 +33,16 @@ TEST(VST3Bundles, EveryCataloguePluginHasABundleThatDescribesAndMakesIt) {
     EXPECT_EQ(std::tuple(std::string(factory.vendor), bundle.factory->CountClasses(), std::string(info.category), std::string(info.subCategories).substr(0, 3),
                          std::u16string(info.name), std::u16string(info.version)),
               std::tuple("Torvane", 1, "Audio Module Class", "Fx|", std::u16string(name.begin(), name.end()), u"" TORVANE_VERSION));
+    // Every parameter of the plug-in can be automated: a host hides the others from its controls.
     KInstance made(bundle.Create());
+    KHost host;
+    ASSERT_EQ(made.component->Initialize(static_cast<IHostApplication*>(&host)), kResultOk);
+    for (int32_t index = 0, count = made.controller->GetParameterCount(); index < count; ++index) {
+      ParameterInfo parameter{};
+      ASSERT_EQ(made.controller->GetParameterInfo(index, parameter), kResultOk);
+      EXPECT_TRUE(parameter.id >= KParameterTable::kFirstController || (parameter.flags & ParameterInfo::kCanAutomate)) << name << " " << parameter.id;
+    }
+    EXPECT_EQ(made.component->Terminate(), kResultOk);
   }
 }
 
@@ -186,4 +198,40 @@ TEST(VST3Adapter, ChannelContextEditController2AndTheUsersBypassReachTheirTarget
   EXPECT_EQ(std::pair(plugin->IsBypassed(), host.edits), std::pair(true, std::vector<std::tuple<char, ParamID, double>>{{'b', 32767, 0.0}, {'p', 32767, 1.0}, {'e', 32767, 0.0}}));
   listener->Release(), controller2->Release();
   instance.Stop();
+}
+
+// A host that sends each block its lane's value at the block's first and last sample, as hosts
+// do: the compressor's threshold falls in a straight line. The ramps move on the plug-in's own
+// grid, not the host's blocks, so any block size renders alike, here bit for bit.
+TEST(VST3Bundles, AutomationRendersAlikeWhateverTheHostsBlockSize) {
+  KBundle bundle("Compressor");
+  const auto threshold = static_cast<ParamID>(std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin("KCompressorPlugin"))->FindParameter("threshold")->Index());
+  const auto lane = [](int64_t at) { return 0.9 - 0.6 * static_cast<double>(at) / 12000.0; };
+  const auto render = [&](auto nextBlock) {
+    KHost host;
+    KInstance instance(bundle.Create());
+    instance.Start(host);
+    std::vector<float> out;
+    for (int64_t start = 0, n = 0; start < 12000; start += n) {
+      n = start == 0 ? 64 : std::min<int64_t>(nextBlock(), 12000 - start);
+      KBlock block(2, 1);
+      block.data.numSamples = static_cast<int32_t>(n);
+      for (int64_t i = 0; i < n; ++i) block.planes[0][i] = block.planes[1][i] = 0.8f * std::sin(0.05f * static_cast<float>(start + i));
+      // The first block after activation lands values at once: it is the same for every size.
+      block.Change(threshold, {{0, lane(start)}, {static_cast<int32_t>(n - 1), lane(start + n - 1)}});
+      EXPECT_EQ(instance.processor->Process(block.data), kResultOk);
+      out.insert(out.end(), block.Out(0).begin(), block.Out(0).begin() + n);
+    }
+    instance.Stop();
+    return out;
+  };
+  const std::vector<float> reference = render([] { return 512; });
+  std::mt19937 random(3);
+  std::uniform_int_distribution<int32_t> anySize(1, kBlock);
+  for (int32_t size : {32, 500, 0}) {
+    const std::vector<float> other = render([&] { return size > 0 ? size : anySize(random); });
+    float largest = 0.0f;
+    for (size_t i = 0; i < other.size(); ++i) largest = std::max(largest, std::abs(other[i] - reference[i]));
+    EXPECT_EQ(largest, 0.0f) << "blocks of " << (size > 0 ? std::to_string(size) : "random size");
+  }
 }

@@ -89,9 +89,9 @@ TEST_F(CliTest, SavedStateAndPresetsRenderLikeTheSettingsGiven) {
 }
 
 // Gain automated from -60 to 0 dB over the demo: the gain heard per tenth rises from about -57 to -3 dB.
-// Automation moves in fine sub-blocks counted from each block start, so blocks of 512 and 64 cut
-// at the same samples and render identically; random blocks cut elsewhere and only rise alike.
-TEST_F(CliTest, AutomationRampsTheGainOverTheDemo) {
+// Automation moves on a grid of the stream, not of the host's blocks: any block size, random ones
+// too, renders the same automation bit for bit (here the gain, and a compressor's threshold).
+TEST_F(CliTest, AutomationRampsTheGainOverTheDemoAndRendersAlikeInAnyBlocks) {
   const Audio dry = Render({"KUtilityPlugin"});
   std::vector<Audio> renders;
   for (const char* block : {"512", "64", "random"}) {
@@ -104,7 +104,11 @@ TEST_F(CliTest, AutomationRampsTheGainOverTheDemo) {
     EXPECT_TRUE(std::is_sorted(gains.begin(), gains.end(), std::less_equal<>()) && std::abs(gains.front() + 57.0) < 2.0 &&
                 std::abs(gains.back() + 3.0) < 1.0) << block << ": " << testing::PrintToString(gains);
   }
-  EXPECT_TRUE(Same(renders[0], renders[1]));
+  EXPECT_TRUE(Same(renders[0], renders[1]) && Same(renders[0], renders[2]));
+  const Audio compressed = Render({"KCompressorPlugin", "in.wav", "--automate", "threshold=0:0.5,1:0.1", "--block", "512"});
+  EXPECT_FALSE(Same(compressed, Render({"KCompressorPlugin", "in.wav", "--set", "threshold=0.5"})));  // the ramp moved it
+  for (const char* block : {"32", "500", "random"})
+    EXPECT_TRUE(Same(Render({"KCompressorPlugin", "in.wav", "--automate", "threshold=0:0.5,1:0.1", "--block", block}), compressed)) << block;
 }
 
 // Every bad command line: its message on stderr, a failing exit, nothing on stdout and no file

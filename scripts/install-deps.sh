@@ -1,5 +1,6 @@
 #!/usr/bin/env bash
-# Installs every package the build, the tests and the benchmarks need (Debian 12).
+# Installs every package the build, the tests and the benchmarks need (Debian 12); chromium
+# opens the exported help pages headless.
 # With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in;
 # with --peers other makers' plug-ins that the VST 3 timing host sets beside ours (bench/README.md).
 set -euo pipefail
@@ -8,7 +9,10 @@ SUDO=""
 export DEBIAN_FRONTEND=noninteractive
 packages=(ca-certificates g++ cmake ninja-build pkg-config
   libgtest-dev libgmock-dev libbenchmark-dev libsndfile1-dev
-  clang libclang-rt-14-dev)
+  clang libclang-rt-14-dev
+  libpng-dev libwebp-dev libfreetype-dev fonts-dejavu-core fonts-dejavu-extra
+  libepoxy-dev libegl-dev libegl1-mesa-dev libgl1-mesa-dri libcairo2-dev
+  chromium)
 for option in "$@"; do
   case "$option" in
     --hosts) packages+=(ardour) ;;

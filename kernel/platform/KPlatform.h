@@ -31,6 +31,10 @@ void WriteTraceLine(const char* line, size_t length) noexcept;
 // file path); false when tracing is not asked for.
 bool OpenTraceDestination() noexcept;
 
+// The folder of the file that holds the kernel's code (the shared library, or the program it is
+// linked into), ending in the separator: where files installed beside the kernel are found.
+std::string KernelFolder();
+
 // Files and folders. Paths are UTF-8; a folder path ends in the system's separator. Failures
 // throw KException with a sentence naming the path and the system's reason, e.g.
 // "Could not write the file '{0}' ({1})." (see each function).

@@ -33,6 +33,7 @@ constexpr KCommand kCommands[] = {
      "  The user's presets of the plug-in: list them (the default), save the settings given under\n"
      "  NAME, print a preset's state document, or delete it.\n",
      KRunPresets},
+    {"help", kHelpUsage, KRunHelp},
 };
 }  // namespace
 

@@ -1,3 +1,4 @@
+#include <dlfcn.h>
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <time.h>
@@ -228,4 +229,14 @@ void KPlatform::RemoveFolderTree(const std::string& path) {
   std::error_code error;
   std::filesystem::remove_all(path, error);
   if (error) FailOnPath("Could not remove the folder '{0}' ({1}).", path, error.value());
+}
+
+std::string KPlatform::KernelFolder() {
+  static const char anchor = 0;
+  Dl_info info{};
+  if (::dladdr(&anchor, &info) == 0 || !info.dli_fname) return {};
+  char* resolved = ::realpath(info.dli_fname, nullptr);
+  std::string path = resolved ? resolved : info.dli_fname;
+  std::free(resolved);
+  return path.substr(0, NameStart(path));
 }

@@ -1,0 +1,95 @@
+#include "plugins/KPluginHelpPage.h"
+
+#include "core/KParameter.h"
+#include "kernel/KException.h"
+#include "kernel/KFormat.h"
+#include "ui/KDrawerToKBitmap.h"
+#include "ui/KHelpTexts.h"
+#include "ui/KRichTextHtml.h"
+#include "ui/KRichTextLayout.h"
+#include "ui/KRichTextPlain.h"
+#include "ui/KRichTextRenderer.h"
+
+namespace {
+
+const KPluginHelp& HelpOf(const KAudioPlugin& plugin) {
+  const KPluginHelp* help = KFindPluginHelp(plugin.Identifier().ToUtf8());
+  if (!help) throw KException(KFormatText("No help is written for {0}.", plugin.Identifier()));
+  return *help;
+}
+
+// A value as the parameter displays it, with its unit, written so that it reads as text in
+// mark-up and never breaks across lines ("1.80 : 1", "20.0 Hz").
+KString Display(const KAudioPluginBase::Parameter& p, double normalized) {
+  KString text = p.TextForNormalized(normalized);
+  if (!p.Unit().IsEmpty()) text.Append(u' ').Append(p.Unit());
+  KString kept;
+  for (int32_t i = 0; i < text.Length(); ++i) kept.Append(text.CharAt(i) == u' ' ? u'\u00A0' : text.CharAt(i));
+  return KHelpTexts::Escape(kept);
+}
+
+// Mark-up rendered after the semantic tag sets.
+KRichTextDocument Render(const KString& markup) {
+  KRichTextRenderer renderer;
+  renderer.Render(KHelpTexts::SemanticTagSets());
+  renderer.Render(markup);
+  return renderer.TakeDocument();
+}
+
+}  // namespace
+
+KPluginHelpPage::KPluginHelpPage(KAudioPlugin& plugin) : plugin_(plugin), help_(HelpOf(plugin)) {}
+
+KString KPluginHelpPage::ParameterText(int32_t index) const {
+  const KAudioPluginBase::Parameter& p = plugin_.GetParameter(index);
+  int32_t number = 0;
+  const KParameterHelp* entry = help_.Find(p.Key().ToUtf8(), number);
+  if (!entry) return {};
+  return KFormatText(KString::FromUtf8(entry->text), Display(p, 0.0), Display(p, 1.0), Display(p, p.DefaultNormalized()), number);
+}
+
+KString KPluginHelpPage::ControlHelp(int32_t index) const {
+  const bool stepped = plugin_.GetParameter(index).Steps() > 0;
+  return KHelpTexts::ControlHelp(ParameterText(index), stepped ? KHelpTexts::SwitchActions() : KHelpTexts::KnobActions());
+}
+
+KString KPluginHelpPage::Markup() const {
+  KString markup("<center><l1>");
+  markup.Append(KHelpTexts::Escape(KString::FromUtf8(help_.title))).Append(KString("</l1><left><p>"));
+  markup.Append(KString::FromUtf8(help_.overview)).Append(KString("<p>"));
+  for (int32_t i = 0; i < plugin_.ParameterCount(); ++i) {
+    markup.Append(KHelpTexts::Section(plugin_.GetParameter(i).Name())).Append(KString("<p>"));
+    const KString text = ParameterText(i);
+    markup.Append(text.IsEmpty() ? KString::Static(KHelpTexts::kNoHelp) : text).Append(KString("<p>"));
+  }
+  return markup;
+}
+
+KRichTextDocument KPluginHelpPage::Document() const { return Render(Markup()); }
+
+std::string KPluginHelpPage::PlainText() const { return KRichTextPlainText(Document()); }
+
+std::string KPluginHelpPage::Html() const {
+  const KString title = KString::FromUtf8(help_.title);
+  KRichTextHtml page(title);
+  page.Heading(1, title);
+  page.Document(Render(KString::FromUtf8(help_.overview)));
+  for (int32_t i = 0; i < plugin_.ParameterCount(); ++i) {
+    page.Heading(2, plugin_.GetParameter(i).Name());
+    const KString text = ParameterText(i);
+    page.Document(Render(text.IsEmpty() ? KString::Static(KHelpTexts::kNoHelp) : text));
+  }
+  return page.Finish();
+}
+
+KBitmap KPluginHelpPage::Picture(int32_t width, double scale) const {
+  const KRichTextDocument document = Document();
+  const KRichTextLayout layout(document, width - 2 * kMargin, scale);
+  KBitmap picture(static_cast<int32_t>(width * scale), static_cast<int32_t>((layout.Height() + 2 * kMargin) * scale));
+  KDrawerToKBitmap drawer(picture, scale);
+  drawer.FillRectangle(picture.Bounds(), KRichTextLook().paper, 255, kDrawCopy);
+  layout.Draw(drawer, {kMargin, kMargin});
+  return picture;
+}
+
+std::string KPluginHelpPage::PicturePNG(int32_t width, double scale) const { return Picture(width, scale).EncodePNG(); }

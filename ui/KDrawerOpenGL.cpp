@@ -1,0 +1,400 @@
+#include "ui/KDrawerOpenGL.h"
+
+#include <epoxy/gl.h>
+
+#include <algorithm>
+#include <atomic>
+#include <cmath>
+#include <cstring>
+
+#include "kernel/KException.h"
+#include "kernel/KGuard.h"
+#include "ui/KTexturedMesh.h"
+#include "ui/platform/KOpenGLContext.h"
+
+namespace {
+#define KDRAWER_NAME(name) "KDrawerOpenGL::" #name,
+const KString kNames[] = {KDRAWER_OPERATIONS(KDRAWER_NAME)};
+#undef KDRAWER_NAME
+
+std::atomic<bool> gCapable{true};
+std::atomic<int32_t> gFramebufferOption{0};
+
+void Color(KColor c, uint32_t alpha) {
+  glColor4ub(GLubyte(KRedOf(c)), GLubyte(KGreenOf(c)), GLubyte(KBlueOf(c)), GLubyte(alpha));
+}
+
+void ThrowOnError(const char* what) {
+  if (glGetError() != GL_NO_ERROR) throw KException(KString::FromUtf8(what));
+}
+
+// Far pixel coordinates are cut to what single-precision vertices carry exactly.
+double Vertex(int64_t v) { return double(std::clamp<int64_t>(v, -(1 << 23), 1 << 23)); }
+}  // namespace
+
+KDrawerOpenGL::KDrawerOpenGL(KOpenGLContext& context, double scale) : KCoverageDrawer(kNames, scale), context_(context) {}
+
+KDrawerOpenGL::~KDrawerOpenGL() {
+  if (!context_.MakeCurrent()) return;
+  std::vector<GLuint> names;
+  for (auto& [identity, set] : textures_) {
+    if (set.whole) names.push_back(set.whole->Name());
+    if (set.alphaMask) names.push_back(set.alphaMask->Name());
+    for (auto& part : set.parts) names.push_back(part->Name());
+  }
+  for (GLuint name : {GLuint(maskTexture_), GLuint(framebufferTexture_)})
+    if (name) names.push_back(name);
+  if (!names.empty()) glDeleteTextures(GLsizei(names.size()), names.data());
+  if (framebuffer_) glDeleteFramebuffers(1, &framebuffer_);
+  context_.Release();
+}
+
+bool KDrawerOpenGL::IsCapable() noexcept { return gCapable; }
+void KDrawerOpenGL::SetFramebufferOption(int32_t value) noexcept { gFramebufferOption = value; }
+
+int32_t KDrawerOpenGL::TargetWidth() const noexcept { return context_.Width(); }
+int32_t KDrawerOpenGL::TargetHeight() const noexcept { return context_.Height(); }
+
+void KDrawerOpenGL::Attach() {
+  KGuard("KDrawerOpenGL::Attach", [&] {
+    if (!context_.MakeCurrent()) throw KException("The drawing context could not be made current.");
+    GLint largest = 0;
+    glGetIntegerv(GL_MAX_TEXTURE_SIZE, &largest);
+    KOpenGLTexture::SetMaximumSize(largest);
+    if (largest < 2049) gCapable = false;
+    const bool framebuffers = epoxy_gl_version() >= 30 || epoxy_has_gl_extension("GL_ARB_framebuffer_object");
+    if (largest >= 4097 && framebuffers && gFramebufferOption != 2 && !framebuffer_) {
+      glGetError();
+      glGenFramebuffers(1, &framebuffer_);
+      glBindFramebuffer(GL_FRAMEBUFFER, framebuffer_);
+      bool failed = glGetError() != GL_NO_ERROR;
+      if (!failed) {
+        glGenTextures(1, &framebufferTexture_);
+        glBindTexture(GL_TEXTURE_2D, framebufferTexture_);
+        glTexImage2D(GL_TEXTURE_2D, 0, GL_RGBA8, context_.Width(), context_.Height(), 0, GL_BGRA, GL_UNSIGNED_BYTE, nullptr);
+        glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_NEAREST);
+        glFramebufferTexture2D(GL_FRAMEBUFFER, GL_COLOR_ATTACHMENT0, GL_TEXTURE_2D, framebufferTexture_, 0);
+        failed = glGetError() != GL_NO_ERROR || glCheckFramebufferStatus(GL_FRAMEBUFFER) != GL_FRAMEBUFFER_COMPLETE;
+      }
+      if (failed) {
+        // Paint into the window's own framebuffer instead.
+        glBindFramebuffer(GL_FRAMEBUFFER, 0);
+        glDeleteFramebuffers(1, &framebuffer_);
+        if (framebufferTexture_) glDeleteTextures(1, &framebufferTexture_);
+        framebuffer_ = framebufferTexture_ = 0;
+      }
+    }
+    glBindFramebuffer(GL_FRAMEBUFFER, 0);
+    context_.Release();
+  });
+}
+
+void KDrawerOpenGL::BeginPaint() {
+  KGuard("KDrawerOpenGL::BeginPaint", [&] {
+    if (!context_.MakeCurrent()) throw KException("The drawing context could not be made current.");
+    if (framebuffer_) glBindFramebuffer(GL_FRAMEBUFFER, framebuffer_);
+    const int32_t w = context_.Width(), h = context_.Height();
+    glViewport(0, 0, w, h);
+    glMatrixMode(GL_PROJECTION);
+    glLoadIdentity();
+    // Pixel coordinates, y downwards: pixel (x, y) spans [x, x+1] × [y, y+1].
+    glOrtho(0, w, h, 0, -1, 1);
+    glMatrixMode(GL_MODELVIEW);
+    glLoadIdentity();
+    glDisable(GL_DITHER);
+    glDisable(GL_DEPTH_TEST);
+    glShadeModel(GL_SMOOTH);
+    glTexEnvi(GL_TEXTURE_ENV, GL_TEXTURE_ENV_MODE, GL_MODULATE);
+    glBlendFuncSeparate(GL_SRC_ALPHA, GL_ONE_MINUS_SRC_ALPHA, GL_ONE, GL_ONE_MINUS_SRC_ALPHA);
+    painting_ = true;
+  });
+}
+
+void KDrawerOpenGL::EndPaint() {
+  KGuard("KDrawerOpenGL::EndPaint", [&] {
+    if (!painting_) return;
+    painting_ = false;
+    glFinish();
+    glBindFramebuffer(GL_FRAMEBUFFER, 0);
+    context_.Release();
+  });
+}
+
+KBitmap KDrawerOpenGL::GetScreenShot() {
+  KBitmap picture;
+  KGuard("KDrawerOpenGL::GetScreenShot", [&] {
+    const bool wasPainting = painting_;
+    if (!wasPainting) BeginPaint();
+    if (!painting_) return;
+    KBitmap shot(context_.Width(), context_.Height());
+    glPixelStorei(GL_PACK_ALIGNMENT, 4);
+    glReadPixels(0, 0, shot.Width(), shot.Height(), GL_BGRA, GL_UNSIGNED_BYTE, shot.Pixels());
+    if (!wasPainting) EndPaint();
+    // OpenGL's rows run bottom to top.
+    for (int32_t y = 0; y < shot.Height() / 2; ++y) std::swap_ranges(shot.Row(y), shot.Row(y) + shot.Width(), shot.Row(shot.Height() - 1 - y));
+    picture = std::move(shot);
+  });
+  return picture;
+}
+
+uint32_t KDrawerOpenGL::Upload(const uint32_t* pixels, int32_t width, int32_t height, bool alphaOnly) {
+  glGetError();
+  GLuint name = 0;
+  glGenTextures(1, &name);
+  glBindTexture(GL_TEXTURE_2D, name);
+  glPixelStorei(GL_UNPACK_ALIGNMENT, 4);
+  glPixelStorei(GL_UNPACK_ROW_LENGTH, 0);
+  glTexImage2D(GL_TEXTURE_2D, 0, alphaOnly ? GL_ALPHA8 : GL_RGBA8, width, height, 0, GL_BGRA, GL_UNSIGNED_BYTE, pixels);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_LINEAR);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, GL_LINEAR);
+  if (glGetError() != GL_NO_ERROR) {
+    glDeleteTextures(1, &name);
+    throw KException("The graphics card could not take the image.");
+  }
+  ++textureCount_;
+  return name;
+}
+
+void KDrawerOpenGL::CheckPainting() const {
+  if (!painting_) throw KException("The drawer paints only between BeginPaint and EndPaint.");
+}
+
+void KDrawerOpenGL::SetBlending(uint32_t mode) {
+  if (mode & kDrawCopy)
+    glDisable(GL_BLEND);
+  else
+    glEnable(GL_BLEND);
+}
+
+void KDrawerOpenGL::PaintTexture(const KOpenGLTexture& texture, const PixelBox& box, const KRect& source, uint8_t opacity,
+                                 uint32_t mode) {
+  const double tw = texture.Width(), th = texture.Height();
+  SetBlending(mode);
+  glEnable(GL_TEXTURE_2D);
+  glBindTexture(GL_TEXTURE_2D, texture.Name());
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_CLAMP_TO_EDGE);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_CLAMP_TO_EDGE);
+  glColor4ub(255, 255, 255, opacity);
+  const double s0 = source.left / tw, s1 = (source.right + 1.0) / tw, t0 = source.top / th, t1 = (source.bottom + 1.0) / th;
+  glBegin(GL_QUADS);
+  glTexCoord2d(s0, t0), glVertex2d(Vertex(box.left), Vertex(box.top));
+  glTexCoord2d(s1, t0), glVertex2d(Vertex(box.right), Vertex(box.top));
+  glTexCoord2d(s1, t1), glVertex2d(Vertex(box.right), Vertex(box.bottom));
+  glTexCoord2d(s0, t1), glVertex2d(Vertex(box.left), Vertex(box.bottom));
+  glEnd();
+  glDisable(GL_TEXTURE_2D);
+  ThrowOnError("The graphics card could not paint the image.");
+}
+
+void KDrawerOpenGL::PaintGLTexture(const KRect& dest, const KOpenGLTexture& texture, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationPaintGLTexture), [&] {
+    CheckPainting();
+    const PixelBox box = ToPixels(dest);
+    if (!box.IsEmpty()) PaintTexture(texture, box, {0, 0, texture.Width() - 1, texture.Height() - 1}, opacity, mode);
+  });
+}
+
+void KDrawerOpenGL::PatBlt(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationPatBlt), [&] {
+    CheckPainting();
+    const PixelBox box = ToPixels(dest);
+    if (box.IsEmpty() || !IsInside(source, bitmap)) return;
+    KRect part = source;
+    const KOpenGLTexture* texture = KOpenGLTexture::Get(bitmap, part, *this, true);
+    if (!texture) return;
+    // Texture coordinates count whole patterns from the destination's corner; a whole-bitmap
+    // texture of a rectangle that is not the whole bitmap cannot repeat, so it is never used.
+    const double repeatsX = double(dest.right - dest.left + 1) / texture->Width();
+    const double repeatsY = double(dest.bottom - dest.top + 1) / texture->Height();
+    SetBlending(mode);
+    glEnable(GL_TEXTURE_2D);
+    glBindTexture(GL_TEXTURE_2D, texture->Name());
+    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_REPEAT);
+    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_REPEAT);
+    glColor4ub(255, 255, 255, opacity);
+    glBegin(GL_QUADS);
+    glTexCoord2d(0, 0), glVertex2d(Vertex(box.left), Vertex(box.top));
+    glTexCoord2d(repeatsX, 0), glVertex2d(Vertex(box.right), Vertex(box.top));
+    glTexCoord2d(repeatsX, repeatsY), glVertex2d(Vertex(box.right), Vertex(box.bottom));
+    glTexCoord2d(0, repeatsY), glVertex2d(Vertex(box.left), Vertex(box.bottom));
+    glEnd();
+    glDisable(GL_TEXTURE_2D);
+    ThrowOnError("The graphics card could not paint the pattern.");
+  });
+}
+
+void KDrawerOpenGL::BitBlt(const KRect& dest, const KBitmap& bitmap, KPoint source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationBitBlt), [&] {
+    CheckPainting();
+    KRect d = dest, s;
+    if (!ClipBitBlt(d, bitmap, source, s)) return;
+    const PixelBox box = ToPixels(d);
+    if (box.IsEmpty()) return;
+    if (const KOpenGLTexture* texture = KOpenGLTexture::Get(bitmap, s, *this, false)) PaintTexture(*texture, box, s, opacity, mode);
+  });
+}
+
+void KDrawerOpenGL::AlphaMask(const KRect& dest, const KBitmap& mask, KPoint source, KColor color, uint8_t opacity,
+                              uint32_t mode) {
+  KGuard(Name(kOperationAlphaMask), [&] {
+    CheckPainting();
+    KRect d = dest, s;
+    if (!ClipBitBlt(d, mask, source, s)) return;
+    const PixelBox box = ToPixels(d);
+    if (box.IsEmpty()) return;
+    const KOpenGLTexture* texture = KOpenGLTexture::GetAlphaMask(mask, *this);
+    if (!texture) return;
+    const double tw = texture->Width(), th = texture->Height();
+    const double s0 = s.left / tw, s1 = (s.right + 1.0) / tw, t0 = s.top / th, t1 = (s.bottom + 1.0) / th;
+    SetBlending(mode);
+    glEnable(GL_TEXTURE_2D);
+    glBindTexture(GL_TEXTURE_2D, texture->Name());
+    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_CLAMP_TO_EDGE);
+    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_CLAMP_TO_EDGE);
+    Color(color, KMulByte(KAlphaOf(color), opacity));
+    glBegin(GL_QUADS);
+    glTexCoord2d(s0, t0), glVertex2d(Vertex(box.left), Vertex(box.top));
+    glTexCoord2d(s1, t0), glVertex2d(Vertex(box.right), Vertex(box.top));
+    glTexCoord2d(s1, t1), glVertex2d(Vertex(box.right), Vertex(box.bottom));
+    glTexCoord2d(s0, t1), glVertex2d(Vertex(box.left), Vertex(box.bottom));
+    glEnd();
+    glDisable(GL_TEXTURE_2D);
+    ThrowOnError("The graphics card could not paint the mask.");
+  });
+}
+
+void KDrawerOpenGL::StretchBlt(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationStretchBlt), [&] {
+    CheckPainting();
+    const PixelBox box = ToPixels(dest);
+    if (box.IsEmpty() || !IsInside(source, bitmap)) return;
+    KRect s = source;
+    if (const KOpenGLTexture* texture = KOpenGLTexture::Get(bitmap, s, *this, false)) PaintTexture(*texture, box, s, opacity, mode);
+  });
+}
+
+void KDrawerOpenGL::StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationStretchBltH), [&] {
+    const KRect d{dest.left, dest.top, dest.right, int32_t(std::min<int64_t>(INT32_MAX, dest.top + source.Height() - 1))};
+    StretchBlt(d, bitmap, source, opacity, mode);
+  });
+}
+
+void KDrawerOpenGL::StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationStretchBltV), [&] {
+    const KRect d{dest.left, dest.top, int32_t(std::min<int64_t>(INT32_MAX, dest.left + source.Width() - 1)), dest.bottom};
+    StretchBlt(d, bitmap, source, opacity, mode);
+  });
+}
+
+void KDrawerOpenGL::PaintMesh(const KTexturedMesh& mesh, const KBitmap& bitmap, const KRect& source, uint8_t opacity,
+                              uint32_t mode) {
+  if (!mesh.IsFinite()) return;
+  KRect s = source;
+  const KOpenGLTexture* texture = KOpenGLTexture::Get(bitmap, s, *this, false);
+  if (!texture) return;
+  // Mesh texels are the bitmap's; the texture may hold only the source rectangle.
+  const double du = s.left - source.left, dv = s.top - source.top;
+  const double tw = texture->Width(), th = texture->Height();
+  SetBlending(mode);
+  glEnable(GL_TEXTURE_2D);
+  glBindTexture(GL_TEXTURE_2D, texture->Name());
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_CLAMP_TO_EDGE);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_CLAMP_TO_EDGE);
+  glColor4ub(255, 255, 255, opacity);
+  glBegin(GL_TRIANGLES);
+  for (const KTexturedVertex& v : mesh.vertices) {
+    glTexCoord2d((v.u + du) / tw, (v.v + dv) / th);
+    glVertex2d(v.x, v.y);
+  }
+  glEnd();
+  glDisable(GL_TEXTURE_2D);
+  ThrowOnError("The graphics card could not paint the image.");
+}
+
+void KDrawerOpenGL::RotatedBlt(KPointF centre, double angle, const KBitmap& bitmap, const KRect& source, uint8_t opacity,
+                               uint32_t mode) {
+  KGuard(Name(kOperationRotatedBlt), [&] {
+    CheckPainting();
+    if (!IsInside(source, bitmap)) return;
+    PaintMesh(KTexturedMesh::Rotated(ToPixels(centre), angle, source, Scale()), bitmap, source, opacity, mode);
+  });
+}
+
+void KDrawerOpenGL::StretchBltArc(KPointF centre, double innerRadius, double outerRadius, double startAngle, double endAngle,
+                                  const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationStretchBltArc), [&] {
+    CheckPainting();
+    if (!IsInside(source, bitmap)) return;
+    const double s = Scale();
+    PaintMesh(KTexturedMesh::Arc(ToPixels(centre), innerRadius * s, outerRadius * s, startAngle, endAngle, source), bitmap,
+              source, opacity, mode);
+  });
+}
+
+void KDrawerOpenGL::FillRectangle(const KRect& rect, KColor color, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationFillRectangle), [&] {
+    CheckPainting();
+    const PixelBox box = ToPixels(rect);
+    if (box.IsEmpty()) return;
+    SetBlending(mode);
+    Color(color, KMulByte(KAlphaOf(color), opacity));
+    glRectd(Vertex(box.left), Vertex(box.top), Vertex(box.right), Vertex(box.bottom));
+    ThrowOnError("The graphics card could not fill the rectangle.");
+  });
+}
+
+void KDrawerOpenGL::FillRectangleGradient(const KRect& rect, KColor from, KColor to, KGradient direction, uint8_t opacity,
+                                          uint32_t mode) {
+  KGuard(Name(kOperationFillRectangleGradient), [&] {
+    CheckPainting();
+    const PixelBox box = ToPixels(rect);
+    if (box.IsEmpty()) return;
+    const bool vertical = direction == KGradient::Vertical;
+    const uint32_t a0 = KMulByte(KAlphaOf(from), opacity), a1 = KMulByte(KAlphaOf(to), opacity);
+    SetBlending(mode);
+    glBegin(GL_QUADS);
+    Color(from, a0), glVertex2d(Vertex(box.left), Vertex(box.top));
+    vertical ? Color(from, a0) : Color(to, a1);
+    glVertex2d(Vertex(box.right), Vertex(box.top));
+    Color(to, a1), glVertex2d(Vertex(box.right), Vertex(box.bottom));
+    vertical ? Color(to, a1) : Color(from, a0);
+    glVertex2d(Vertex(box.left), Vertex(box.bottom));
+    glEnd();
+    ThrowOnError("The graphics card could not fill the rectangle.");
+  });
+}
+
+void KDrawerOpenGL::SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationSetPixel), [&] { FillRectangle({at.x, at.y, at.x, at.y}, color, opacity, mode); });
+}
+
+void KDrawerOpenGL::PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t) {
+  CheckPainting();
+  // One scratch texture, grown to the largest mask so far.
+  if (!maskTexture_ || mask.width > maskWidth_ || mask.height > maskHeight_) {
+    maskWidth_ = std::max(maskWidth_, mask.width);
+    maskHeight_ = std::max(maskHeight_, mask.height);
+    if (!maskTexture_) glGenTextures(1, &maskTexture_);
+    glBindTexture(GL_TEXTURE_2D, maskTexture_);
+    glTexImage2D(GL_TEXTURE_2D, 0, GL_ALPHA8, maskWidth_, maskHeight_, 0, GL_ALPHA, GL_UNSIGNED_BYTE, nullptr);
+    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_NEAREST);
+    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, GL_NEAREST);
+  }
+  glBindTexture(GL_TEXTURE_2D, maskTexture_);
+  glPixelStorei(GL_UNPACK_ALIGNMENT, 1);
+  glTexSubImage2D(GL_TEXTURE_2D, 0, 0, 0, mask.width, mask.height, GL_ALPHA, GL_UNSIGNED_BYTE, mask.values.data());
+  glPixelStorei(GL_UNPACK_ALIGNMENT, 4);
+  const double s1 = double(mask.width) / maskWidth_, t1 = double(mask.height) / maskHeight_;
+  glEnable(GL_BLEND);
+  glEnable(GL_TEXTURE_2D);
+  Color(color, KMulByte(KAlphaOf(color), opacity));
+  glBegin(GL_QUADS);
+  glTexCoord2d(0, 0), glVertex2d(mask.x, mask.y);
+  glTexCoord2d(s1, 0), glVertex2d(mask.x + mask.width, mask.y);
+  glTexCoord2d(s1, t1), glVertex2d(mask.x + mask.width, mask.y + mask.height);
+  glTexCoord2d(0, t1), glVertex2d(mask.x, mask.y + mask.height);
+  glEnd();
+  glDisable(GL_TEXTURE_2D);
+  ThrowOnError("The graphics card could not paint the shape.");
+}

@@ -41,7 +41,7 @@ public:
     double complement = 1.0;
   };
 
-  KDynamicsProcessor() noexcept { Update(KDynamicsSettings{}); }
+  KDynamicsProcessor() noexcept;
 
   // Sizes the buffers for blocks of up to maxChannels × maxFrames (longer blocks run in pieces,
   // extra channels are left alone) and clears the detector. Not for the audio thread.
@@ -96,6 +96,12 @@ public:
 
 private:
   using Detector = void (*)(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
+  // The passes around the envelope, chosen once for the processor: four samples at a time with
+  // AVX, two without.
+  using SquareSumPass = void (*)(const float* const* x, int32_t channels, int32_t from, int32_t frames, double gIn,
+                                 double share, double* sums) noexcept;
+  using StoreGainsPass = float (*)(const double* gains, float* stored, int32_t frames, float lowest) noexcept;
+  using ApplyGainsPass = void (*)(const double* gains, const float* in, float* out, int32_t frames) noexcept;
 
   static void DetectLinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
   static void DetectUnlinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
@@ -111,6 +117,9 @@ private:
   Pole meanSquare_, shortAverage_, longAverage_;
   KTransferCurve curve_;
   Detector detector_ = DetectLinked;
+  SquareSumPass squareSum_;
+  StoreGainsPass storeGains_;
+  ApplyGainsPass applyGains_;
   bool idle_ = false;
   bool linked_ = true;
   bool sideChain_ = false;

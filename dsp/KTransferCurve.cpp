@@ -162,6 +162,7 @@ struct KTransferLaws {
   [[gnu::target("avx")]] static void WideBlock(K& k, const double* levels, double* gains, int32_t n) noexcept {
     int32_t i = 0;
     for (; i + 4 <= n; i += 4) _mm256_storeu_pd(gains + i, Quad(k, _mm256_loadu_pd(levels + i)));
+    _mm256_zeroupper();  // code without AVX after this must not pay for the upper halves
     Block<Pair, One>(k, levels + i, gains + i, n - i);
   }
   // The block law of a variant for this processor.

@@ -20,5 +20,7 @@ for option in "$@"; do
     *) echo "unknown option $option" >&2; exit 2 ;;
   esac
 done
-$SUDO apt-get update -q
-$SUDO apt-get install -y -q --no-install-recommends "${packages[@]}"
+# Wait for another package manager run (an unattended upgrade, say) instead of failing at once.
+apt_options=(-o DPkg::Lock::Timeout=900)
+$SUDO apt-get "${apt_options[@]}" update -q
+$SUDO apt-get "${apt_options[@]}" install -y -q --no-install-recommends "${packages[@]}"

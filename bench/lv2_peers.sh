@@ -1,19 +1,16 @@
 #!/usr/bin/env bash
 # Whole-process renders of one minute of stereo through three LV2 compressors with lv2file at
-# blocks of 64 frames: ours and two Debian-packaged peers (ZamCompX2 from zam-plugins, the LSP
-# stereo compressor from lsp-plugins-lv2), each the best of three runs, with wall, user and
-# system times and their ratios to ours. The peers are installed here, for this comparison only.
+# blocks of 64 frames, and with lv2apply: ours and two Debian-packaged peers (ZamCompX2 from
+# zam-plugins, the LSP stereo compressor from lsp-plugins-lv2), each the best of three runs, with wall, user and
+# system times and their ratios to ours. The peers are installed here (install-deps.sh --peers),
+# for comparisons only.
 #
 #   bash bench/lv2_peers.sh [build dir]     (default build/tests; the LV2 bundles must be built)
 set -euo pipefail
 cd "$(dirname "$0")/.."
 build=${1:-build/tests}
 [ -d "$build/lv2/Compressor.lv2" ] || { echo "no LV2 bundles in $build/lv2: build first" >&2; exit 1; }
-SUDO=""
-[ "$(id -u)" -eq 0 ] || SUDO="sudo"
-export DEBIAN_FRONTEND=noninteractive
-dpkg -s zam-plugins lsp-plugins-lv2 >/dev/null 2>&1 ||
-  $SUDO apt-get -o DPkg::Lock::Timeout=900 install -y -q --no-install-recommends zam-plugins lsp-plugins-lv2 lv2file >/dev/null
+dpkg -s zam-plugins lsp-plugins-lv2 >/dev/null 2>&1 || bash scripts/install-deps.sh --peers >/dev/null
 
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT

@@ -78,15 +78,16 @@ private:
 }  // namespace
 
 int main(int argc, char** argv) {
+  // Flags given later win over these defaults.
+  std::string repetitions = "--benchmark_repetitions=3", aggregates = "--benchmark_report_aggregates_only=true";
   std::vector<std::string> paths;
-  std::vector<char*> flags = {argv[0]};
+  std::vector<char*> flags;
+  flags.push_back(argv[0]), flags.push_back(repetitions.data()), flags.push_back(aggregates.data());
   for (int i = 1; i < argc; ++i) (std::string(argv[i]).starts_with("--") ? flags.push_back(argv[i]) : paths.push_back(argv[i]));
   if (paths.size() < 2) {
     std::fprintf(stderr, "usage: %s OURS.so PEER.so [PEER.so ...] [benchmark flags]\n", argv[0]);
     return 2;
   }
-  std::string repetitions = "--benchmark_repetitions=3", aggregates = "--benchmark_report_aggregates_only=true";
-  flags.insert(flags.begin() + 1, {repetitions.data(), aggregates.data()});
   int count = static_cast<int>(flags.size());
   benchmark::Initialize(&count, flags.data());
 

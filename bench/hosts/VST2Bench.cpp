@@ -28,7 +28,10 @@ class KPlugin {
 public:
   explicit KPlugin(const std::string& path) : name_(path.substr(path.rfind('/') + 1)) {
     library_ = KPlatform::OpenLibrary(path);
-    auto main = reinterpret_cast<MainFunction>(library_ ? KPlatform::FindSymbol(library_, "VSTPluginMain") : nullptr);
+    // Older modules export only "main".
+    void* entry = library_ ? KPlatform::FindSymbol(library_, "VSTPluginMain") : nullptr;
+    if (library_ && !entry) entry = KPlatform::FindSymbol(library_, "main");
+    auto main = reinterpret_cast<MainFunction>(entry);
     effect_ = main ? main(&Callback) : nullptr;
     if (!effect_ || effect_->magic != kEffectMagic) {
       std::fprintf(stderr, "%s: not a VST 2 plug-in (%s)\n", path.c_str(), KPlatform::LibraryError().c_str());

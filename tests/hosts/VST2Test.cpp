@@ -89,7 +89,7 @@ TEST(VST2Adapter, ProcessKeepsMIDIForARealBlockDropsSysexAndSendsMIDIWithoutAllo
   VstMidiSysexEvent sysex{kVstSysExType, 48 - 8, 7, 0, 4, 0, const_cast<char*>("\xF0\x01\x02\xF7"), 0};
   struct { int32_t numEvents; intptr_t reserved; VstEvent* events[3]; } events{3, 0, {reinterpret_cast<VstEvent*>(&first), reinterpret_cast<VstEvent*>(&sysex), reinterpret_cast<VstEvent*>(&second)}};
   EXPECT_EQ(instance.Call(effProcessEvents, 0, 0, &events), 1);
-  KBuffers in(1, 64), out(1, 64);
+  KBuffers in(2, 64), out(2, 64);  // as many buffers as the record shows
   instance.Process(in.pointers, out.pointers, 0);
   instance.effect->processReplacing(instance.effect, in.pointers.data(), nullptr, 64);
   EXPECT_TRUE(Notes(*plugin).empty());
@@ -112,7 +112,7 @@ TEST(VST2Adapter, TimeInformationFollowsTheTransportRules) {
   KHost host;
   KInstance instance(Adapt(plugin));
   instance.Start();
-  KBuffers in(1, 64), out(1, 64);
+  KBuffers in(2, 64), out(2, 64);
   auto fields = [](const KTransport& t) { return std::tuple(t.tempo, t.songPosition, t.barStart, t.samplePosition, t.numerator, t.denominator, t.cycleStart, t.cycleEnd, t.flags); };
   constexpr int32_t kAll = kVstTempoValid | kVstPpqPosValid | kVstBarsValid | kVstTimeSigValid | kVstCyclePosValid;
   struct Row { const char* name; int32_t level, flags; VstTimeInfo time; KTransport expected; };

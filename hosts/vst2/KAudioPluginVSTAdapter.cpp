@@ -10,6 +10,7 @@
 #include "hosts/common/KHostGuard.h"
 #include "hosts/vst2/KVST2Text.h"
 #include "hosts/vst2/KVST2Transport.h"
+#include "kernel/KCatalogue.h"
 #include "kernel/KFormat.h"
 
 using namespace KVST2;
@@ -212,25 +213,27 @@ int32_t KAudioPluginVSTAdapter::processEvents(VstEvents* events) {
   });
 }
 
-KString KAudioPluginVSTAdapter::Name() const {
-  KString name = plugin_->Identifier();
-  if (name.Length() > 0 && name.CharAt(0) == u'K') name = name.SubString(1, name.Length() - 1);
-  const KString suffix("Plugin");
-  if (name.Length() > suffix.Length() && name.SubString(name.Length() - suffix.Length(), suffix.Length()) == suffix)
-    name = name.SubString(0, name.Length() - suffix.Length());
-  return name;
+// The plug-in's description in the catalogue; KException for an instance the catalogue does not
+// describe (a name the registry resolved by a prefix).
+const KPluginDescription& KAudioPluginVSTAdapter::Description() const {
+  const KPluginDescription* found = KFindDescription(KProductCatalogue(), plugin_->Identifier().ToUtf8());
+  if (!found || !found->name || !found->vendor) throw KException("No description of the plug-in.", "KAudioPluginVSTAdapter::Description");
+  return *found;
 }
 
 bool KAudioPluginVSTAdapter::getEffectName(char* name) {
-  return KHostGuarded("KAudioPluginVSTAdapter::getEffectName", false, [&] { return KCopyText(Name(), name, kVstMaxEffectNameLen), true; });
+  return KHostGuarded("KAudioPluginVSTAdapter::getEffectName", false,
+                      [&] { return KCopyText(KString::FromUtf8(Description().name), name, kVstMaxEffectNameLen), true; });
 }
 
 bool KAudioPluginVSTAdapter::getVendorString(char* text) {
-  return KHostGuarded("KAudioPluginVSTAdapter::getVendorString", false, [&] { return KCopyText(KString::Static(kVendor), text, kVstMaxVendorStrLen), true; });
+  return KHostGuarded("KAudioPluginVSTAdapter::getVendorString", false,
+                      [&] { return KCopyText(KString::FromUtf8(Description().vendor), text, kVstMaxVendorStrLen), true; });
 }
 
 bool KAudioPluginVSTAdapter::getProductString(char* text) {
-  return KHostGuarded("KAudioPluginVSTAdapter::getProductString", false, [&] { return KCopyText(Name(), text, kVstMaxProductStrLen), true; });
+  return KHostGuarded("KAudioPluginVSTAdapter::getProductString", false,
+                      [&] { return KCopyText(KString::FromUtf8(Description().name), text, kVstMaxProductStrLen), true; });
 }
 
 // A host bypass is refused on purpose: the plug-in keeps its own.

@@ -12,6 +12,8 @@
 #include "hosts/vst2/KVST2Events.h"
 #include "kernel/KString.h"
 
+struct KPluginDescription;
+
 // A plug-in of the kernel as one VST 2 instance. It translates between the host and the
 // plug-in and keeps no logic of its own: the binary interface and its dispatcher are KVST2's
 // (KVST2Interface, KVST2Effect), time information and events have their own files, and what
@@ -71,8 +73,7 @@ public:
 
 private:
   bool PinProperties(int32_t index, bool input, KVST2::VstPinProperties* properties);
-  // The plug-in's name as hosts list it: its key without the leading "K" and a trailing "Plugin".
-  KString Name() const;
+  const KPluginDescription& Description() const;
 
   std::unique_ptr<KAudioPlugin> plugin_;
   int32_t hostVersion_ = 1;

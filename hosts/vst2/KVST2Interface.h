@@ -6,6 +6,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <string_view>
 
 namespace KVST2 {
 
@@ -25,9 +26,10 @@ inline constexpr int32_t kEffectMagic = 0x56737450;
 inline constexpr int32_t kVstVersion = 2400;
 
 // Four characters as a unique id, the first in the highest byte.
-constexpr int32_t FourCharacters(const char (&text)[5]) {
-  return static_cast<int32_t>((static_cast<uint32_t>(static_cast<uint8_t>(text[0])) << 24) | (static_cast<uint32_t>(static_cast<uint8_t>(text[1])) << 16) |
-                              (static_cast<uint32_t>(static_cast<uint8_t>(text[2])) << 8) | static_cast<uint32_t>(static_cast<uint8_t>(text[3])));
+constexpr int32_t FourCharacters(std::string_view text) {
+  uint32_t id = 0;
+  for (size_t i = 0; i < 4 && i < text.size(); ++i) id = id << 8 | static_cast<uint8_t>(text[i]);
+  return static_cast<int32_t>(id);
 }
 
 struct AEffect {

@@ -6,7 +6,6 @@
 
 namespace KVST2 {
 
-inline constexpr const char* kVendor = "Torvane";
 // Room for a parameter's name, unit and value text. The format's own limit of 8 characters
 // cuts most names short; hosts of VST 2.4 give at least this much.
 inline constexpr int32_t kParameterTextRoom = 32;

@@ -4,7 +4,9 @@
 
 #include "core/KAudioPlugin.h"
 #include "hosts/vst2/KAudioPluginVSTAdapter.h"
+#include "kernel/KCatalogue.h"
 #include "kernel/KEntryPoints.h"
+#include "kernel/KPluginIdentifiers.h"
 #include "tests/core/AllocationCounter.h"
 #include "tests/core/RecordingPlugin.h"
 #include "tests/hosts/VST2Host.h"
@@ -13,7 +15,6 @@
 using namespace KVST2Test;
 
 namespace {
-std::string ModuleName(std::string key) { return key.ends_with("Plugin") ? key.substr(1, key.size() - 7) : key.substr(1); }
 int32_t ParameterCount(const KString& key) { return std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(key))->ParameterCount(); }
 AEffect* Adapt(KAudioPlugin* plugin) { return (new KAudioPluginVSTAdapter(&KHost::Callback, std::unique_ptr<KAudioPlugin>(plugin), FourCharacters("TsT2")))->Effect(); }
 
@@ -41,7 +42,8 @@ std::vector<std::pair<int32_t, int32_t>> Notes(const KRecordingPlugin& plugin) {
 TEST(VST2Modules, EveryCataloguePluginHasAModuleThatDescribesAndMakesIt) {
   std::set<int32_t> ids;
   for (const KString& key : GetTorvanePluginList()) {
-    const std::string name = ModuleName(key.ToUtf8());
+    const KPluginDescription& description = *KFindDescription(KProductCatalogue(), key.ToUtf8());
+    const std::string name = KPluginIds::BundleName(description.key);
     KHost host;
     KModuleFile module(name);
     KInstance instance(module.Create()), legacy(module.legacyMain(&KHost::Callback));
@@ -50,9 +52,11 @@ TEST(VST2Modules, EveryCataloguePluginHasAModuleThatDescribesAndMakesIt) {
     EXPECT_EQ(std::tuple(e.numPrograms, e.numParams, e.numInputs, e.numOutputs, e.flags, e.ioRatio, e.version, e.initialDelay),
               std::tuple(1, ParameterCount(key), inputs, 2, effFlagsCanReplacing | effFlagsProgramChunks, 1.0f, 1, 0))
         << name;
-    EXPECT_TRUE(ids.insert(e.uniqueID).second && e.uniqueID != FourCharacters("NoEf") && e.uniqueID == legacy.effect->uniqueID) << name;
+    EXPECT_TRUE(ids.insert(e.uniqueID).second && e.uniqueID == FourCharacters(description.vst2Id) &&
+                e.uniqueID == legacy.effect->uniqueID)
+        << name;
     EXPECT_EQ(std::tuple(instance.Text(effGetEffectName), instance.Text(effGetVendorString), instance.Text(effGetProductString), instance.Call(effGetVstVersion)),
-              std::tuple(name, "Torvane", name, intptr_t{2400}));
+              std::tuple(std::string(description.name), "Torvane", std::string(description.name), intptr_t{2400}));
     EXPECT_EQ(std::tuple(instance.CanDo("bypass"), instance.CanDo("receiveVstMidiEvent"), instance.CanDo("sendVstEvents"), instance.CanDo("canMono"),
                          instance.CanDo("receiveVstTimeInfo"), instance.CanDo("offline")),
               std::tuple(-1, -1, -1, 1, 1, 0))
@@ -182,7 +186,7 @@ TEST(VST2Adapter, AutomationLatencyAndNamesReachTheHost) {
   KHost host;
   KInstance instance(Adapt(plugin));
   instance.Start();
-  KAudioPluginInterface& door = *plugin->Interface();
+  KAudioPluginHost& door = *plugin->Interface();
   door.SendAutomation(1, 0.25);
   door.GestureNotice(1, 3);
   EXPECT_EQ(host.edits, (std::vector<std::tuple<char, int32_t, float>>{{'b', 1, 0.0f}, {'a', 1, 0.25f}, {'e', 1, 0.0f}}));

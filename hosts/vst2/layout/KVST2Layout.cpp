@@ -13,18 +13,11 @@
 #include <set>
 #include <string>
 
+#include "hosts/common/KLayoutSteps.h"
 #include "kernel/KCatalogue.h"
 #include "kernel/KPluginIdentifiers.h"
 
 namespace fs = std::filesystem;
-
-namespace {
-// Copies only a changed file, so that a host's open module is not rewritten without need.
-void CopyIfChanged(const fs::path& from, const fs::path& to) {
-  if (fs::exists(to) && fs::file_size(to) == fs::file_size(from) && fs::last_write_time(to) >= fs::last_write_time(from)) return;
-  fs::copy_file(from, to, fs::copy_options::overwrite_existing);
-}
-}  // namespace
 
 int main(int argc, char** argv) {
   if (argc != 5) {
@@ -33,20 +26,18 @@ int main(int argc, char** argv) {
   }
   const fs::path kernel = argv[1], loader = argv[2], dir = argv[3];
   const KCatalogue& catalogue = KProductCatalogue();
-  const KStringList problems = KCatalogueProblems(catalogue);
-  for (const KString& problem : problems) std::fprintf(stderr, "Torvane catalogue: %s\n", problem.ToUtf8().c_str());
-  if (problems.Count() > 0) return 1;
+  if (!KCatalogueIsSound(catalogue)) return 1;
   try {
     fs::create_directories(dir);
     std::set<std::string> names;
     std::ofstream list(dir / "modules.txt.new");
     for (const KPluginDescription& plugin : catalogue.plugins) {
       const std::string name = KPluginIds::BundleName(plugin.key);
-      CopyIfChanged(loader, dir / (name + ".so"));
+      KCopyIfChanged(loader, dir / (name + ".so"));
       names.insert(name);
       list << name << "\n";
     }
-    CopyIfChanged(kernel, dir / argv[4]);
+    KCopyIfChanged(kernel, dir / argv[4]);
     std::ifstream previous(dir / "modules.txt");
     for (std::string name; std::getline(previous, name);)
       if (!names.contains(name)) fs::remove(dir / (name + ".so"));

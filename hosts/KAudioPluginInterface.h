@@ -50,6 +50,10 @@ public:
 
 protected:
   KAudioPlugin& Plugin() noexcept { return plugin_; }
+  // The plug-in's automation-sending counter, above 0 while a value is on its way to the host;
+  // lowering never leaves it below 0.
+  void RaiseSendingCounter() noexcept;
+  void LowerSendingCounter() noexcept;
 
 private:
   static constexpr int32_t kPendingSendsPerParameter = 4;
@@ -62,8 +66,6 @@ private:
     uint64_t time;
   };
   void Touch(int32_t index, uint64_t now);  // with the touch lock held
-  void RaiseSendingCounter() noexcept;
-  void LowerSendingCounter() noexcept;
   void EndQuietGestures();
   void ReportLatencyIfRequested();
   void SendPending();

@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Installs a build under a prefix, moves the prefix, and runs the installed `torvane` there:
-# it must find the kernel beside it, the bundles must be under the prefix, and nothing may
-# land in the user's ~/.vst3 or ~/.lv2, not even for the prefix /usr/local (staged through DESTDIR).
+# it must find the kernel beside it, the bundles and modules must be under the prefix, and nothing
+# may land in the user's ~/.vst3, ~/.lv2 or ~/.lxvst, not even for the prefix /usr/local (staged through DESTDIR).
 set -euo pipefail
 build=$1
 work=$(mktemp -d)
@@ -13,8 +13,8 @@ mv "$work/prefix" "$work/moved"
 "$work/moved/bin/torvane" --version | grep -q '^torvane '
 ldd "$work/moved/bin/torvane" | grep -q "=> $work/moved/bin/../lib/libtorvane.so"
 "$work/moved/bin/torvane" list | grep -q KCompressorPlugin
-ls -d "$work"/moved/lib/vst3/*.vst3 "$work"/moved/lib/lv2/*.lv2/manifest.ttl >/dev/null
-[ ! -e "$HOME/.vst3" ] && [ ! -e "$HOME/.lv2" ]
+ls -d "$work"/moved/lib/vst3/*.vst3 "$work"/moved/lib/lv2/*.lv2/manifest.ttl "$work"/moved/lib/lxvst/Torvane/*.so "$work"/moved/lib/lxvst/Torvane/libtorvane.so.* >/dev/null
+[ ! -e "$HOME/.vst3" ] && [ ! -e "$HOME/.lv2" ] && [ ! -e "$HOME/.lxvst" ]
 DESTDIR="$work/staged" cmake --install "$build" --prefix /usr/local >/dev/null
-ls -d "$work"/staged/usr/local/lib/vst3/*.vst3 "$work"/staged/usr/local/lib/lv2/*.lv2 "$work/staged/usr/local/bin/torvane" >/dev/null
-[ ! -e "$HOME/.vst3" ] && [ ! -e "$HOME/.lv2" ] && [ ! -e "$work/staged$HOME" ]
+ls -d "$work"/staged/usr/local/lib/vst3/*.vst3 "$work"/staged/usr/local/lib/lv2/*.lv2 "$work"/staged/usr/local/lib/lxvst/Torvane/Compressor.so "$work/staged/usr/local/bin/torvane" >/dev/null
+[ ! -e "$HOME/.vst3" ] && [ ! -e "$HOME/.lv2" ] && [ ! -e "$HOME/.lxvst" ] && [ ! -e "$work/staged$HOME" ]

@@ -14,18 +14,11 @@
 #include <set>
 #include <string>
 
+#include "hosts/common/KLayoutSteps.h"
 #include "kernel/KCatalogue.h"
 #include "kernel/KPluginIdentifiers.h"
 
 namespace fs = std::filesystem;
-
-namespace {
-// Copies only a changed file, so that a host's open bundle is not rewritten without need.
-void CopyIfChanged(const fs::path& from, const fs::path& to) {
-  if (fs::exists(to) && fs::file_size(to) == fs::file_size(from) && fs::last_write_time(to) >= fs::last_write_time(from)) return;
-  fs::copy_file(from, to, fs::copy_options::overwrite_existing);
-}
-}  // namespace
 
 int main(int argc, char** argv) {
   if (argc < 5) {
@@ -35,9 +28,7 @@ int main(int argc, char** argv) {
   const fs::path kernel = argv[1], loader = argv[2], dir = argv[3];
   const std::string arch = argv[4];
   const KCatalogue& catalogue = KProductCatalogue();
-  const KStringList problems = KCatalogueProblems(catalogue);
-  for (const KString& problem : problems) std::fprintf(stderr, "Torvane catalogue: %s\n", problem.ToUtf8().c_str());
-  if (problems.Count() > 0) return 1;
+  if (!KCatalogueIsSound(catalogue)) return 1;
   try {
     std::set<std::string> names;
     std::ofstream list(dir / "bundles.txt.new");
@@ -45,9 +36,9 @@ int main(int argc, char** argv) {
       const std::string name = KPluginIds::BundleName(plugin.key);
       const fs::path binaries = dir / (name + ".vst3") / "Contents" / arch;
       fs::create_directories(binaries);
-      CopyIfChanged(loader, binaries / (name + ".so"));
-      CopyIfChanged(kernel, binaries / kernel.filename());
-      for (int i = 5; i < argc; ++i) CopyIfChanged(argv[i], binaries / fs::path(argv[i]).filename());
+      KCopyIfChanged(loader, binaries / (name + ".so"));
+      KCopyIfChanged(kernel, binaries / kernel.filename());
+      for (int i = 5; i < argc; ++i) KCopyIfChanged(argv[i], binaries / fs::path(argv[i]).filename());
       names.insert(name);
       list << name << "\n";
     }

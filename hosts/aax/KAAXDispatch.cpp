@@ -126,21 +126,10 @@ private:
   KAAXLiveObject live_;
 };
 
-// Runs an ACF entry: nothing leaves it; a failure answers kACFFail.
-template <class Body>
-ACFResult Guarded(const char* entry, Body&& body) noexcept {
-  try {
-    return body();
-  } catch (const KException&) {
-  } catch (...) {
-    KShowEntryFailure(kCaption, entry);
-  }
-  return kACFFail;
-}
 }  // namespace
 
 ACFResult ACFStartup(IACFUnknown*) {
-  return Guarded("ACFStartup", [] {
+  return KHostEntryGuarded(kCaption, "ACFStartup", kACFFail, [] {
     KRegistries::Instance().EnsureBuilt();
     gStartups.fetch_add(1, std::memory_order_relaxed);
     return kACFOk;
@@ -158,7 +147,7 @@ ACFResult ACFGetSDKVersion(uint64_t* version) {
 }
 
 ACFResult ACFRegisterPlugin(IACFUnknown*, IACFPluginDefinition** definition) {
-  return Guarded("ACFRegisterPlugin", [&] {
+  return KHostEntryGuarded(kCaption, "ACFRegisterPlugin", kACFFail, [&] {
     if (!definition) return kACFPointer;
     *definition = nullptr;
     auto made = std::make_unique<KPluginDefinition>(OwnBundleName());
@@ -195,16 +184,12 @@ KAAXGUI* KAAXDispatchCreateGUI(KEffectParameters* effect) {
 }
 
 Result KAAXDispatchGetPluginInformation(const char* key, KAAXPluginInformation* information) {
-  try {
+  return KHostEntryGuarded(kCaption, "KAAXDispatchGetPluginInformation", kErrorNullObject, [&] {
     const KCatalogueEntry* entry = key ? FindEntry(key) : nullptr;
     if (!entry || !information) return kErrorNullObject;
     Describe(*entry, *information);
     return kSuccess;
-  } catch (const KException&) {
-  } catch (...) {
-    KShowEntryFailure(kCaption, "KAAXDispatchGetPluginInformation");
-  }
-  return kErrorNullObject;
+  });
 }
 
 void KAAXProcessCallback(KAAXProcessContext* const instances[], const void* end) {

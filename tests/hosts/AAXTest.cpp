@@ -225,7 +225,7 @@ TEST(AAXAdapter, ProcessCallbackDeliversTransportNotesAndMIDIOutWithoutAllocatin
   EXPECT_EQ(first->SampleRate(), kRate);
   KTransportState transport;
   transport.samples = 96000;
-  KBuffer a(1, 1), b(1, 1);
+  KBuffer a(2, 2), b(2, 2);  // stereo, as the plug-in starts
   a.midi.in = {{10, 3, {0x90, 60, 100, 0}, false}, {20, 3, {0x80, 60, 0, 0}, false}, {30, 0, {}, false}};
   KAAXProcessContext* contexts[] = {a.Context(&one, &transport), b.Context(&two, nullptr)};
   const uint8_t out[4] = {0x90, 64, 90, 0};
@@ -263,6 +263,19 @@ TEST(AAXAdapter, ProcessCallbackDeliversTransportNotesAndMIDIOutWithoutAllocatin
   EXPECT_EQ(controller.latencies, std::vector<int32_t>{64});
   double value = 0.0;
   EXPECT_EQ(std::pair(one.GetParameterNormalizedValue(kMasterBypassId, &value), value), std::pair(kSuccess, 1.0));
+  // The editor's size goes to the host's frame while a GUI is framed.
+  KView view;
+  KAAXGUI* gui = KAAXDispatchCreateGUI(&one);
+  ASSERT_NE(gui, nullptr);
+  EXPECT_FALSE(one.ResizeEditor(300, 200));  // not framed yet
+  EXPECT_EQ(gui->Create(&view), kSuccess);
+  EXPECT_TRUE(one.ResizeEditor(300, 200));
+  int32_t width = 0, height = 0;
+  EXPECT_EQ(gui->GetViewSize(&width, &height), kSuccess);
+  EXPECT_EQ(view.sizes, (std::vector<std::pair<int32_t, int32_t>>{{300, 200}}));
+  EXPECT_EQ(std::pair(width, height), std::pair(300, 200));
+  gui->Release();
+  EXPECT_FALSE(one.ResizeEditor(300, 200));
   // Names and values wait for nobody: with the parameter lock held elsewhere the host gets what
   // it saw last.
   std::lock_guard busy(first->ParameterLock());
@@ -304,7 +317,7 @@ TEST(AAXAdapter, NoExceptionLeavesAnExportOrAHostCall) {
   uint32_t size = 0;
   EXPECT_EQ(adapter.GetChunkSize(KAudioPluginAAXAdapter::kStateChunk, &size), kErrorNullObject);
   KThrowingTransport transport;
-  KBuffer buffer(1, 1);
+  KBuffer buffer(2, 2);
   KAAXProcessContext* contexts[] = {buffer.Context(&adapter, &transport)};
   KAAXProcessCallback(contexts, contexts + 1);
   // A 'Torv' chunk that is no state is refused quietly (a KException) and changes nothing.

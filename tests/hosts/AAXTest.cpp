@@ -17,7 +17,8 @@
 using namespace KAAXTest;
 
 namespace {
-std::unique_ptr<KAudioPlugin> Make(const char* key) { return std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(KString::Static(key))); }
+// The name is copied: the registry keeps the names it was asked for.
+std::unique_ptr<KAudioPlugin> Make(const char* key) { return std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(KString::Widen(key))); }
 std::string BundleName(std::string key) { return key.ends_with("Plugin") ? key.substr(1, key.size() - 7) : key.substr(1); }
 
 // The VST 3 bundle's state text for the same plug-in with parameter i at `values(i)`.

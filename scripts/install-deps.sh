@@ -13,5 +13,7 @@ packages=(ca-certificates g++ cmake ninja-build pkg-config
   libepoxy-dev libegl-dev libegl1-mesa-dev libgl1-mesa-dri libcairo2-dev
   chromium)
 [ "${1:-}" = "--hosts" ] && packages+=(ardour)
-$SUDO apt-get update -q
-$SUDO apt-get install -y -q --no-install-recommends "${packages[@]}"
+# Wait for another package manager run (an unattended upgrade, say) instead of failing at once.
+apt_options=(-o DPkg::Lock::Timeout=900)
+$SUDO apt-get "${apt_options[@]}" update -q
+$SUDO apt-get "${apt_options[@]}" install -y -q --no-install-recommends "${packages[@]}"

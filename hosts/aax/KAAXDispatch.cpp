@@ -13,6 +13,7 @@
 #include "hosts/aax/KAudioPluginAAXAdapter.h"
 #include "hosts/common/KHostEntry.h"
 #include "kernel/KCatalogue.h"
+#include "kernel/KPluginIdentifiers.h"
 #include "kernel/KRegistries.h"
 #include "kernel/platform/KPlatformLibrary.h"
 
@@ -25,14 +26,6 @@ constexpr std::string_view kBundleSuffix = ".aaxplugin";
 
 std::atomic<int32_t> gStartups{0};
 
-// The bundle name of a registry key: without its leading "K" and a trailing "Plugin"
-// (KCompressorPlugin -> Compressor, KSampleWarmer -> SampleWarmer), as the build lays them out.
-std::string BundleName(std::string_view key) {
-  if (key.starts_with('K')) key.remove_prefix(1);
-  if (key.size() > 6 && key.ends_with("Plugin")) key.remove_suffix(6);
-  return std::string(key);
-}
-
 uint32_t CategoryOf(const char* category) noexcept {
   const std::string_view text = category ? category : "";
   if (text == "Dynamics") return kCategoryDynamics;
@@ -44,14 +37,6 @@ uint32_t CategoryOf(const char* category) noexcept {
   return kCategoryEffect;
 }
 
-// Four printable characters from the bundle name ("Comp", "Equa"): the product's identifier
-// until the plug-ins' descriptions carry their own.
-uint32_t ProductIdOf(const std::string& name) noexcept {
-  char code[5] = "____";
-  for (size_t i = 0; i < 4 && i < name.size(); ++i) code[i] = name[i];
-  return KFourCC(code);
-}
-
 uint32_t StemOf(int32_t channels) noexcept { return channels == 1 ? kStemFormatMono : kStemFormatStereo; }
 
 void CopyField(std::string_view text, char (&field)[64]) noexcept {
@@ -60,15 +45,14 @@ void CopyField(std::string_view text, char (&field)[64]) noexcept {
   field[length] = 0;
 }
 
-void Describe(const KCatalogueEntry& entry, KAAXPluginInformation& information) {
+void Describe(const KPluginDescription& description, KAAXPluginInformation& information) {
   information = KAAXPluginInformation{};
-  const std::string name = BundleName(entry.key);
-  CopyField(entry.key, information.key);
-  CopyField(name, information.name);
-  information.category = CategoryOf(entry.moduleKey ? entry.category : nullptr);
+  CopyField(description.key, information.key);
+  CopyField(description.name, information.name);
+  information.category = CategoryOf(description.moduleKey ? description.category : nullptr);
   information.manufacturerId = kManufacturerId;
-  information.productId = ProductIdOf(name);
-  const std::unique_ptr<KAudioPlugin> plugin = KHostCreatePlugin(entry.key, "");
+  information.productId = static_cast<uint32_t>(KPluginIds::AAXProductId(description.vst2Id));
+  const std::unique_ptr<KAudioPlugin> plugin = KHostCreatePlugin(description.key, "");
   if (!plugin) throw KException("The plug-in could not be made.");
   const KAudioPlugin::Shape& shape = plugin->GetShape();
   information.acceptsMIDI = shape.acceptsMIDI;
@@ -80,18 +64,12 @@ void Describe(const KCatalogueEntry& entry, KAAXPluginInformation& information) 
     configuration.inputStem = shape.inputBuses > 0 ? StemOf(channels) : kStemFormatNone;
     configuration.outputStem = StemOf(channels);
     configuration.sideChainStem = shape.inputBuses > 1 ? StemOf(channels) : kStemFormatNone;
-    configuration.pluginId = (information.productId & 0xFFFFFF00u) | static_cast<uint32_t>('0' + information.configurationCount);
+    configuration.pluginId = static_cast<uint32_t>(KPluginIds::AAXPluginId(description.identity, channels));
     ++information.configurationCount;
   }
   information.createInstance = &KAAXDispatchCreateInstance;
   information.createGUI = &KAAXDispatchCreateGUI;
   information.processCallback = &KAAXProcessCallback;
-}
-
-const KCatalogueEntry* FindEntry(std::string_view key) noexcept {
-  for (const KCatalogueEntry& entry : KProductCatalogue().plugins)
-    if (key == entry.key) return &entry;
-  return nullptr;
 }
 
 // The bundle holding this library, from its path ".../Name.aaxplugin/Contents/<arch>/<file>";
@@ -110,9 +88,9 @@ std::string OwnBundleName() {
 class KPluginDefinition final : public IACFPluginDefinition {
 public:
   explicit KPluginDefinition(const std::string& bundle) {
-    for (const KCatalogueEntry& entry : KProductCatalogue().plugins) {
-      if (!bundle.empty() && BundleName(entry.key) != bundle) continue;
-      Describe(entry, plugins_.emplace_back());
+    for (const KPluginDescription& description : KProductCatalogue().plugins) {
+      if (!bundle.empty() && KPluginIds::BundleName(description.key) != bundle) continue;
+      Describe(description, plugins_.emplace_back());
     }
   }
   int32_t Count() const override { return static_cast<int32_t>(plugins_.size()); }
@@ -185,9 +163,9 @@ KAAXGUI* KAAXDispatchCreateGUI(KEffectParameters* effect) {
 
 Result KAAXDispatchGetPluginInformation(const char* key, KAAXPluginInformation* information) {
   return KHostEntryGuarded(kCaption, "KAAXDispatchGetPluginInformation", kErrorNullObject, [&] {
-    const KCatalogueEntry* entry = key ? FindEntry(key) : nullptr;
-    if (!entry || !information) return kErrorNullObject;
-    Describe(*entry, *information);
+    const KPluginDescription* description = key ? KFindDescription(KProductCatalogue(), key) : nullptr;
+    if (!description || !information) return kErrorNullObject;
+    Describe(*description, *information);
     return kSuccess;
   });
 }

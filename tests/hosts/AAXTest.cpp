@@ -4,7 +4,9 @@
 #include "core/KParameter.h"
 #include "hosts/aax/KAAXDispatch.h"
 #include "hosts/aax/KAudioPluginAAXAdapter.h"
+#include "kernel/KCatalogue.h"
 #include "kernel/KEntryPoints.h"
+#include "kernel/KPluginIdentifiers.h"
 #include "tests/core/AllocationCounter.h"
 #include "tests/core/RecordingPlugin.h"
 #include "tests/core/TraceCapture.h"
@@ -19,7 +21,6 @@ using namespace KAAXTest;
 namespace {
 // The name is copied: the registry keeps the names it was asked for.
 std::unique_ptr<KAudioPlugin> Make(const char* key) { return std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(KString::Widen(key))); }
-std::string BundleName(std::string key) { return key.ends_with("Plugin") ? key.substr(1, key.size() - 7) : key.substr(1); }
 
 // The VST 3 bundle's state text for the same plug-in with parameter i at `values(i)`.
 template <class Values>
@@ -40,12 +41,14 @@ TEST(AAXBundles, EveryCataloguePluginRegistersThroughTheACFEntriesWithItsStemsAn
     const std::string utf8 = key.ToUtf8();
     const std::unique_ptr<KAudioPlugin> plugin = Make(utf8.c_str());
     const KAudioPlugin::Shape& shape = plugin->GetShape();
-    KBundle bundle(BundleName(utf8));
+    KBundle bundle(KPluginIds::BundleName(utf8));
     ASSERT_TRUE(bundle.definition);
     ASSERT_EQ(bundle.definition->Count(), 1) << utf8;  // the bundle's own plug-in, not the catalogue
     const KAAXPluginInformation& information = bundle.Information();
-    EXPECT_EQ(std::tuple(std::string(information.key), std::string(information.name), information.manufacturerId),
-              std::tuple(utf8, BundleName(utf8), KFourCC("Torv")));
+    const KPluginDescription& description = *KFindDescription(KProductCatalogue(), utf8);
+    EXPECT_EQ(std::tuple(std::string(information.key), std::string(information.name), information.manufacturerId, information.productId),
+              std::tuple(utf8, std::string(description.name), KFourCC("Torv"), static_cast<uint32_t>(KPluginIds::AAXProductId(description.vst2Id))));
+    EXPECT_EQ(information.configurations[0].pluginId, static_cast<uint32_t>(KPluginIds::AAXPluginId(description.identity)));
     ASSERT_EQ(information.configurationCount, 2);  // stereo first, then mono
     for (int32_t c = 0; c < 2; ++c) {
       const auto& configuration = information.configurations[c];
@@ -183,7 +186,7 @@ TEST_F(AAXRender, CompressorEqualizerAndSaturatorSoundAsTheCommandLineRendersThe
     const Audio rendered = Render({c.key, "in.wav", "--set", parameter.Key().ToUtf8() + "=" + working});
     ASSERT_EQ(rendered.samples.size(), input.samples.size());
 
-    KBundle bundle(BundleName(c.key));
+    KBundle bundle(KPluginIds::BundleName(c.key));
     KController controller;
     KAutomation automation;
     KEffectParameters* effect = bundle.Create(controller, automation);

@@ -48,6 +48,9 @@ public:
   const Parameter& GetParameter(int32_t index) const noexcept { return *parameters_[index]; }
   // The parameter with this key, or null.
   Parameter* FindParameter(const KString& key) noexcept;
+  // Held by whatever changes what the parameter table shows (a renamed parameter); hosts read
+  // names and values under it with a try-lock, so that their threads never wait for it.
+  std::mutex& ParameterLock() noexcept { return parameterLock_; }
 
   // ---- state flags (any thread)
   static constexpr uint32_t kUpdatePending = 1u << 0;
@@ -132,6 +135,7 @@ private:
   std::unique_ptr<std::atomic<double>[]> overflowValues_;
   std::atomic<bool> overflowPending_{false};
 
+  std::mutex parameterLock_;
   std::atomic<uint32_t> stateFlags_{kUpdatePending};  // derived values start unset
   std::atomic<int32_t> automationSending_{0};
   KAudioPluginHost* interface_ = nullptr;

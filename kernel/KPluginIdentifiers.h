@@ -8,7 +8,9 @@
 //                    words 2-3: FNV-1a 64 of "Torvane." + identity + ".VST3", likewise
 //   VST 2 unique id  the four characters of vst2Id, the first in the most significant byte
 //   AAX product id   the VST 2 unique id
-//   AAX plug-in id   the upper 32 bits of FNV-1a 64 of "Torvane." + identity + ".AAX"
+//   AAX plug-in id   the upper 32 bits of FNV-1a 64 of "Torvane." + identity + ".AAX" for the
+//                    stereo configuration; for another channel count n, of "Torvane." +
+//                    identity + "." + n + ".AAX" (each stem format is a plug-in of its own)
 //   LV2 URI          "urn:torvane:" + identity
 //   CLAP id          "torvane." + identity
 //   bundle name      the key without its leading "K" and without a trailing "Plugin"
@@ -52,6 +54,13 @@ constexpr int32_t AAXProductId(std::string_view vst2Id) noexcept { return VST2Un
 
 constexpr int32_t AAXPluginId(std::string_view identity) noexcept {
   return static_cast<int32_t>(FNV1a64(".AAX", FNV1a64(identity, FNV1a64(kPrefix))) >> 32);
+}
+
+// The plug-in id of the configuration with `channels` per bus (1 to 9).
+constexpr int32_t AAXPluginId(std::string_view identity, int32_t channels) noexcept {
+  if (channels == 2) return AAXPluginId(identity);
+  const char suffix[] = {'.', static_cast<char>('0' + channels), '.', 'A', 'A', 'X'};
+  return static_cast<int32_t>(FNV1a64(std::string_view(suffix, sizeof suffix), FNV1a64(identity, FNV1a64(kPrefix))) >> 32);
 }
 
 inline std::string LV2URI(std::string_view identity) { return "urn:torvane:" + std::string(identity); }

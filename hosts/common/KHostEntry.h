@@ -20,16 +20,22 @@ TORVANE_API std::unique_ptr<KAudioPlugin> KHostCreatePlugin(const char* pluginNa
 // own, so the caption leads the text).
 TORVANE_API void KShowEntryFailure(const char* caption, const char* entry) noexcept;
 
-// Runs an exported entry: a KException answers null silently (the user has been told what there
-// was to tell); anything else is shown with the format's caption ("VST3 Plugin main") and the
-// entry's name, and answers null too.
+// Runs an exported entry: a KException answers `neutral` silently (the user has been told what
+// there was to tell); anything else is shown with the format's caption ("VST3 Plugin main") and
+// the entry's name, and answers `neutral` too.
 template <class Result, class Body>
-Result* KHostEntryGuarded(const char* caption, const char* entry, Body&& body) noexcept {
+Result KHostEntryGuarded(const char* caption, const char* entry, Result neutral, Body&& body) noexcept {
   try {
     return body();
   } catch (const KException&) {
   } catch (...) {
     KShowEntryFailure(caption, entry);
   }
-  return nullptr;
+  return neutral;
+}
+
+// The same for entries that make an object: null is the neutral answer.
+template <class Result, class Body>
+Result* KHostEntryGuarded(const char* caption, const char* entry, Body&& body) noexcept {
+  return KHostEntryGuarded<Result*>(caption, entry, nullptr, body);
 }

@@ -34,6 +34,7 @@ constexpr KCommand kCommands[] = {
      "  NAME, print a preset's state document, or delete it.\n",
      KRunPresets},
     {"help", kHelpUsage, KRunHelp},
+    {"snapshot", kSnapshotUsage, KRunSnapshot},
 };
 }  // namespace
 

@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Installs every package the build, the tests and the benchmarks need (Debian 12); chromium
-# opens the exported help pages headless.
+# opens the exported help pages headless; Xvfb and xdotool drive editor windows in the tests.
 # With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in.
 set -euo pipefail
 SUDO=""
@@ -11,6 +11,7 @@ packages=(ca-certificates g++ cmake ninja-build pkg-config
   clang libclang-rt-14-dev
   libpng-dev libwebp-dev libfreetype-dev fonts-dejavu-core fonts-dejavu-extra
   libepoxy-dev libegl-dev libegl1-mesa-dev libgl1-mesa-dri libcairo2-dev
+  libx11-dev xvfb xdotool
   chromium)
 [ "${1:-}" = "--hosts" ] && packages+=(ardour)
 $SUDO apt-get update -q

@@ -200,6 +200,7 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
   };
   button(28, "?", [this] { ShowHelp({}); }, {}, "");
   sizeButton_ = &button(58, "100 %", [this] { OpenSizeMenu(); }, {}, "editor-size");
+  sizeButton_->SetCaptionSource([this] { return KFormat("{0} %").Arg(static_cast<int32_t>(std::lround(scale_ * 100))).Text(); });
   button(52, "Redo", [this] { Redo(); }, [this] { return plugin_.CanRedo(); }, "redo");
   button(52, "Undo", [this] { Undo(); }, [this] { return plugin_.CanUndo(); }, "undo");
   presetButton_ = &button(180, "", [this] { OpenPresetMenu(); }, {}, "presets");
@@ -280,9 +281,7 @@ void KEditor::OpenSizeMenu() {
     items.push_back(KFormat("{0} %").Arg(static_cast<int32_t>(kScales[i] * 100)).Text());
     if (kScales[i] == scale_) current = i;
   }
-  OpenMenu(sizeButton_->Bounds(), items, current, [this, items](int32_t i) {
-    if (SetScale(kScales[i])) sizeButton_->SetCaption(items[static_cast<size_t>(i)]);
-  });
+  OpenMenu(sizeButton_->Bounds(), items, current, [this](int32_t i) { SetScale(kScales[i]); });
 }
 
 void KEditor::OpenPresetMenu() {

@@ -71,6 +71,11 @@ void KLevelMeterControl::Paint(KDrawer& drawer, const KStyle& style) {
   for (int32_t c = 0; c < channels_; ++c) {
     const KRect bar = Bar(c);
     drawer.FillRectangle(bar, style.Get(KStyle::kGraphBack), 255, kDrawCopy);
+    // Scale marks every 6 dB near the top, wider apart below.
+    for (double mark : {-3.0, -6.0, -12.0, -18.0, -24.0, -36.0, -48.0}) {
+      const int32_t my = LevelY(bar, kind_ == kLevel ? mark : mark / 2);
+      drawer.FillRectangle({bar.left, my, bar.right, my}, style.Get(KStyle::kGraphGrid), 255, kDrawCopy);
+    }
     const int32_t y = LevelY(bar, shown_[c]);
     if (kind_ == kLevel) {
       // Three zones, each painted up to the level.

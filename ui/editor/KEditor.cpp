@@ -32,6 +32,7 @@ constexpr int32_t kGap = 10;
 constexpr int32_t kMaxRowWidth = 1100;
 constexpr int32_t kMeterWidth = 30;
 constexpr int32_t kGraphSide = 300;
+constexpr int32_t kGraphMinSide = 220;
 constexpr int32_t kGraphTopHeight = 220;
 
 double ToDecibels(double linear) noexcept { return linear > 1e-6 ? 20 * std::log10(linear) : -120; }
@@ -147,7 +148,7 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
   const bool graphLeft = description.graph && description.graphPlace == KEditorDescription::kGraphLeft;
   const bool graphTop = description.graph && description.graphPlace == KEditorDescription::kGraphTop;
   const int32_t meterCount = plugin_.GetShape().inputBuses > 0 ? (description.gainReduction ? 3 : 2) : 1;
-  const int32_t sectionsLeft = kMargin + (graphLeft ? kGraphSide + kGap : 0);
+  int32_t sectionsLeft = kMargin;
   int32_t rowsWidth = 0;
   int32_t x = 0, y = 0, rowHeight = 0;
   struct Placed {
@@ -177,8 +178,11 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
     for (size_t p = rowStart[r]; p < rowStart[r + 1]; ++p) placed[p].rect.bottom = bottom;
   }
   const int32_t sectionsHeight = placed.empty() ? 0 : placed.back().rect.bottom + 1;
+  // A graph beside the sections is square and as tall as they are, within bounds.
+  const int32_t graphSide = std::clamp(sectionsHeight, kGraphMinSide, kGraphSide);
   const int32_t top = kHeaderHeight + kMargin + (graphTop ? kGraphTopHeight + kGap : 0);
-  const int32_t contentHeight = std::max(sectionsHeight, graphLeft ? kGraphSide : 0);
+  if (graphLeft) sectionsLeft += graphSide + kGap;
+  const int32_t contentHeight = std::max(sectionsHeight, graphLeft ? graphSide : 0);
   const int32_t metersLeft = sectionsLeft + rowsWidth + kGap;
   width_ = metersLeft + meterCount * (kMeterWidth + 8) - 8 + kMargin;
   width_ = std::max(width_, 560);
@@ -214,7 +218,7 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
 
   // ---- the graph
   if (graphLeft)
-    body.Add(description.graph(KRect{kMargin, top, kMargin + kGraphSide - 1, top + kGraphSide - 1}, plugin_, host_));
+    body.Add(description.graph(KRect{kMargin, top, kMargin + graphSide - 1, top + graphSide - 1}, plugin_, host_));
   if (graphTop)
     body.Add(description.graph(KRect{kMargin, kHeaderHeight + kMargin, metersLeft - kGap - 1, kHeaderHeight + kMargin + kGraphTopHeight - 1},
                                plugin_, host_));
@@ -222,7 +226,9 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
   // ---- the sections
   for (const Placed& p : placed) {
     const PlannedSection& s = sections[p.section];
-    const KRect r{sectionsLeft + p.rect.left, top + p.rect.top, sectionsLeft + p.rect.right, top + p.rect.bottom};
+    KRect r{sectionsLeft + p.rect.left, top + p.rect.top, sectionsLeft + p.rect.right, top + p.rect.bottom};
+    // The last row reaches down to the graph's foot.
+    if (p.rect.bottom == sectionsHeight - 1) r.bottom = top + contentHeight - 1;
     KControl& panel = body.Emplace<KSectionPanel>(r, s.title);
     const int32_t innerWidth = static_cast<int32_t>(r.Width()) - 2 * kPanelPadding;
     const int32_t columns = std::max(1, std::min<int32_t>(s.columns, static_cast<int32_t>(s.cells.size())));

@@ -14,5 +14,7 @@ packages=(ca-certificates g++ cmake ninja-build pkg-config
   libx11-dev xvfb xdotool
   chromium)
 [ "${1:-}" = "--hosts" ] && packages+=(ardour)
-$SUDO apt-get update -q
-$SUDO apt-get install -y -q --no-install-recommends "${packages[@]}"
+# Wait for another package manager run (an unattended upgrade, say) instead of failing at once.
+apt_options=(-o DPkg::Lock::Timeout=900)
+$SUDO apt-get "${apt_options[@]}" update -q
+$SUDO apt-get "${apt_options[@]}" install -y -q --no-install-recommends "${packages[@]}"

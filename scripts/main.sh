@@ -1,12 +1,16 @@
 #!/usr/bin/env bash
 # Installs the dependencies, builds the kernel and the command-line host, and renders the
-# built-in demo through a plug-in (or runs `torvane` with the arguments given).
+# built-in demo through the compressor (or runs `torvane` with the arguments given, relative
+# paths taken from the folder it is called in).
 set -euo pipefail
-cd "$(dirname "$0")/.."
-bash scripts/install-deps.sh
-cmake -S . -B build/release -G Ninja -DCMAKE_BUILD_TYPE=Release -DTORVANE_TESTS=OFF -DTORVANE_BENCHMARKS=OFF
-cmake --build build/release
+repo=$(cd "$(dirname "$0")/.." && pwd)
+bash "$repo/scripts/install-deps.sh"
+cmake -S "$repo" -B "$repo/build/release" -G Ninja -DCMAKE_BUILD_TYPE=Release -DTORVANE_TESTS=OFF -DTORVANE_BENCHMARKS=OFF
+cmake --build "$repo/build/release"
 if [ $# -eq 0 ]; then
-  set -- render KCompressorPlugin demo-compressed.wav --set threshold=0.2 --set ratio=4 --set kneemode=Soft
+  demo="$repo/build/demo-compressed.wav"
+  "$repo/build/release/tools/torvane" render KCompressorPlugin "$demo" --set threshold=0.2 --set ratio=4 --set kneemode=Soft
+  echo "The demo, compressed: $demo"
+else
+  "$repo/build/release/tools/torvane" "$@"
 fi
-./build/release/tools/torvane "$@"

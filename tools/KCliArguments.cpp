@@ -1,6 +1,7 @@
 #include "tools/KCliArguments.h"
 
 #include <algorithm>
+#include <utility>
 
 #include "kernel/KException.h"
 
@@ -11,8 +12,12 @@ KCliArguments::KCliArguments(std::span<char* const> words, std::string_view comm
   auto named = [](std::initializer_list<std::string_view> names, std::string_view name) {
     return std::find(names.begin(), names.end(), name) != names.end();
   };
+  // The short forms sox and ffmpeg users type.
+  constexpr std::pair<std::string_view, std::string_view> kShort[] = {{"-t", "--type"}, {"-q", "--quiet"}};
   for (size_t i = 0; i < words.size(); ++i) {
-    const std::string_view word = words[i];
+    std::string_view word = words[i];
+    for (const auto& [shortForm, longForm] : kShort)
+      if (word == shortForm) word = longForm;
     if (word.size() < 3 || word.substr(0, 2) != "--") {
       positional_.emplace_back(word);
       continue;

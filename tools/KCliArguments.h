@@ -8,7 +8,8 @@
 #include <vector>
 
 // The words after a command: positional arguments and options, each option as "--name VALUE",
-// "--name=VALUE" or a bare "--flag". Options keep their order, so a later --set overrides an
+// "--name=VALUE" or a bare "--flag" ("-t" and "-q" stand for "--type" and "--quiet"); "-" is
+// positional (standard input or output). Options keep their order, so a later --set overrides an
 // earlier one and --preset can be applied where it stands among them.
 class KCliArguments {
 public:

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <span>
 #include <vector>
 
 #include "core/KAudioPlugin.h"
@@ -17,11 +18,16 @@ struct KAutomationLane {
   std::vector<Point> points;
 };
 
+// One plug-in of a chain, with what feeds it besides the audio before it.
+struct KRenderStage {
+  KAudioPlugin* plugin;
+  std::vector<KAutomationLane> automation;
+  KAudioSource* sideChain = nullptr;
+};
+
 struct KRenderOptions {
   int32_t blockSize = 512;  // 0: every block's size drawn from 1 to 512 with a fixed seed
   double tailSeconds = 0.0;
-  std::vector<KAutomationLane> automation;
-  KAudioSource* sideChain = nullptr;
   bool showProgress = false;
 };
 
@@ -31,7 +37,8 @@ struct KRenderSummary {
   double realtimeFactor = 0.0;
 };
 
-// Runs `input` through the plug-in block by block, as a host would, and writes the result. The
-// output is aligned with the input: the plug-in's latency is rendered past the end and cut
+// Runs `input` through the plug-ins in series, block by block, as a host would, until the
+// input ends (a stream's length need not be known), and writes the result. The output is
+// aligned with the input: the latency of the whole chain is rendered past the end and cut
 // from the start.
-KRenderSummary KRender(KAudioPlugin& plugin, KAudioSource& input, KAudioFileWriter& output, const KRenderOptions& options);
+KRenderSummary KRender(std::span<const KRenderStage> stages, KAudioSource& input, KAudioFileWriter& output, const KRenderOptions& options);

@@ -1,5 +1,6 @@
 // torvane: the command-line host. It reaches the kernel library only through its exported
 // entry points, as every host does, and drives plug-ins as a host of its own kind.
+#include <cerrno>
 #include <cstdio>
 #include <cstring>
 #include <span>
@@ -11,7 +12,7 @@
 namespace {
 
 void PrintUsage() {
-  std::printf("usage: torvane COMMAND [ARGUMENTS]\n\ncommands:\n");
+  std::printf("usage: torvane COMMAND [ARGUMENTS]\n       torvane --version\n\ncommands:\n");
   for (const KCommand& command : KCommands()) std::printf("  %s\n", command.name);
   std::printf("\n'torvane COMMAND --help' describes a command.\n");
 }
@@ -22,6 +23,13 @@ bool AsksForHelp(std::span<char* const> words) {
   return false;
 }
 
+// A command whose printed output did not all arrive (a full disk, a closed pipe) has failed.
+int FinishOutput(int status) {
+  if (std::fflush(stdout) == 0 && !std::ferror(stdout)) return status;
+  std::fprintf(stderr, "torvane: Cannot write to standard output: %s.\n", std::strerror(errno));
+  return 1;
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -30,16 +38,20 @@ int main(int argc, char** argv) {
     PrintUsage();
     return words.empty() ? 2 : 0;
   }
+  if (words[0] == std::string_view("--version")) {
+    std::printf("torvane %s\n", TORVANE_VERSION);
+    return FinishOutput(0);
+  }
   for (const KCommand& command : KCommands()) {
     if (words[0] != std::string_view(command.name)) continue;
     if (AsksForHelp(words.subspan(1))) {
       std::printf("%s", command.usage);
-      return 0;
+      return FinishOutput(0);
     }
     try {
-      return command.run(words.subspan(1));
+      return FinishOutput(command.run(words.subspan(1)));
     } catch (const KException& failure) {
-      // An empty message: the kernel has told the user already (an unknown plug-in).
+      // An empty message: the kernel has told the user already.
       if (!failure.Message().IsEmpty()) std::fprintf(stderr, "torvane: %s\n", failure.Message().ToUtf8().c_str());
       return 1;
     }

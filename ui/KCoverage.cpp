@@ -6,7 +6,7 @@
 
 namespace {
 // Largest distance between a curve and the polygon that stands for it, in pixels.
-constexpr double kFlatness = 0.02;
+constexpr double kFlatness = 0.03;
 
 int32_t ArcSegments(double radius, double angle) {
   if (!(radius > kFlatness)) return 1;
@@ -15,10 +15,15 @@ int32_t ArcSegments(double radius, double angle) {
 }
 
 // Signed area accumulation: every edge adds, per pixel row, the area it leaves to its right,
-// so that a running sum along the row yields the covered fraction of each pixel.
+// so that a running sum along the row yields the covered fraction of each pixel. The cells are
+// a buffer of the thread that is all zero between shapes: Finish clears what edges touched.
 class Accumulator {
 public:
-  Accumulator(int32_t width, int32_t height) : width_(width), height_(height), cells_(size_t(width + 2) * height, 0.f) {}
+  Accumulator(int32_t width, int32_t height)
+      : width_(width), height_(height), stride_(size_t(width) + 2), cells_(Cells(stride_ * size_t(height))),
+        touched_(size_t(2 * height)) {
+    for (int32_t row = 0; row < height; ++row) touched_[size_t(2 * row)] = width + 2, touched_[size_t(2 * row + 1)] = 0;
+  }
 
   // An edge clipped to the box: rows above and below contribute nothing, and parts left or right
   // of it are pushed onto its side, where they still change the winding of what lies right.
@@ -44,21 +49,33 @@ public:
     }
   }
 
-  KCoverage Finish(int32_t x, int32_t y) const {
-    KCoverage mask{x, y, width_, height_, std::vector<uint8_t>(size_t(width_) * height_)};
+  KCoverage Finish(int32_t x, int32_t y) {
+    KCoverage mask{x, y, width_, height_, std::vector<uint8_t>(size_t(width_) * height_), std::vector<int32_t>(size_t(2 * height_))};
     for (int32_t row = 0; row < height_; ++row) {
-      const float* cell = &cells_[size_t(row) * (width_ + 2)];
+      float* cell = &cells_[size_t(row) * stride_];
       uint8_t* out = &mask.values[size_t(row) * width_];
+      const int32_t first = touched_[size_t(2 * row)], last = touched_[size_t(2 * row + 1)];
+      // Right of the last touched cell the sum of a closed path is back at zero.
+      const int32_t end = std::min(last, width_);
       float sum = 0;
-      for (int32_t column = 0; column < width_; ++column) {
+      for (int32_t column = first; column < end; ++column) {
         sum += cell[column];
         out[column] = uint8_t(std::min(std::abs(sum), 1.0f) * 255 + 0.5f);
       }
+      mask.spans[size_t(2 * row)] = std::min(first, end);
+      mask.spans[size_t(2 * row + 1)] = end;
+      if (first < last) std::fill(cell + first, cell + last + 1, 0.f);
     }
     return mask;
   }
 
 private:
+  static float* Cells(size_t count) {
+    thread_local std::vector<float> cells;
+    if (cells.size() < count) cells.assign(count, 0.f);
+    return cells.data();
+  }
+
   void Inside(KPointF a, KPointF b) {
     if (a.y == b.y) return;
     const float direction = a.y < b.y ? 1.f : -1.f;
@@ -76,9 +93,13 @@ private:
 
   // Distributes `d` (the row height the edge spans, signed) over the cells from x0 to x1.
   void Row(int32_t row, double xa, double xb, float d) {
-    float* cell = &cells_[size_t(row) * (width_ + 2)];
+    float* cell = &cells_[size_t(row) * stride_];
     const double x0 = std::min(xa, xb), x1 = std::max(xa, xb);
     const int32_t i0 = int32_t(std::floor(x0)), i1 = int32_t(std::ceil(x1));
+    int32_t& first = touched_[size_t(2 * row)];
+    int32_t& last = touched_[size_t(2 * row + 1)];
+    first = std::min(first, i0);
+    last = std::max(last, std::max(i1, i0 + 1));
     if (i1 <= i0 + 1) {
       // Within one pixel: the part right of the edge's mean position.
       const float right = float(0.5 * (xa + xb) - i0);
@@ -90,15 +111,15 @@ private:
     // crossed pixel, quadratically inside those two.
     const double inverse = 1 / (x1 - x0);
     const double f0 = x0 - i0;
-    const double first = 0.5 * inverse * (1 - f0) * (1 - f0);
+    const double firstPart = 0.5 * inverse * (1 - f0) * (1 - f0);
     const double f1 = x1 - i1 + 1;
     const double lastPart = 0.5 * inverse * f1 * f1;
-    cell[i0] += d * float(first);
+    cell[i0] += d * float(firstPart);
     if (i1 == i0 + 2) {
-      cell[i0 + 1] += d * float(1 - first - lastPart);
+      cell[i0 + 1] += d * float(1 - firstPart - lastPart);
     } else {
       const double second = inverse * (1.5 - f0);
-      cell[i0 + 1] += d * float(second - first);
+      cell[i0 + 1] += d * float(second - firstPart);
       for (int32_t i = i0 + 2; i < i1 - 1; ++i) cell[i] += d * float(inverse);
       const double beforeLast = second + (i1 - i0 - 3) * inverse;
       cell[i1 - 1] += d * float(1 - beforeLast - lastPart);
@@ -107,7 +128,9 @@ private:
   }
 
   int32_t width_, height_;
-  std::vector<float> cells_;
+  size_t stride_;
+  float* cells_;
+  std::vector<int32_t> touched_;  // per row the first and last cell an edge wrote
 };
 }  // namespace
 
@@ -136,11 +159,31 @@ void KPath::AddRectangle(double left, double top, double right, double bottom, b
 void KPath::AddEllipse(double cx, double cy, double rx, double ry, bool hole) {
   const size_t from = points_.size();
   const int32_t n = std::max(8, ArcSegments(std::max(rx, ry), 2 * std::numbers::pi));
+  // Turning a unit vector by one step at a time instead of a sine and cosine per point.
+  const double step = 2 * std::numbers::pi / n, c = std::cos(step), s = std::sin(step);
+  // Vertices slightly outside the curve, so that the polygon's chords cross it and it lies
+  // within half the flatness on either side (its area equals the ellipse's closely).
+  const double out = 2 / (1 + std::cos(step / 2));
+  double ux = out, uy = 0;
   for (int32_t i = 0; i < n; ++i) {
-    const double a = 2 * std::numbers::pi * i / n;
-    Add({cx + rx * std::cos(a), cy + ry * std::sin(a)});
+    Add({cx + rx * ux, cy + ry * uy});
+    const double nx = ux * c - uy * s;
+    uy = ux * s + uy * c, ux = nx;
   }
   if (hole) Reverse(from);
+  Close();
+}
+
+void KPath::AddWedge(KPointF centre, double radius, double from, double to) {
+  const double turn = std::remainder(to - from, 2 * std::numbers::pi);
+  const int32_t n = ArcSegments(radius, turn);
+  const size_t start = points_.size();
+  Add(centre);
+  for (int32_t i = 0; i <= n; ++i) {
+    const double a = from + turn * i / n;
+    Add({centre.x + radius * std::cos(a), centre.y + radius * std::sin(a)});
+  }
+  if (turn < 0) Reverse(start);
   Close();
 }
 
@@ -162,6 +205,7 @@ void KPath::AddRoundRectangle(double left, double top, double right, double bott
 
 void KPath::AddStroke(std::span<const KPointF> points, double width, double extend) {
   const double half = width / 2;
+  double previous = NAN;  // direction of the segment before, for the join
   for (size_t i = 0; i + 1 < points.size(); ++i) {
     KPointF a = points[i], b = points[i + 1];
     const double length = std::hypot(b.x - a.x, b.y - a.y);
@@ -175,7 +219,14 @@ void KPath::AddStroke(std::span<const KPointF> points, double width, double exte
                       KPointF{a.x + nx, a.y + ny}})
       Add(p);
     Close();
-    if (i > 0) AddEllipse(a.x, a.y, half, half);
+    // A round join: the wedges between the two segments' ends on both sides.
+    const double direction = std::atan2(uy, ux);
+    if (!std::isnan(previous) && std::abs(std::remainder(direction - previous, 2 * std::numbers::pi)) > 1e-6) {
+      const double quarter = std::numbers::pi / 2;
+      AddWedge(a, half, previous + quarter, direction + quarter);
+      AddWedge(a, half, previous - quarter, direction - quarter);
+    }
+    previous = direction;
   }
 }
 

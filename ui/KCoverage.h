@@ -11,6 +11,18 @@
 struct KCoverage {
   int32_t x = 0, y = 0, width = 0, height = 0;
   std::vector<uint8_t> values;  // width × height, rows top to bottom
+  // Per row the columns [begin, end) outside which every value is 0 (relative to x), two
+  // numbers a row; empty when every row may be covered anywhere.
+  std::vector<int32_t> spans;
+
+  // Calls paint(row, begin, end) for each row's covered columns (all relative to x and y).
+  template <class Paint>
+  void ForEachSpan(Paint&& paint) const {
+    for (int32_t row = 0; row < height; ++row) {
+      const int32_t begin = spans.empty() ? 0 : spans[size_t(2 * row)], end = spans.empty() ? width : spans[size_t(2 * row + 1)];
+      if (begin < end) paint(row, begin, end);
+    }
+  }
 
   bool IsEmpty() const noexcept { return width <= 0 || height <= 0; }
   uint8_t At(int32_t px, int32_t py) const noexcept { return values[size_t(py - y) * width + (px - x)]; }
@@ -27,6 +39,8 @@ public:
   // Contours with the same turning sense as AddRectangle add up; the opposite sense cuts holes.
   void AddRectangle(double left, double top, double right, double bottom, bool hole = false);
   void AddEllipse(double cx, double cy, double rx, double ry, bool hole = false);
+  // The pie slice of a circle from angle `from` to `to` the short way round.
+  void AddWedge(KPointF centre, double radius, double from, double to);
   void AddRoundRectangle(double left, double top, double right, double bottom, double radius, bool hole = false);
   // The outline of a line of `width` through `points`, round joins; `extend` lengthens both
   // ends by that much (half the width gives square ends).

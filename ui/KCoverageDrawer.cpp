@@ -6,11 +6,13 @@
 #include "kernel/KGuard.h"
 
 namespace {
-// Far outside any target, well inside the exact range of int32 pixel arithmetic.
-int32_t ClampPixel(double v) { return int32_t(std::clamp(std::round(v), -1e9, 1e9)); }
-
 KPointF ToF(KPoint p) { return {double(p.x), double(p.y)}; }
 }  // namespace
+
+void KCoverageDrawer::PaintGlyphs(const std::vector<KGlyphInk>& glyphs, KColor color, uint8_t opacity, uint32_t mode) {
+  const KCoverage mask = KFont::Compose(glyphs, TargetWidth(), TargetHeight());
+  if (!mask.IsEmpty()) PaintCoverage(mask, color, opacity, mode);
+}
 
 void KCoverageDrawer::Fill(const KPath& path, KColor color, uint8_t opacity, uint32_t mode) {
   const KCoverage mask = KRasterize(path, TargetWidth(), TargetHeight());
@@ -31,16 +33,8 @@ void KCoverageDrawer::AlignedTextOut(const KRect& rect, const KString& text, con
   KGuard(Name(kOperationAlignedTextOut), [&] {
     const PixelBox box = ToPixels(rect);
     if (box.IsEmpty() || text.IsEmpty()) return;
-    const double scale = Scale();
-    const double width = font.TextWidth(text, scale) * scale;
-    const double ascent = font.Ascent(scale) * scale, descent = font.Descent(scale) * scale;
-    double x = double(box.left), baseline = double(box.top) + ascent;
-    if (alignment & kAlignCentre) x = (double(box.left) + double(box.right) - width) / 2;
-    if (alignment & kAlignRight) x = double(box.right) - width;
-    if (alignment & kAlignMiddle) baseline = (double(box.top) + double(box.bottom) - ascent - descent) / 2 + ascent;
-    if (alignment & kAlignBottom) baseline = double(box.bottom) - descent;
-    const KCoverage mask = font.Render(text, scale, ClampPixel(x), ClampPixel(baseline), TargetWidth(), TargetHeight());
-    if (!mask.IsEmpty()) PaintCoverage(mask, color, opacity, mode);
+    const double pixels[4] = {double(box.left), double(box.top), double(box.right), double(box.bottom)};
+    PaintGlyphs(font.Place(text, Scale(), pixels, alignment), color, opacity, mode);
   });
 }
 
@@ -175,7 +169,7 @@ std::vector<KPointF> KCoverageDrawer::CurvePoints(const KRect& area, std::span<c
   std::vector<KPointF> points;
   if (values.empty() || area.IsEmpty() || !(std::abs(top - bottom) > 1e-10)) return points;
   const double low = std::min(top, bottom), high = std::max(top, bottom);
-  const double stepX = values.size() > 1 ? double(area.right - area.left) / double(values.size() - 1) : 0;
+  const double stepX = values.size() > 1 ? (double(area.right) - area.left) / double(values.size() - 1) : 0;
   const double spanY = double(area.bottom) - area.top;
   points.reserve(values.size());
   for (size_t i = 0; i < values.size(); ++i) {
@@ -229,4 +223,22 @@ void KCoverageDrawer::PaintHorizontalIntervalGraph(const KRect& area, std::span<
     path.AddStroke(band, std::min(LineWidth() * Scale(), 1.0), 0);
     Fill(path, color, opacity, mode);
   });
+}
+
+void KCoverageDrawer::StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationStretchBltH), [&] {
+    const KRect d{dest.left, dest.top, dest.right, int32_t(std::min<int64_t>(INT32_MAX, dest.top + source.Height() - 1))};
+    StretchBlt(d, bitmap, source, opacity, mode);
+  });
+}
+
+void KCoverageDrawer::StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationStretchBltV), [&] {
+    const KRect d{dest.left, dest.top, int32_t(std::min<int64_t>(INT32_MAX, dest.left + source.Width() - 1)), dest.bottom};
+    StretchBlt(d, bitmap, source, opacity, mode);
+  });
+}
+
+void KCoverageDrawer::SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) {
+  KGuard(Name(kOperationSetPixel), [&] { FillRectangle({at.x, at.y, at.x, at.y}, color, opacity, mode); });
 }

@@ -30,10 +30,6 @@ enum KDrawerOperation : int32_t {
 inline constexpr uint32_t kDrawBlend = 0;
 inline constexpr uint32_t kDrawCopy = 1;
 
-// Alignment of AlignedTextOut: one horizontal and one vertical value, or-ed.
-inline constexpr uint32_t kAlignLeft = 0, kAlignCentre = 1, kAlignRight = 2;
-inline constexpr uint32_t kAlignTop = 0, kAlignMiddle = 4, kAlignBottom = 8;
-
 enum class KGradient : uint8_t { Vertical, Horizontal };
 
 // The one drawing interface of the editors. Coordinates are logical: the drawer's scale turns
@@ -43,7 +39,8 @@ enum class KGradient : uint8_t { Vertical, Horizontal };
 // failure leaves the element out and the picture goes on.
 class KDrawer {
 public:
-  explicit KDrawer(double scale = 1);
+  // `names`: the operation names of the drawer's guards ("Class::Operation"), in slot order.
+  KDrawer(const KString* names, double scale);
   KDrawer(const KDrawer&) = delete;
   KDrawer& operator=(const KDrawer&) = delete;
   virtual ~KDrawer();
@@ -134,6 +131,8 @@ public:
   virtual void SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) = 0;
 
 protected:
+  const KString& Name(KDrawerOperation operation) const noexcept { return names_[operation]; }
+
   // The pixels of a logical rectangle: edges rounded to the pixel grid so that neighbours
   // meet without a gap or an overlap. 64-bit so that far coordinates do not overflow.
   struct PixelBox {
@@ -153,6 +152,7 @@ protected:
   KPointF position_{};
 
 private:
+  const KString* names_;
   double scale_ = 1;
   double lineWidth_ = 1;
 };

@@ -30,6 +30,33 @@ void ThrowOnError(const char* what) {
 
 // Far pixel coordinates are cut to what single-precision vertices carry exactly.
 double Vertex(int64_t v) { return double(std::clamp<int64_t>(v, -(1 << 23), 1 << 23)); }
+
+// Texture coordinates of a quad's corners: left, top, right, bottom.
+struct TextureArea {
+  double s0, t0, s1, t1;
+};
+
+// The texels `source` (inclusive) of a texture of width × height as texture coordinates.
+TextureArea AreaOf(const KRect& source, double width, double height) {
+  return {source.left / width, source.top / height, (source.right + 1.0) / width, (source.bottom + 1.0) / height};
+}
+
+// A quad over the pixels [left, right) × [top, bottom) textured with `area` of the texture, in
+// the current colour and blending.
+void TexturedQuad(GLuint texture, double left, double top, double right, double bottom, const TextureArea& area, GLint wrap) {
+  glEnable(GL_TEXTURE_2D);
+  glBindTexture(GL_TEXTURE_2D, texture);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, wrap);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, wrap);
+  glBegin(GL_QUADS);
+  glTexCoord2d(area.s0, area.t0), glVertex2d(left, top);
+  glTexCoord2d(area.s1, area.t0), glVertex2d(right, top);
+  glTexCoord2d(area.s1, area.t1), glVertex2d(right, bottom);
+  glTexCoord2d(area.s0, area.t1), glVertex2d(left, bottom);
+  glEnd();
+  glDisable(GL_TEXTURE_2D);
+  ThrowOnError("The graphics card could not paint the image.");
+}
 }  // namespace
 
 KDrawerOpenGL::KDrawerOpenGL(KOpenGLContext& context, double scale) : KCoverageDrawer(kNames, scale), context_(context) {}
@@ -42,8 +69,7 @@ KDrawerOpenGL::~KDrawerOpenGL() {
     if (set.alphaMask) names.push_back(set.alphaMask->Name());
     for (auto& part : set.parts) names.push_back(part->Name());
   }
-  for (GLuint name : {GLuint(maskTexture_), GLuint(framebufferTexture_)})
-    if (name) names.push_back(name);
+  if (framebufferTexture_) names.push_back(framebufferTexture_);
   if (!names.empty()) glDeleteTextures(GLsizei(names.size()), names.data());
   if (framebuffer_) glDeleteFramebuffers(1, &framebuffer_);
   context_.Release();
@@ -168,22 +194,10 @@ void KDrawerOpenGL::SetBlending(uint32_t mode) {
 
 void KDrawerOpenGL::PaintTexture(const KOpenGLTexture& texture, const PixelBox& box, const KRect& source, uint8_t opacity,
                                  uint32_t mode) {
-  const double tw = texture.Width(), th = texture.Height();
   SetBlending(mode);
-  glEnable(GL_TEXTURE_2D);
-  glBindTexture(GL_TEXTURE_2D, texture.Name());
-  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_CLAMP_TO_EDGE);
-  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_CLAMP_TO_EDGE);
   glColor4ub(255, 255, 255, opacity);
-  const double s0 = source.left / tw, s1 = (source.right + 1.0) / tw, t0 = source.top / th, t1 = (source.bottom + 1.0) / th;
-  glBegin(GL_QUADS);
-  glTexCoord2d(s0, t0), glVertex2d(Vertex(box.left), Vertex(box.top));
-  glTexCoord2d(s1, t0), glVertex2d(Vertex(box.right), Vertex(box.top));
-  glTexCoord2d(s1, t1), glVertex2d(Vertex(box.right), Vertex(box.bottom));
-  glTexCoord2d(s0, t1), glVertex2d(Vertex(box.left), Vertex(box.bottom));
-  glEnd();
-  glDisable(GL_TEXTURE_2D);
-  ThrowOnError("The graphics card could not paint the image.");
+  TexturedQuad(texture.Name(), Vertex(box.left), Vertex(box.top), Vertex(box.right), Vertex(box.bottom),
+               AreaOf(source, texture.Width(), texture.Height()), GL_CLAMP_TO_EDGE);
 }
 
 void KDrawerOpenGL::PaintGLTexture(const KRect& dest, const KOpenGLTexture& texture, uint8_t opacity, uint32_t mode) {
@@ -204,22 +218,12 @@ void KDrawerOpenGL::PatBlt(const KRect& dest, const KBitmap& bitmap, const KRect
     if (!texture) return;
     // Texture coordinates count whole patterns from the destination's corner; a whole-bitmap
     // texture of a rectangle that is not the whole bitmap cannot repeat, so it is never used.
-    const double repeatsX = double(dest.right - dest.left + 1) / texture->Width();
-    const double repeatsY = double(dest.bottom - dest.top + 1) / texture->Height();
+    const double repeatsX = double(dest.Width()) / texture->Width();
+    const double repeatsY = double(dest.Height()) / texture->Height();
     SetBlending(mode);
-    glEnable(GL_TEXTURE_2D);
-    glBindTexture(GL_TEXTURE_2D, texture->Name());
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_REPEAT);
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_REPEAT);
     glColor4ub(255, 255, 255, opacity);
-    glBegin(GL_QUADS);
-    glTexCoord2d(0, 0), glVertex2d(Vertex(box.left), Vertex(box.top));
-    glTexCoord2d(repeatsX, 0), glVertex2d(Vertex(box.right), Vertex(box.top));
-    glTexCoord2d(repeatsX, repeatsY), glVertex2d(Vertex(box.right), Vertex(box.bottom));
-    glTexCoord2d(0, repeatsY), glVertex2d(Vertex(box.left), Vertex(box.bottom));
-    glEnd();
-    glDisable(GL_TEXTURE_2D);
-    ThrowOnError("The graphics card could not paint the pattern.");
+    TexturedQuad(texture->Name(), Vertex(box.left), Vertex(box.top), Vertex(box.right), Vertex(box.bottom),
+                 {0, 0, repeatsX, repeatsY}, GL_REPEAT);
   });
 }
 
@@ -244,22 +248,10 @@ void KDrawerOpenGL::AlphaMask(const KRect& dest, const KBitmap& mask, KPoint sou
     if (box.IsEmpty()) return;
     const KOpenGLTexture* texture = KOpenGLTexture::GetAlphaMask(mask, *this);
     if (!texture) return;
-    const double tw = texture->Width(), th = texture->Height();
-    const double s0 = s.left / tw, s1 = (s.right + 1.0) / tw, t0 = s.top / th, t1 = (s.bottom + 1.0) / th;
     SetBlending(mode);
-    glEnable(GL_TEXTURE_2D);
-    glBindTexture(GL_TEXTURE_2D, texture->Name());
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, GL_CLAMP_TO_EDGE);
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, GL_CLAMP_TO_EDGE);
     Color(color, KMulByte(KAlphaOf(color), opacity));
-    glBegin(GL_QUADS);
-    glTexCoord2d(s0, t0), glVertex2d(Vertex(box.left), Vertex(box.top));
-    glTexCoord2d(s1, t0), glVertex2d(Vertex(box.right), Vertex(box.top));
-    glTexCoord2d(s1, t1), glVertex2d(Vertex(box.right), Vertex(box.bottom));
-    glTexCoord2d(s0, t1), glVertex2d(Vertex(box.left), Vertex(box.bottom));
-    glEnd();
-    glDisable(GL_TEXTURE_2D);
-    ThrowOnError("The graphics card could not paint the mask.");
+    TexturedQuad(texture->Name(), Vertex(box.left), Vertex(box.top), Vertex(box.right), Vertex(box.bottom),
+                 AreaOf(s, texture->Width(), texture->Height()), GL_CLAMP_TO_EDGE);
   });
 }
 
@@ -270,20 +262,6 @@ void KDrawerOpenGL::StretchBlt(const KRect& dest, const KBitmap& bitmap, const K
     if (box.IsEmpty() || !IsInside(source, bitmap)) return;
     KRect s = source;
     if (const KOpenGLTexture* texture = KOpenGLTexture::Get(bitmap, s, *this, false)) PaintTexture(*texture, box, s, opacity, mode);
-  });
-}
-
-void KDrawerOpenGL::StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationStretchBltH), [&] {
-    const KRect d{dest.left, dest.top, dest.right, int32_t(std::min<int64_t>(INT32_MAX, dest.top + source.Height() - 1))};
-    StretchBlt(d, bitmap, source, opacity, mode);
-  });
-}
-
-void KDrawerOpenGL::StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationStretchBltV), [&] {
-    const KRect d{dest.left, dest.top, int32_t(std::min<int64_t>(INT32_MAX, dest.left + source.Width() - 1)), dest.bottom};
-    StretchBlt(d, bitmap, source, opacity, mode);
   });
 }
 
@@ -365,36 +343,25 @@ void KDrawerOpenGL::FillRectangleGradient(const KRect& rect, KColor from, KColor
   });
 }
 
-void KDrawerOpenGL::SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationSetPixel), [&] { FillRectangle({at.x, at.y, at.x, at.y}, color, opacity, mode); });
-}
-
 void KDrawerOpenGL::PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t) {
   CheckPainting();
-  // One scratch texture, grown to the largest mask so far.
-  if (!maskTexture_ || mask.width > maskWidth_ || mask.height > maskHeight_) {
-    maskWidth_ = std::max(maskWidth_, mask.width);
-    maskHeight_ = std::max(maskHeight_, mask.height);
-    if (!maskTexture_) glGenTextures(1, &maskTexture_);
-    glBindTexture(GL_TEXTURE_2D, maskTexture_);
-    glTexImage2D(GL_TEXTURE_2D, 0, GL_ALPHA8, maskWidth_, maskHeight_, 0, GL_ALPHA, GL_UNSIGNED_BYTE, nullptr);
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_NEAREST);
-    glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, GL_NEAREST);
-  }
-  glBindTexture(GL_TEXTURE_2D, maskTexture_);
+  // A texture of its own for each mask: refilling one texture that painted quads still wait
+  // on would make the renderer finish them first.
+  GLuint texture = 0;
+  glGenTextures(1, &texture);
+  glBindTexture(GL_TEXTURE_2D, texture);
   glPixelStorei(GL_UNPACK_ALIGNMENT, 1);
-  glTexSubImage2D(GL_TEXTURE_2D, 0, 0, 0, mask.width, mask.height, GL_ALPHA, GL_UNSIGNED_BYTE, mask.values.data());
+  glTexImage2D(GL_TEXTURE_2D, 0, GL_ALPHA8, mask.width, mask.height, 0, GL_ALPHA, GL_UNSIGNED_BYTE, mask.values.data());
   glPixelStorei(GL_UNPACK_ALIGNMENT, 4);
-  const double s1 = double(mask.width) / maskWidth_, t1 = double(mask.height) / maskHeight_;
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, GL_NEAREST);
+  glTexParameteri(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, GL_NEAREST);
   glEnable(GL_BLEND);
-  glEnable(GL_TEXTURE_2D);
   Color(color, KMulByte(KAlphaOf(color), opacity));
-  glBegin(GL_QUADS);
-  glTexCoord2d(0, 0), glVertex2d(mask.x, mask.y);
-  glTexCoord2d(s1, 0), glVertex2d(mask.x + mask.width, mask.y);
-  glTexCoord2d(s1, t1), glVertex2d(mask.x + mask.width, mask.y + mask.height);
-  glTexCoord2d(0, t1), glVertex2d(mask.x, mask.y + mask.height);
-  glEnd();
-  glDisable(GL_TEXTURE_2D);
-  ThrowOnError("The graphics card could not paint the shape.");
+  try {
+    TexturedQuad(texture, mask.x, mask.y, mask.x + mask.width, mask.y + mask.height, {0, 0, 1, 1}, GL_CLAMP_TO_EDGE);
+  } catch (...) {
+    glDeleteTextures(1, &texture);
+    throw;
+  }
+  glDeleteTextures(1, &texture);
 }

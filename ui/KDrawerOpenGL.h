@@ -40,8 +40,6 @@ public:
   void BitBlt(const KRect& dest, const KBitmap& bitmap, KPoint source, uint8_t opacity, uint32_t mode) override;
   void AlphaMask(const KRect& dest, const KBitmap& mask, KPoint source, KColor color, uint8_t opacity, uint32_t mode) override;
   void StretchBlt(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) override;
-  void StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) override;
-  void StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) override;
   void RotatedBlt(KPointF centre, double angle, const KBitmap& bitmap, const KRect& source, uint8_t opacity,
                   uint32_t mode) override;
   void StretchBltArc(KPointF centre, double innerRadius, double outerRadius, double startAngle, double endAngle,
@@ -49,7 +47,6 @@ public:
   void FillRectangle(const KRect& rect, KColor color, uint8_t opacity, uint32_t mode) override;
   void FillRectangleGradient(const KRect& rect, KColor from, KColor to, KGradient direction, uint8_t opacity,
                              uint32_t mode) override;
-  void SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) override;
 
 protected:
   int32_t TargetWidth() const noexcept override;
@@ -79,7 +76,5 @@ private:
   int32_t textureCount_ = 0;
   uint32_t framebuffer_ = 0;
   uint32_t framebufferTexture_ = 0;
-  uint32_t maskTexture_ = 0;  // scratch texture of coverage masks
-  int32_t maskWidth_ = 0, maskHeight_ = 0;
   bool painting_ = false;
 };

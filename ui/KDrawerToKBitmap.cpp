@@ -3,6 +3,11 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <vector>
+
+#if defined(__SSE2__) || defined(_M_X64)
+#include <emmintrin.h>
+#endif
 
 #include "kernel/KException.h"
 #include "kernel/KGuard.h"
@@ -46,6 +51,105 @@ uint32_t Lerp(uint32_t a, uint32_t b, uint32_t w) noexcept {
 }
 
 int64_t Clamp(int64_t v, int64_t lo, int64_t hi) noexcept { return v < lo ? lo : v > hi ? hi : v; }
+
+// Lerp of two rows with one weight, four pixels at a time where SSE2 is there.
+void LerpRow(const uint32_t* a, const uint32_t* b, uint32_t w, uint32_t* out, int64_t n) noexcept {
+  int64_t i = 0;
+#if defined(__SSE2__) || defined(_M_X64)
+  const __m128i wb = _mm_set1_epi16(int16_t(w)), wa = _mm_set1_epi16(int16_t(256 - w)), half = _mm_set1_epi16(128);
+  const __m128i zero = _mm_setzero_si128();
+  for (; i + 4 <= n; i += 4) {
+    const __m128i va = _mm_loadu_si128(reinterpret_cast<const __m128i*>(a + i));
+    const __m128i vb = _mm_loadu_si128(reinterpret_cast<const __m128i*>(b + i));
+    const auto mix = [&](__m128i x, __m128i y) {
+      return _mm_srli_epi16(_mm_add_epi16(_mm_add_epi16(_mm_mullo_epi16(x, wa), _mm_mullo_epi16(y, wb)), half), 8);
+    };
+    const __m128i lo = mix(_mm_unpacklo_epi8(va, zero), _mm_unpacklo_epi8(vb, zero));
+    const __m128i hi = mix(_mm_unpackhi_epi8(va, zero), _mm_unpackhi_epi8(vb, zero));
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out + i), _mm_packus_epi16(lo, hi));
+  }
+#endif
+  for (; i < n; ++i) out[i] = Lerp(a[i], b[i], w);
+}
+
+// `color` blended over n pixels, each with the alpha KMulByte(alpha, coverage). The same bytes
+// as Blend: with the colour's alpha lane set to 255, the one formula s·a + d·(255-a) over 255
+// also yields Blend's alpha a + d·(255-a)/255.
+void BlendCoverageRow(uint32_t* out, const uint8_t* coverage, int64_t n, KColor color, uint32_t alpha) noexcept {
+  int64_t i = 0;
+#if defined(__SSE2__) || defined(_M_X64)
+  const __m128i zero = _mm_setzero_si128(), half = _mm_set1_epi16(128), full = _mm_set1_epi16(255);
+  const __m128i source = _mm_unpacklo_epi8(_mm_set1_epi32(int32_t(color | 0xFF000000u)), zero);
+  const __m128i alphas = _mm_set1_epi16(int16_t(alpha));
+  // x / 255 rounded, for x up to 255 · 255 in 16-bit lanes (x + 128 already added).
+  const auto divide = [](__m128i t) { return _mm_srli_epi16(_mm_add_epi16(t, _mm_srli_epi16(t, 8)), 8); };
+  const auto blend = [&](__m128i d, __m128i a) {
+    return divide(_mm_add_epi16(_mm_add_epi16(_mm_mullo_epi16(source, a), _mm_mullo_epi16(d, _mm_sub_epi16(full, a))), half));
+  };
+  for (; i + 4 <= n; i += 4) {
+    int32_t four;
+    std::memcpy(&four, coverage + i, 4);
+    if (four == 0) continue;
+    const __m128i a = divide(_mm_add_epi16(_mm_mullo_epi16(_mm_unpacklo_epi8(_mm_cvtsi32_si128(four), zero), alphas), half));
+    const __m128i pairs = _mm_unpacklo_epi16(a, a);
+    const __m128i d = _mm_loadu_si128(reinterpret_cast<const __m128i*>(out + i));
+    const __m128i low = blend(_mm_unpacklo_epi8(d, zero), _mm_unpacklo_epi32(pairs, pairs));
+    const __m128i high = blend(_mm_unpackhi_epi8(d, zero), _mm_unpackhi_epi32(pairs, pairs));
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out + i), _mm_packus_epi16(low, high));
+  }
+#endif
+  for (; i < n; ++i)
+    if (coverage[i]) Blend(out[i], color, KMulByte(alpha, coverage[i]));
+}
+
+// One source row filtered across: out[i] mixes the texels columns[2i] and columns[2i+1] with
+// weights[i] of 256 for the second; two pixels at a time where the texels are neighbours.
+// `lanes` holds per pixel the eight 16-bit factors of that (four of 256 - w, four of w).
+void FilterRow(const uint32_t* row, const int64_t* columns, const uint32_t* weights, const int16_t* lanes, uint32_t* out,
+               int64_t n) noexcept {
+  int64_t i = 0;
+#if defined(__SSE2__) || defined(_M_X64)
+  const __m128i zero = _mm_setzero_si128(), half = _mm_set1_epi16(128);
+  const auto mix = [&](int64_t k) {
+    const __m128i m = _mm_mullo_epi16(_mm_unpacklo_epi8(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(row + columns[2 * k])), zero),
+                                      _mm_loadu_si128(reinterpret_cast<const __m128i*>(lanes + 8 * k)));
+    return _mm_add_epi16(m, _mm_srli_si128(m, 8));
+  };
+  for (; i + 2 <= n; i += 2) {
+    if (columns[2 * i + 1] != columns[2 * i] + 1 || columns[2 * i + 3] != columns[2 * i + 2] + 1) {
+      out[i] = Lerp(row[columns[2 * i]], row[columns[2 * i + 1]], weights[i]);
+      out[i + 1] = Lerp(row[columns[2 * i + 2]], row[columns[2 * i + 3]], weights[i + 1]);
+      continue;
+    }
+    const __m128i both = _mm_srli_epi16(_mm_add_epi16(_mm_unpacklo_epi64(mix(i), mix(i + 1)), half), 8);
+    _mm_storel_epi64(reinterpret_cast<__m128i*>(out + i), _mm_packus_epi16(both, zero));
+  }
+#endif
+  for (; i < n; ++i) out[i] = Lerp(row[columns[2 * i]], row[columns[2 * i + 1]], weights[i]);
+}
+
+// n pixels put over `out`; opaque pixels at full opacity are copied four at a time.
+void PutRow(uint32_t* out, const uint32_t* in, int64_t n, uint8_t opacity, bool copy) noexcept {
+  if (opacity == 255 && copy) {
+    std::memcpy(out, in, size_t(n) * 4);
+    return;
+  }
+  int64_t i = 0;
+#if defined(__SSE2__) || defined(_M_X64)
+  if (opacity == 255) {
+    const __m128i alphas = _mm_set1_epi32(int32_t(0xFF000000u));
+    for (; i + 4 <= n; i += 4) {
+      const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + i));
+      const int opaque = _mm_movemask_epi8(_mm_cmpeq_epi32(_mm_and_si128(v, alphas), alphas));
+      if (opaque == 0xFFFF)
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + i), v);
+      else
+        for (int64_t j = i; j < i + 4; ++j) Put(out[j], in[j], in[j] >> 24, false);
+    }
+  }
+#endif
+  for (; i < n; ++i) Put(out[i], in[i], KMulByte(in[i] >> 24, opacity), copy);
+}
 }  // namespace
 
 // Where blits read: a rectangle of a bitmap whose outside continues its edge texels (clamp)
@@ -57,11 +161,11 @@ struct KDrawerToKBitmap::Source {
   bool wrap;
 
   int64_t X(int64_t x) const noexcept {
-    const int64_t w = area.right - area.left + 1;
+    const int64_t w = area.Width();
     return wrap ? area.left + ((x - area.left) % w + w) % w : Clamp(x, area.left, area.right);
   }
   int64_t Y(int64_t y) const noexcept {
-    const int64_t h = area.bottom - area.top + 1;
+    const int64_t h = area.Height();
     return wrap ? area.top + ((y - area.top) % h + h) % h : Clamp(y, area.top, area.bottom);
   }
   uint32_t At(double u, double v) const noexcept {
@@ -82,36 +186,54 @@ void KDrawerToKBitmap::Stretch(const PixelBox& dest, const Source& source, uint8
   const int64_t y0 = std::max<int64_t>(dest.top, 0), y1 = std::min<int64_t>(dest.bottom, target_.Height());
   if (x1 <= x0 || y1 <= y0 || opacity == 0) return;
   const bool copy = mode & kDrawCopy;
-  // One texel per pixel at texel centres: a straight copy of rows, no filtering.
+  const int64_t count = x1 - x0;
   const double startU = source.u0 + double(x0 - dest.left) * source.du, startV = source.v0 + double(y0 - dest.top) * source.dv;
-  if (source.du == 1 && source.dv == 1 && startU - std::floor(startU) == 0.5 && startV - std::floor(startV) == 0.5) {
-    const int64_t u = int64_t(startU), v = int64_t(startV);
-    for (int64_t y = y0; y < y1; ++y) {
-      const uint32_t* in = source.bitmap.Row(int32_t(source.Y(v + y - y0)));
-      uint32_t* out = target_.Row(int32_t(y));
-      if (!source.wrap && u >= source.area.left && u + (x1 - x0) - 1 <= source.area.right) {
-        in += u - x0;
-        if (copy && opacity == 255) {
-          std::memcpy(out + x0, in + x0, size_t(x1 - x0) * 4);
-          continue;
-        }
-        for (int64_t x = x0; x < x1; ++x) Put(out[x], in[x], KMulByte(in[x] >> 24, opacity), copy);
-      } else {
-        for (int64_t x = x0; x < x1; ++x) {
-          const uint32_t s = in[source.X(u + x - x0)];
-          Put(out[x], s, KMulByte(s >> 24, opacity), copy);
-        }
-      }
-    }
-    return;
+  // Each source position as two texels and the weight of the second, once for all rows.
+  const auto split = [](double position, int64_t& first, uint32_t& weight) {
+    const double f = position - 0.5, whole = std::floor(f);
+    first = int64_t(whole);
+    weight = uint32_t((f - whole) * 256 + 0.5);
+    if (weight == 256) ++first, weight = 0;
+  };
+  std::vector<int64_t> columns(static_cast<size_t>(2 * count));
+  std::vector<uint32_t> weights(static_cast<size_t>(count));
+  std::vector<int16_t> lanes(static_cast<size_t>(8 * count));
+  bool unfiltered = true;  // every pixel centre on a texel centre
+  for (int64_t i = 0; i < count; ++i) {
+    int64_t first;
+    split(startU + double(i) * source.du, first, weights[size_t(i)]);
+    std::fill_n(&lanes[size_t(8 * i)], 4, int16_t(256 - weights[size_t(i)]));
+    std::fill_n(&lanes[size_t(8 * i + 4)], 4, int16_t(weights[size_t(i)]));
+    columns[size_t(2 * i)] = source.X(first);
+    columns[size_t(2 * i + 1)] = source.X(first + 1);
+    unfiltered = unfiltered && weights[size_t(i)] == 0;
   }
+  // Filtered rows: each source row is filtered across once into a line buffer, and two such
+  // lines are mixed for each target row (a row of a two-times enlargement serves two rows).
+  std::vector<uint32_t> upper(static_cast<size_t>(count)), lower(static_cast<size_t>(count)), mixed(static_cast<size_t>(count));
+  int64_t upperRow = INT64_MIN, lowerRow = INT64_MIN;
+  const auto filterRow = [&](int64_t row, std::vector<uint32_t>& into) {
+    FilterRow(source.bitmap.Row(int32_t(source.Y(row))), columns.data(), weights.data(), lanes.data(), into.data(), count);
+  };
   for (int64_t y = y0; y < y1; ++y) {
-    uint32_t* out = target_.Row(int32_t(y));
-    const double v = startV + double(y - y0) * source.dv;
-    for (int64_t x = x0; x < x1; ++x) {
-      const uint32_t s = source.At(startU + double(x - x0) * source.du, v);
-      Put(out[x], s, KMulByte(s >> 24, opacity), copy);
+    int64_t first;
+    uint32_t wy;
+    split(startV + double(y - y0) * source.dv, first, wy);
+    uint32_t* out = target_.Row(int32_t(y)) + x0;
+    // One texel per pixel in order: the source row itself.
+    if (unfiltered && wy == 0 && source.du == 1 && columns[size_t(2 * count - 2)] - columns[0] == count - 1) {
+      PutRow(out, source.bitmap.Row(int32_t(source.Y(first))) + columns[0], count, opacity, copy);
+      continue;
     }
+    if (first == lowerRow) std::swap(upper, lower), std::swap(upperRow, lowerRow);
+    if (first != upperRow) filterRow(first, upper), upperRow = first;
+    if (wy == 0) {
+      PutRow(out, upper.data(), count, opacity, copy);
+      continue;
+    }
+    if (first + 1 != lowerRow) filterRow(first + 1, lower), lowerRow = first + 1;
+    LerpRow(upper.data(), lower.data(), wy, mixed.data(), count);
+    PutRow(out, mixed.data(), count, opacity, copy);
   }
 }
 
@@ -183,20 +305,6 @@ void KDrawerToKBitmap::StretchBlt(const KRect& dest, const KBitmap& bitmap, cons
     Mapping(box.right - box.left, source.left, source.Width(), from.u0, from.du);
     Mapping(box.bottom - box.top, source.top, source.Height(), from.v0, from.dv);
     Stretch(box, from, opacity, mode);
-  });
-}
-
-void KDrawerToKBitmap::StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationStretchBltH), [&] {
-    const KRect d{dest.left, dest.top, dest.right, int32_t(std::min<int64_t>(INT32_MAX, dest.top + source.Height() - 1))};
-    StretchBlt(d, bitmap, source, opacity, mode);
-  });
-}
-
-void KDrawerToKBitmap::StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationStretchBltV), [&] {
-    const KRect d{dest.left, dest.top, int32_t(std::min<int64_t>(INT32_MAX, dest.left + source.Width() - 1)), dest.bottom};
-    StretchBlt(d, bitmap, source, opacity, mode);
   });
 }
 
@@ -310,16 +418,29 @@ void KDrawerToKBitmap::FillRectangleGradient(const KRect& rect, KColor from, KCo
   });
 }
 
-void KDrawerToKBitmap::SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) {
-  KGuard(Name(kOperationSetPixel), [&] { FillRectangle({at.x, at.y, at.x, at.y}, color, opacity, mode); });
-}
-
 void KDrawerToKBitmap::PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t) {
   const uint32_t alpha = KMulByte(KAlphaOf(color), opacity);
-  for (int32_t y = 0; y < mask.height; ++y) {
-    const uint8_t* in = &mask.values[size_t(y) * mask.width];
-    uint32_t* out = target_.Row(mask.y + y) + mask.x;
-    for (int32_t x = 0; x < mask.width; ++x)
-      if (in[x]) Blend(out[x], color, KMulByte(alpha, in[x]));
+  if (alpha == 0) return;
+  mask.ForEachSpan([&](int32_t row, int32_t begin, int32_t end) {
+    BlendCoverageRow(target_.Row(mask.y + row) + mask.x + begin, &mask.values[size_t(row) * mask.width + size_t(begin)],
+                     end - begin, color, alpha);
+  });
+}
+
+void KDrawerToKBitmap::PaintGlyphs(const std::vector<KGlyphInk>& glyphs, KColor color, uint8_t opacity, uint32_t mode) {
+  const uint32_t alpha = KMulByte(KAlphaOf(color), opacity);
+  if (alpha == 0) return;
+  // Where inks overlap (italics, tight pairs) their coverage must add up before it is blended
+  // once, as one mask; glyphs that stand apart go straight onto the target.
+  int64_t right = INT64_MIN;
+  for (const KGlyphInk& g : glyphs) {
+    if (g.x < right) return KCoverageDrawer::PaintGlyphs(glyphs, color, opacity, mode);
+    right = std::max(right, g.x + g.width);
+  }
+  for (const KGlyphInk& g : glyphs) {
+    const int64_t x0 = std::max<int64_t>(g.x, 0), x1 = std::min<int64_t>(g.x + g.width, target_.Width());
+    const int64_t y0 = std::max<int64_t>(g.y, 0), y1 = std::min<int64_t>(g.y + g.height, target_.Height());
+    for (int64_t y = y0; y < y1; ++y)
+      BlendCoverageRow(target_.Row(int32_t(y)) + x0, g.ink + size_t(y - g.y) * g.width + size_t(x0 - g.x), x1 - x0, color, alpha);
   }
 }

@@ -16,8 +16,6 @@ public:
   void BitBlt(const KRect& dest, const KBitmap& bitmap, KPoint source, uint8_t opacity, uint32_t mode) override;
   void AlphaMask(const KRect& dest, const KBitmap& mask, KPoint source, KColor color, uint8_t opacity, uint32_t mode) override;
   void StretchBlt(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) override;
-  void StretchBltH(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) override;
-  void StretchBltV(const KRect& dest, const KBitmap& bitmap, const KRect& source, uint8_t opacity, uint32_t mode) override;
   void RotatedBlt(KPointF centre, double angle, const KBitmap& bitmap, const KRect& source, uint8_t opacity,
                   uint32_t mode) override;
   void StretchBltArc(KPointF centre, double innerRadius, double outerRadius, double startAngle, double endAngle,
@@ -25,12 +23,13 @@ public:
   void FillRectangle(const KRect& rect, KColor color, uint8_t opacity, uint32_t mode) override;
   void FillRectangleGradient(const KRect& rect, KColor from, KColor to, KGradient direction, uint8_t opacity,
                              uint32_t mode) override;
-  void SetPixel(KPoint at, KColor color, uint8_t opacity, uint32_t mode) override;
 
 protected:
   int32_t TargetWidth() const noexcept override { return target_.Width(); }
   int32_t TargetHeight() const noexcept override { return target_.Height(); }
   void PaintCoverage(const KCoverage& mask, KColor color, uint8_t opacity, uint32_t mode) override;
+  // Each glyph straight onto the target, without a mask of the whole line.
+  void PaintGlyphs(const std::vector<KGlyphInk>& glyphs, KColor color, uint8_t opacity, uint32_t mode) override;
 
 private:
   struct Source;

@@ -2,9 +2,21 @@
 
 #include <cstdint>
 #include <string>
+#include <vector>
 
 #include "kernel/KString.h"
 #include "ui/KCoverage.h"
+
+// Alignment of a line of text in a box: one horizontal and one vertical value, or-ed.
+inline constexpr uint32_t kAlignLeft = 0, kAlignCentre = 1, kAlignRight = 2;
+inline constexpr uint32_t kAlignTop = 0, kAlignMiddle = 4, kAlignBottom = 8;
+
+// One glyph's coverage, width × height bytes, placed with its top-left corner at pixel (x, y).
+struct KGlyphInk {
+  int64_t x, y;
+  int32_t width, height;
+  const uint8_t* ink;
+};
 
 enum class KFontStyle : uint8_t { Normal, Bold, Italic, BoldItalic };
 
@@ -36,9 +48,12 @@ public:
   double LineHeight(double scale = 1) const;
   double TextWidth(const KString& text, double scale = 1) const;
 
-  // The ink of a line of text whose pen starts at pixel (x, baseline) of a target of
-  // width × height pixels, drawn at `scale` pixels per logical unit.
-  KCoverage Render(const KString& text, double scale, int32_t x, int32_t baseline, int32_t width, int32_t height) const;
+  // The glyphs of a line of text aligned in the pixel box [left, right) × [top, bottom),
+  // drawn at `scale` pixels per logical unit. The pen starts on whole pixels, so that hinted
+  // glyphs stay sharp. The inks live as long as the process.
+  std::vector<KGlyphInk> Place(const KString& text, double scale, const double (&box)[4], uint32_t alignment) const;
+  // The glyphs' ink as one mask, cut to a target of width × height pixels.
+  static KCoverage Compose(const std::vector<KGlyphInk>& glyphs, int32_t width, int32_t height);
 
   // The folder the font files are looked up in: the one holding the kernel.
   static std::string FontFolder();

@@ -68,6 +68,16 @@ void InjectAtomicWriteFailures(int count) noexcept;
 // Moves a file, replacing one at `to`. "Could not rename the file '{0}' to '{1}' ({2})."
 TORVANE_API void RenameFile(const std::string& from, const std::string& to);
 
+// A file to write an output into before it is renamed over `path`: a hidden sibling of `path`
+// that no other writer uses, created empty with the permissions of the file at `path` (the
+// usual ones for a new file when there is none). Answers the open descriptor, and the name in
+// `partial`. "Could not write the file '{0}' ({1})."
+TORVANE_API int CreatePartialFile(const std::string& path, std::string& partial);
+
+// While a path is set, an interrupt (SIGINT or SIGTERM) removes that file before the process
+// ends as the signal would end it; an empty path stops that.
+TORVANE_API void RemoveOnInterrupt(const std::string& path);
+
 // Answers false when there was no such file. "Could not remove the file '{0}' ({1})."
 TORVANE_API bool RemoveFile(const std::string& path);
 

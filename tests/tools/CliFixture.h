@@ -32,6 +32,33 @@ inline Audio AudioFile(const fs::path& path, const Audio& write = {}) {  // read
   return audio;
 }
 
+// Any file libsndfile reads, as floats (full scale 1), or with `steps` as the integers an
+// integer file holds (libsndfile's scaling off); `format` receives the file's format word.
+inline Audio ReadAudio(const fs::path& path, int* format = nullptr, bool steps = false) {
+  SF_INFO info{};
+  SNDFILE* file = sf_open(path.c_str(), SFM_READ, &info);
+  EXPECT_NE(file, nullptr) << path << ": " << sf_strerror(nullptr);
+  if (!file) return {};
+  Audio audio{info.channels, info.samplerate, {}};
+  sf_command(file, SFC_SET_NORM_DOUBLE, nullptr, steps ? SF_FALSE : SF_TRUE);
+  std::vector<double> block(static_cast<size_t>(65536 * info.channels));  // to the end: a streamed header gives no length
+  for (sf_count_t got; (got = sf_read_double(file, block.data(), static_cast<sf_count_t>(block.size()))) > 0;)
+    audio.samples.insert(audio.samples.end(), block.begin(), block.begin() + got);
+  if (format) *format = info.format;
+  sf_close(file);
+  return audio;
+}
+
+// Writes `audio` in any format libsndfile writes, with text tags (libsndfile's string kinds).
+inline void WriteAudio(const fs::path& path, const Audio& audio, int format, const std::vector<std::pair<int, const char*>>& tags = {}) {
+  SF_INFO info{0, audio.rate, audio.channels, format, 0, 0};
+  SNDFILE* file = sf_open(path.c_str(), SFM_WRITE, &info);
+  ASSERT_NE(file, nullptr) << path << ": " << sf_strerror(nullptr);
+  for (const auto& [kind, text] : tags) sf_set_string(file, kind, text);
+  sf_write_float(file, audio.samples.data(), static_cast<sf_count_t>(audio.samples.size()));
+  sf_close(file);
+}
+
 inline testing::AssertionResult Same(const Audio& a, const Audio& b) {  // same shape, every sample bit for bit
   if (a.channels != b.channels || a.rate != b.rate || a.samples.size() != b.samples.size() || a.samples.empty())
     return testing::AssertionFailure() << "shapes differ: " << a.samples.size() << " vs " << b.samples.size() << " samples";
@@ -56,10 +83,17 @@ protected:
   fs::path Work() const { return root_ / "work"; }
 
   CliRun Run(const Words& words) const {  // `torvane WORDS...` in the work folder
-    auto quote = [](const std::string& word) { return " '" + word + "'"; };
-    std::string command = "cd" + quote(Work()) + " && XDG_DATA_HOME=" + quote(root_ / "data").substr(1) + quote(TORVANE_CLI);
-    for (const std::string& word : words) command += quote(word);
-    const int status = std::system((command + " >" + quote(root_ / "stdout") + " 2>" + quote(root_ / "stderr")).c_str());
+    std::string line = "\"$TORVANE\"";
+    for (const std::string& word : words) line += " '" + word + "'";
+    return Shell(line);
+  }
+
+  // A shell command line run in the work folder, "$TORVANE" naming the program.
+  CliRun Shell(const std::string& line) const {
+    std::ofstream(root_ / "command.sh") << "cd '" << Work().string() << "' && XDG_DATA_HOME='" << (root_ / "data").string() << "' TORVANE='"
+                                        << TORVANE_CLI << "' && export XDG_DATA_HOME TORVANE && " << line << "\n";
+    const int status = std::system(("sh '" + (root_ / "command.sh").string() + "' >'" + (root_ / "stdout").string() + "' 2>'" +
+                                    (root_ / "stderr").string() + "'").c_str());
     auto read = [&](const char* name) { return (std::ostringstream() << std::ifstream(root_ / name).rdbuf()).str(); };
     return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, read("stdout"), read("stderr")};
   }

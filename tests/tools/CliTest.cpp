@@ -118,13 +118,13 @@ TEST_F(CliTest, EveryBadInputIsOneMessageAFailingExitAndNoFile) {
   std::ofstream(Work() / "broken.xml") << "<TorvaneState Plugin=\"KUtilityPlugin\"><Parameters gain=";
   fs::create_directory(Work() / "taken.wav");  // an output name held by a folder
   const std::tuple<Words, Words, long> failures[] = {  // the words; parts of the message; its lines
-      {{"render", "KNoSuchPlugin", "out.wav"}, {"Could not create plugin KNoSuchPlugin.", "Plugin KNoSuchPlugin hasn't been found."}, 3},
+      {{"render", "KCompresorPlugin", "out.wav"}, {"Unknown plug-in 'KCompresorPlugin'. Did you mean KCompressorPlugin?"}, 1},
       {{"render", "KCompressorPlugin", "out.wav", "--set", "treshold=0.5"}, {"Unknown parameter 'treshold'", "Did you mean threshold?"}, 1},
       {{"render", "KCompressorPlugin", "out.wav", "--set", "ratio=50"}, {"'ratio' is out of range (1 to 20)."}, 1},
       {{"render", "KCompressorPlugin", "out.wav", "--automate", "kneemode=0:0,1:Medium"}, {"expected one of Hard, Linear, Soft."}, 1},
-      {{"render", "KUtilityPlugin", "missing.wav", "out.wav"}, {"Cannot read the audio file 'missing.wav'"}, 1},
-      {{"render", "KUtilityPlugin", "notes.txt", "out.wav"}, {"Cannot read the audio file 'notes.txt'"}, 1},
-      {{"render", "KUtilityPlugin", "in.wav", "nowhere/out.wav"}, {"Cannot write the output file 'nowhere/out.wav'"}, 1},
+      {{"render", "KUtilityPlugin", "missing.wav", "out.wav"}, {"Cannot read the audio of 'missing.wav'"}, 1},
+      {{"render", "KUtilityPlugin", "notes.txt", "out.wav"}, {"Cannot read the audio of 'notes.txt'"}, 1},
+      {{"render", "KUtilityPlugin", "in.wav", "nowhere/out.wav"}, {"Could not write the file 'nowhere/out.wav'"}, 1},
       {{"render", "KUtilityPlugin", "in.wav", "taken.wav"}, {"'taken.wav'", "Is a directory"}, 1},
       {{"render", "KUtilityPlugin", "in.wav", "out.wav", "--preset", "broken.xml"}, {"The preset file 'broken.xml' cannot be loaded: "}, 1},
       {{"render", "KUtilityPlugin", "in.wav", "out.wav", "--sidechain", "in.wav"}, {"KUtilityPlugin has no side-chain input."}, 1},

@@ -45,3 +45,4 @@ void PaintBoth(double scale, const char* name) {
 
 TEST(SceneAgreement, BothDrawersPaintTheSamePictureAtScaleOne) { PaintBoth(1, "scene_scale1"); }
 TEST(SceneAgreement, BothDrawersPaintTheSamePictureAtScaleTwo) { PaintBoth(2, "scene_scale2"); }
+TEST(SceneAgreement, BothDrawersPaintTheSamePictureAtScaleOneAndAHalf) { PaintBoth(1.5, "scene_scale1_5"); }

@@ -90,6 +90,8 @@ void KPaintTestScene(KDrawer& d, const KTestSceneImages& images, const KOpenGLTe
   d.AlignedTextOut({8, 228, 199, 250}, KString("Italic help text"), KFont::Italic(), 0xFFB0C4D8u, kAlignLeft | kAlignBottom, 255, kBlend);
   d.AlignedTextOut({8, 250, 199, 266}, KString("Heading 2, 3, 4"), KFont::Large(3), 0xFFD0D8E0u, kAlignLeft, 200, kBlend);
   d.AlignedTextOut({8, 268, 199, 282}, KString("Secondary: ratio 4:1, knee 6 dB"), KFont::Small(), 0xFF8894A0u, kAlignLeft, 255, kBlend);
+  // Glyphs whose inks overlap: their coverage adds up before it is blended.
+  d.AlignedTextOut({150, 283, 199, 299}, KString("fffj"), KFont(15, KFontStyle::BoldItalic), 0xFFF0E0A0u, kAlignRight, 255, kBlend);
   // Lines and shapes.
   d.Line({210, 180}, {390, 180}, 0xFF808890u, 255, kBlend);
   d.MoveTo({210, 185});

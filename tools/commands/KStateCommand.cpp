@@ -1,5 +1,6 @@
 #include <cstdio>
 
+#include "core/KPresetStore.h"
 #include "kernel/KException.h"
 #include "tools/KCliArguments.h"
 #include "tools/KCliPlugin.h"
@@ -27,6 +28,9 @@ int KRunPresets(std::span<char* const> words) {
   try {
     if (action == "list") {
       for (const KString& name : plugin.ListPresets()) std::printf("%s\n", name.ToUtf8().c_str());
+      // The names alone on standard output, for scripts; where they live for the user.
+      std::fprintf(stderr, "Presets of %s are kept in %s\n", plugin.Identifier().ToUtf8().c_str(),
+                   KPresetStore(plugin.Module()).PresetsPath().c_str());
     } else if (action == "save") {
       session.ApplySettings(arguments);
       plugin.SavePreset(KString::FromUtf8(positional[2]));

@@ -1,5 +1,6 @@
 #include <dlfcn.h>
 #include <fcntl.h>
+#include <signal.h>
 #include <sys/stat.h>
 #include <time.h>
 #include <unistd.h>
@@ -23,6 +24,16 @@ std::atomic<int> gTraceDescriptor{-1};
 
 std::atomic<int> gInjectedWriteFailures{0};
 std::atomic<uint32_t> gTemporaryCounter{0};
+
+// The file an interrupt removes: a fixed buffer, since the handler may only read memory.
+char gInterruptPath[4096];
+std::atomic<bool> gInterruptPathSet{false};
+
+void RemoveAndEnd(int signal) {
+  if (gInterruptPathSet.load()) ::unlink(gInterruptPath);
+  ::signal(signal, SIG_DFL);
+  ::raise(signal);
+}
 
 KString FromPath(const std::string& path) { return KString::FromUtf8(path); }
 KString Reason(int error) { return KString::FromUtf8(std::generic_category().message(error)); }
@@ -192,6 +203,33 @@ void KPlatform::RenameFile(const std::string& from, const std::string& to) {
   if (::rename(from.c_str(), to.c_str()) == 0) return;
   const KString reason = Reason(errno);  // before anything else can change errno
   throw KException(KFormatText("Could not rename the file '{0}' to '{1}' ({2}).", FromPath(from), FromPath(to), reason));
+}
+
+int KPlatform::CreatePartialFile(const std::string& path, std::string& partial) {
+  const int fd = OpenTemporarySibling(path, partial);
+  if (fd < 0) FailOnPath("Could not write the file '{0}' ({1}).", path, errno);
+  struct stat replaced {};
+  if (::stat(path.c_str(), &replaced) == 0 && S_ISREG(replaced.st_mode) && ::fchmod(fd, replaced.st_mode & 07777) != 0) {
+    const int error = errno;
+    ::close(fd);
+    ::unlink(partial.c_str());
+    FailOnPath("Could not write the file '{0}' ({1}).", path, error);
+  }
+  return fd;
+}
+
+void KPlatform::RemoveOnInterrupt(const std::string& path) {
+  static const bool installed = [] {
+    struct sigaction action {};
+    action.sa_handler = RemoveAndEnd;
+    sigemptyset(&action.sa_mask);
+    return ::sigaction(SIGINT, &action, nullptr) == 0 && ::sigaction(SIGTERM, &action, nullptr) == 0;
+  }();
+  (void)installed;
+  gInterruptPathSet.store(false);
+  if (path.empty() || path.size() >= sizeof(gInterruptPath)) return;
+  std::memcpy(gInterruptPath, path.c_str(), path.size() + 1);
+  gInterruptPathSet.store(true);
 }
 
 bool KPlatform::RemoveFile(const std::string& path) {

@@ -86,10 +86,7 @@ std::unique_ptr<KControl> TransferGraph(const KRect& bounds, KAudioPlugin& plugi
 }  // namespace
 
 KEditorDescription KCompressorEditor() {
-  KEditorDescription description;
-  description.sections = kSections;
-  description.graphPlace = KEditorDescription::kGraphLeft;
-  description.graph = &TransferGraph;
+  KEditorDescription description = KEditorDescription::Of(kSections, KEditorDescription::kGraphLeft, &TransferGraph);
   description.gainReduction = [](const KAudioPlugin& plugin) {
     return double(static_cast<const KCompressorPlugin&>(plugin).GainReductionDecibels());
   };

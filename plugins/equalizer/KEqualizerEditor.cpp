@@ -80,10 +80,4 @@ std::unique_ptr<KControl> ResponseGraph(const KRect& bounds, KAudioPlugin& plugi
 
 }  // namespace
 
-KEditorDescription KEqualizerEditor() {
-  KEditorDescription description;
-  description.sections = kSections;
-  description.graphPlace = KEditorDescription::kGraphTop;
-  description.graph = &ResponseGraph;
-  return description;
-}
+KEditorDescription KEqualizerEditor() { return KEditorDescription::Of(kSections, KEditorDescription::kGraphTop, &ResponseGraph); }

@@ -7,8 +7,4 @@ constexpr KEditorSection kSections[] = {
 };
 }  // namespace
 
-KEditorDescription KUtilityEditor() {
-  KEditorDescription description;
-  description.sections = kSections;
-  return description;
-}
+KEditorDescription KUtilityEditor() { return KEditorDescription::Of(kSections); }

@@ -27,10 +27,4 @@ std::unique_ptr<KControl> ShapeGraph(const KRect& bounds, KAudioPlugin& plugin, 
 
 }  // namespace
 
-KEditorDescription KSampleWarmerEditor() {
-  KEditorDescription description;
-  description.sections = kSections;
-  description.graphPlace = KEditorDescription::kGraphLeft;
-  description.graph = &ShapeGraph;
-  return description;
-}
+KEditorDescription KSampleWarmerEditor() { return KEditorDescription::Of(kSections, KEditorDescription::kGraphLeft, &ShapeGraph); }

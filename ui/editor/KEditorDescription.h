@@ -26,6 +26,14 @@ struct KEditorDescription {
   enum GraphPlace { kNoGraph, kGraphLeft, kGraphTop };
   using GraphFactory = std::function<std::unique_ptr<KControl>(const KRect& bounds, KAudioPlugin& plugin, KEditorHost* host)>;
 
+  static KEditorDescription Of(std::span<const KEditorSection> sections, GraphPlace place = kNoGraph, GraphFactory graph = {}) {
+    KEditorDescription description;
+    description.sections = sections;
+    description.graphPlace = place;
+    description.graph = std::move(graph);
+    return description;
+  }
+
   std::span<const KEditorSection> sections;
   GraphPlace graphPlace = kNoGraph;
   GraphFactory graph;

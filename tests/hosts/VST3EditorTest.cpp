@@ -12,6 +12,7 @@
 #include "plugins/KPluginEditors.h"
 #include "tests/hosts/VST3Host.h"
 #include "tests/ui/EditorTestSupport.h"
+#include "ui/controls/KLevelMeterControl.h"
 #include "ui/controls/KValueControl.h"
 // Last: X11's macros (None, Bool, Status) would break the headers above.
 #include <X11/Xlib.h>
@@ -91,11 +92,13 @@ struct EditorWindowFixture : ::testing::Test {
     return picture;
   }
   // Pixels further apart than the drawers' tolerance in any channel.
-  static int64_t Differences(const KBitmap& a, const KBitmap& b, int32_t fromRow = 0) {
+  // Within `area` (pixels; the whole picture when empty).
+  static int64_t Differences(const KBitmap& a, const KBitmap& b, KRect area = {}) {
     if (a.Width() != b.Width() || a.Height() != b.Height()) return -1;
+    if (area.IsEmpty()) area = a.Bounds();
     int64_t beyond = 0;
-    for (int32_t y = fromRow; y < a.Height(); ++y)
-      for (int32_t x = 0; x < a.Width(); ++x)
+    for (int32_t y = area.top; y <= area.bottom; ++y)
+      for (int32_t x = area.left; x <= area.right; ++x)
         for (int shift = 0; shift < 24; shift += 8)
           if (std::abs(int((a.Pixel(x, y) >> shift) & 0xFF) - int((b.Pixel(x, y) >> shift) & 0xFF)) > 2) {
             ++beyond;
@@ -168,6 +171,17 @@ TEST_F(EditorWindowFixture, TheViewLivesInTheHostsWindowAndAnswersMouseKeysAndSc
   ASSERT_FALSE(host.edits.empty());
   EXPECT_EQ(std::get<0>(host.edits.front()), 'b');
 
+  // Host automation while the editor is open: the knob follows the processed value and looks
+  // as the offline editor draws that value (the meters, lit by the audio, are left out).
+  KBlock block(1, 1);
+  block.Change(static_cast<ParamID>(width), {{0, 0.25}});
+  ASSERT_EQ(instance.processor->Process(block.data), kResultOk);
+  frame.Pump();
+  EXPECT_DOUBLE_EQ(instance.controller->GetParamNormalized(static_cast<ParamID>(width)), 0.25);
+  offline->GetParameter(width).SetNormalized(0.25);
+  const KBitmap automated = KBitmap::Decode(KPluginEditorSnapshotPNG(*offline, 1, false), "snapshot");
+  EXPECT_EQ(Differences(Screenshot(child, size.right, size.bottom), automated, knob->Bounds()), 0);
+
   // 200 %: the host is asked for twice the size and the window shows the sharp picture.
   auto* scaling = Query<IPlugViewContentScaleSupport>(view);
   ASSERT_NE(scaling, nullptr);
@@ -181,8 +195,13 @@ TEST_F(EditorWindowFixture, TheViewLivesInTheHostsWindowAndAnswersMouseKeysAndSc
   view->GetSize(&large);
   EXPECT_EQ(large.right, 2 * size.right);
   const KBitmap expectedLarge = KBitmap::Decode(KPluginEditorSnapshotPNG(*offline, 2, false), "snapshot");
-  // Below the title bar: its redo button is lit by the history of this session.
-  EXPECT_EQ(Differences(Screenshot(child, large.right, large.bottom), expectedLarge, 2 * KEditor::kHeaderHeight), 0);
+  // Below the title bar (its redo button is lit by this session's history) and left of the meters
+  // (lit by the audio).
+  const KLevelMeterControl* meter = KFindControl<KLevelMeterControl>(layout->Tree().Root(), [](auto&) { return true; });
+  ASSERT_NE(meter, nullptr);
+  EXPECT_EQ(Differences(Screenshot(child, large.right, large.bottom), expectedLarge,
+                        KRect{0, 2 * KEditor::kHeaderHeight, 2 * meter->Bounds().left - 1, large.bottom - 1}),
+            0);
 
   // Closed and opened again: the window goes with the view, the handlers are given back.
   EXPECT_EQ(view->Removed(), kResultOk);

@@ -29,10 +29,44 @@ function(torvane_defaults target)
   endif()
 endfunction()
 
-# An object library of one subsystem, compiled once for both the shared and the static kernel.
+# Each subsystem sees only its own folder and the folders of what it depends on: the include
+# path of a target is never the source root but views, one per subsystem, each a folder holding
+# a single link (<build>/views/core/core -> <source>/core). An #include that runs against the
+# declared dependencies therefore fails to compile.
+function(torvane_view folder out)
+  set(view "${PROJECT_BINARY_DIR}/views/${folder}")
+  if(NOT EXISTS "${view}/${folder}")
+    file(MAKE_DIRECTORY "${view}")
+    file(CREATE_LINK "${PROJECT_SOURCE_DIR}/${folder}" "${view}/${folder}" SYMBOLIC)
+  endif()
+  set(${out} "${view}" PARENT_SCOPE)
+endfunction()
+
+# Globals that must stay local to the kernel library. GCC marks inline and template statics as
+# unique global symbols, which the dynamic loader never unloads: the library would stay in the
+# process after a host closed its last bundle, its globals alive for the next load.
+set(TORVANE_LIBRARY_OPTIONS "")
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+  set(TORVANE_LIBRARY_OPTIONS -fno-gnu-unique)
+endif()
+
+# An object library of one subsystem, compiled once for both the shared and the static kernel:
+#   torvane_part(<target> [SOURCES] <files...> [DEPENDS <subsystem targets...>])
+# called in the subsystem's folder. It sees that folder and, through DEPENDS (torvane_kernel when
+# none are given), the folders of its dependencies, nothing else.
 function(torvane_part name)
-  add_library(${name} OBJECT ${ARGN})
+  cmake_parse_arguments(PART "" "" "SOURCES;DEPENDS" ${ARGN})
+  file(RELATIVE_PATH folder "${PROJECT_SOURCE_DIR}" "${CMAKE_CURRENT_SOURCE_DIR}")
+  string(REGEX REPLACE "/.*" "" folder "${folder}")
+  if(NOT PART_DEPENDS AND NOT name STREQUAL "torvane_kernel")
+    set(PART_DEPENDS torvane_kernel)
+  endif()
+  add_library(${name} OBJECT ${PART_SOURCES} ${PART_UNPARSED_ARGUMENTS})
   torvane_defaults(${name})
-  target_include_directories(${name} PUBLIC ${PROJECT_SOURCE_DIR})
+  torvane_view(${folder} view)
+  target_include_directories(${name} PUBLIC ${view})
+  target_link_libraries(${name} PUBLIC ${PART_DEPENDS})
+  target_compile_options(${name} PRIVATE ${TORVANE_LIBRARY_OPTIONS})
   target_compile_definitions(${name} PRIVATE TORVANE_BUILDING_KERNEL)
+  set_property(GLOBAL APPEND PROPERTY TORVANE_PARTS ${name})
 endfunction()

@@ -1,13 +1,15 @@
 #include "core/KAudioPlugin.h"
 
 #include <algorithm>
+#include <memory>
 #include <utility>
 
 #include "core/KChannelMode.h"
 #include "core/KDenormals.h"
 #include "core/KParameter.h"
-#include "hosts/KAudioPluginInterface.h"
+#include "core/KAudioPluginHost.h"
 #include "kernel/KGuard.h"
+#include "kernel/KPluginRegistry.h"
 #include "kernel/platform/KPlatform.h"
 
 namespace {
@@ -56,14 +58,21 @@ void KAudioPlugin::SetChannelMode(int32_t mode) noexcept {
   MarkUpdatePending();
 }
 
+KAudioPlugin* KAdoptNewPlugin(KAudioPlugin* plugin, const KString& name, KModule* module) {
+  std::unique_ptr<KAudioPlugin> owned(plugin);
+  owned->SetIdentifier(name);
+  owned->SetModule(module);
+  return owned.release();
+}
+
 void KAudioPlugin::SetBypassFromUser(bool bypass) {
   SetBypass(bypass);
-  if (KAudioPluginInterface* host = Interface()) host->SendBypassAutomation(bypass);
+  if (KAudioPluginHost* host = Interface()) host->SendBypassAutomation(bypass);
 }
 
 void KAudioPlugin::ReportLatency(int32_t samples) noexcept {
   latency_.store(samples, std::memory_order_relaxed);
-  if (KAudioPluginInterface* host = Interface()) host->RequestLatencyReport(KAudioPluginInterface::kLatencyIfChanged);
+  if (KAudioPluginHost* host = Interface()) host->RequestLatencyReport(KAudioPluginHost::kLatencyIfChanged);
 }
 
 void KAudioPlugin::ScheduleMIDIEvent(int32_t sampleOffset, KMIDIBytes bytes) noexcept {

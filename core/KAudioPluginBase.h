@@ -11,7 +11,7 @@
 #include "kernel/KArray.h"
 #include "kernel/KExport.h"
 
-class KAudioPluginInterface;
+class KAudioPluginHost;
 
 // The parameter side of every plug-in: the parameter table and the ramps that make host
 // automation sample-accurate. The audio is cut into sub-blocks at the ramps' break points, and
@@ -84,8 +84,8 @@ public:
   void PostValue(int32_t parameter, double normalized, int32_t glideSamples);
 
   // ---- host side
-  KAudioPluginInterface* Interface() const noexcept { return interface_; }
-  void SetInterface(KAudioPluginInterface* host) noexcept { interface_ = host; }
+  KAudioPluginHost* Interface() const noexcept { return interface_; }
+  void SetInterface(KAudioPluginHost* host) noexcept { interface_ = host; }
   // Above 0 while a value sent by the plug-in is on its way to the host (so that the host's
   // echo of it is recognised).
   std::atomic<int32_t>& AutomationSending() noexcept { return automationSending_; }
@@ -132,5 +132,5 @@ private:
 
   std::atomic<uint32_t> stateFlags_{kUpdatePending};  // derived values start unset
   std::atomic<int32_t> automationSending_{0};
-  KAudioPluginInterface* interface_ = nullptr;
+  KAudioPluginHost* interface_ = nullptr;
 };

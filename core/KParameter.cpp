@@ -1,6 +1,6 @@
 #include "core/KParameter.h"
 
-#include "hosts/KAudioPluginInterface.h"
+#include "core/KAudioPluginHost.h"
 
 KParameterValue::KParameterValue(KAudioPluginBase& owner, const KValueKind& kind, double normalized) noexcept
     : owner_(owner), kind_(kind), normalized_(normalized) {}
@@ -21,5 +21,5 @@ bool KAudioPluginBase::Parameter::NormalizedFromText(const KString& text, double
 }
 
 void KAudioPluginBase::Parameter::TouchAutomation(int32_t kind) {
-  if (KAudioPluginInterface* host = owner_.Interface()) host->GestureNotice(index_, kind);
+  if (KAudioPluginHost* host = owner_.Interface()) host->GestureNotice(index_, kind);
 }

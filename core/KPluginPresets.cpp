@@ -2,7 +2,7 @@
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
 #include "core/KPresetStore.h"
-#include "hosts/KAudioPluginInterface.h"
+#include "core/KAudioPluginHost.h"
 #include "kernel/KException.h"
 #include "kernel/KGuard.h"
 #include "kernel/KModule.h"
@@ -20,7 +20,7 @@ void KAudioPlugin::FollowActivePreset(const KPresetStore& store) {
 
 void KAudioPlugin::TellHostSettingsChanged() noexcept {
   KGuard("KAudioPlugin::TellHostSettingsChanged", [this] {
-    if (KAudioPluginInterface* host = Interface()) host->NotifyPresetChanged();
+    if (KAudioPluginHost* host = Interface()) host->NotifyPresetChanged();
   });
 }
 

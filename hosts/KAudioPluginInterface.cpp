@@ -7,6 +7,9 @@ KAudioPluginInterface::KAudioPluginInterface(KAudioPlugin& plugin, const KString
     : plugin_(plugin), formatName_(formatName), clock_(clock) {
   // Room for every parameter at once: touching never allocates in steady state.
   touched_.Reserve(plugin.ParameterCount() > 1 ? plugin.ParameterCount() : 1);
+  pendingRoom_ = kPendingSendsPerParameter * (plugin.ParameterCount() > 1 ? plugin.ParameterCount() : 1);
+  pendingSends_.ReservePending(pendingRoom_);
+  pendingSends_.AddListener<&KAudioPluginInterface::SendPosted>(this);
 }
 
 KAudioPluginInterface::~KAudioPluginInterface() = default;
@@ -73,14 +76,25 @@ void KAudioPluginInterface::SendAutomation(int32_t index, double normalized) {
   if (index < 0 || index >= plugin_.ParameterCount()) return;
   RaiseSendingCounter();
   {
-    // The audio thread may send too, so it never waits here: when the editor or the timer holds
-    // the list, this send goes out without a touch and the next send of the parameter begins
-    // its gesture.
-    std::unique_lock<std::mutex> lock(touchLock_, std::try_to_lock);
-    if (lock.owns_lock()) Touch(index, clock_.Milliseconds());
+    // Waited for even when the editor or the timer holds the list: a value sent without its
+    // touch would reach the host outside a gesture, or let a gesture end amid a burst.
+    std::lock_guard<std::mutex> lock(touchLock_);
+    Touch(index, clock_.Milliseconds());
   }
   SendAutomationValue(index, normalized);
   LowerSendingCounter();
+}
+
+void KAudioPluginInterface::SendAutomationFromProcess(int32_t index, double normalized) noexcept {
+  if (index < 0 || index >= plugin_.ParameterCount()) return;
+  // The room was reserved at construction: beyond it a post would allocate on the audio thread.
+  if (pendingSends_.PendingCount() >= pendingRoom_) return;
+  pendingSends_.Post(PendingSend{index, normalized});
+}
+
+// Only the sends waiting when the idle began: a listener that posts again waits for the next.
+void KAudioPluginInterface::SendPending() {
+  for (int32_t waiting = pendingSends_.PendingCount(); waiting > 0; --waiting) pendingSends_.ExecutePendingEvent();
 }
 
 void KAudioPluginInterface::SendAllAutomation() {
@@ -99,6 +113,7 @@ void KAudioPluginInterface::SendBypassAutomation(bool bypass) {
 }
 
 void KAudioPluginInterface::Idle() {
+  SendPending();
   EndQuietGestures();
   ReportLatencyIfRequested();
 }

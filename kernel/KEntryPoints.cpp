@@ -1,6 +1,5 @@
 #include "kernel/KEntryPoints.h"
 
-#include "core/KAudioPlugin.h"
 #include "kernel/KException.h"
 #include "kernel/KFormat.h"
 #include "kernel/KModule.h"

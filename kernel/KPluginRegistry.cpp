@@ -2,7 +2,6 @@
 
 #include <memory>
 
-#include "core/KAudioPlugin.h"
 #include "kernel/KException.h"
 
 KPluginRegistry::~KPluginRegistry() {
@@ -42,9 +41,6 @@ KAudioPlugin* KPluginRegistry::Create(const KString& name, KModule* context) con
     message.Append(name).Append(KString(" hasn't been found."));
     throw KException(message);
   }
-  std::unique_ptr<KAudioPlugin> plugin(record->factory(context, record));
-  if (!plugin) return nullptr;
-  plugin->SetIdentifier(name);
-  plugin->SetModule(context);  // its presets live in the module's data folder
-  return plugin.release();
+  KAudioPlugin* plugin = record->factory(context, record);
+  return plugin ? KAdoptNewPlugin(plugin, name, context) : nullptr;
 }

@@ -11,6 +11,11 @@ struct KPluginRecord;
 // Creates one instance; `context` is the module of the requested name (may be null).
 using KPluginFactory = KAudioPlugin* (*)(KModule* context, const KPluginRecord* record);
 
+// Implemented by the plug-in core, so that the registry needs no more than this declaration:
+// gives a new instance the name it was asked for and its module (its presets live in the
+// module's data folder), and answers it; deletes it and rethrows when that fails.
+KAudioPlugin* KAdoptNewPlugin(KAudioPlugin* plugin, const KString& name, KModule* module);
+
 struct KPluginRecord {
   KPluginFactory factory;
   KString category;  // empty in the main registry

@@ -16,9 +16,9 @@ void KRegistries::EnsureBuilt() {
 }
 
 void KRegistries::Build() {
-  for (const KCatalogueEntry& entry : catalogue_.plugins) main_.Register(KString::Static(entry.key), entry.factory, {});
+  for (const KPluginDescription& entry : catalogue_.plugins) main_.Register(KString::Static(entry.key), entry.factory, {});
   for (const char* category : kCategories) {
-    for (const KCatalogueEntry& entry : catalogue_.plugins) {
+    for (const KPluginDescription& entry : catalogue_.plugins) {
       if (entry.moduleKey && std::strcmp(entry.category, category) == 0)
         modules_.Register(KString::Static(entry.moduleKey), entry.factory, KString::Static(category));
     }

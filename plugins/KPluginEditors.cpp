@@ -6,6 +6,7 @@
 #include "kernel/KCatalogue.h"
 #include "ui/KDrawerOpenGL.h"
 #include "ui/KHelpTexts.h"
+#include "ui/editor/KEditorFactory.h"
 #include "ui/platform/KOpenGLContext.h"
 #include "plugins/KPluginHelp.h"
 #include "plugins/KPluginHelpPage.h"
@@ -23,12 +24,13 @@ constexpr EditorEntry kEditors[] = {
     {"KSampleWarmer", &KSampleWarmerEditor},
 };
 
-// The catalogue's short name ("Compressor"), else the registry key.
+// The host layer makes editors through the factory, which sees no plug-in: this maker is it.
+[[maybe_unused]] const bool gRegistered = (KSetEditorMaker(&KMakePluginEditor), true);
+
+// The name hosts list ("Compressor"), else the registry key.
 KString TitleOf(const KAudioPlugin& plugin) {
-  const std::string key = plugin.Identifier().ToUtf8();
-  for (const KCatalogueEntry& entry : KProductCatalogue().plugins)
-    if (key == entry.key && entry.moduleKey) return KString::Static(entry.moduleKey);
-  return plugin.Identifier();
+  const KPluginDescription* description = KFindDescription(KProductCatalogue(), plugin.Identifier().ToUtf8());
+  return description && description->name ? KString::Static(description->name) : plugin.Identifier();
 }
 
 }  // namespace

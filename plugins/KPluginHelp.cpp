@@ -1,5 +1,7 @@
 #include "plugins/KPluginHelp.h"
 
+#include "kernel/KCatalogue.h"
+
 namespace {
 // Whether `key` matches `pattern`, a "#" in it standing for one or more digits.
 bool Matches(std::string_view pattern, std::string_view key, int32_t& number) noexcept {
@@ -17,9 +19,6 @@ bool Matches(std::string_view pattern, std::string_view key, int32_t& number) no
   }
   return k == key.size();
 }
-
-using HelpOf = const KPluginHelp& (*)();
-constexpr HelpOf kHelps[] = {&KUtilityHelp, &KCompressorHelp, &KEqualizerHelp, &KSampleWarmerHelp};
 }  // namespace
 
 const KParameterHelp* KPluginHelp::Find(std::string_view key, int32_t& number) const noexcept {
@@ -30,7 +29,6 @@ const KParameterHelp* KPluginHelp::Find(std::string_view key, int32_t& number) c
 }
 
 const KPluginHelp* KFindPluginHelp(std::string_view plugin) noexcept {
-  for (const HelpOf help : kHelps)
-    if (plugin == help().plugin) return &help();
-  return nullptr;
+  const KPluginDescription* description = KFindDescription(KProductCatalogue(), plugin);
+  return description && description->help ? &description->help() : nullptr;
 }

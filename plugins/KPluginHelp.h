@@ -26,11 +26,5 @@ struct KPluginHelp {
   TORVANE_API const KParameterHelp* Find(std::string_view key, int32_t& number) const noexcept;
 };
 
-// The help of a catalogue plug-in by its registry key, or null.
+// The help of a catalogue plug-in by its registry key (its description names it), or null.
 TORVANE_API const KPluginHelp* KFindPluginHelp(std::string_view plugin) noexcept;
-
-// Each plug-in's help, beside its parameter table.
-const KPluginHelp& KUtilityHelp();
-const KPluginHelp& KCompressorHelp();
-const KPluginHelp& KEqualizerHelp();
-const KPluginHelp& KSampleWarmerHelp();

@@ -1,6 +1,7 @@
 #include "hosts/vst3/KAudioPluginVST3Adapter.h"
 
 #include <cstring>
+#include <string>
 #include <utility>
 
 #include "hosts/common/KHostGuard.h"
@@ -10,6 +11,7 @@
 #include "hosts/vst3/KVST3MIDIOutput.h"
 #include "hosts/vst3/KVST3ProcessInput.h"
 #include "hosts/vst3/KVST3Util.h"
+#include "kernel/KCatalogue.h"
 
 using namespace KVST3;
 
@@ -82,7 +84,9 @@ TResult KAudioPluginVST3Adapter::GetControllerClassId(char* classId) {
     if (!classId) return kInvalidArgument;
     // The controller is this same class: a host that insists on a controller object of its own
     // makes a second instance, which takes the component's state through SetComponentState.
-    KClassIdOf(plugin_->Identifier().ToUtf8()).CopyTo(classId);
+    const std::string key = plugin_->Identifier().ToUtf8();
+    const KPluginDescription* description = KFindDescription(KProductCatalogue(), key);
+    KClassIdOf(description && description->identity ? description->identity : key).CopyTo(classId);
     return kResultTrue;
   });
 }
@@ -181,11 +185,9 @@ TResult KAudioPluginVST3Adapter::Process(ProcessData& data) {
     const float* inputs[KAudioPlugin::kMaxChannels] = {};
     float* outputs[KAudioPlugin::kMaxChannels] = {};
     const bool mapped = buses_.MapBuffers(data, channels_, inputs, outputs);
-    processing_ = &data;
     midiOut_.BeginBlock();
     plugin.ProcessHostBlock(inputs, mapped ? outputs : nullptr, data.numSamples);
     midiOut_.EndBlock();
-    processing_ = nullptr;
     if (mapped) KBusLayout::MarkSilence(data);
     KFlushMIDI(midiOut_, data.outputEvents);
     return kResultOk;
@@ -354,16 +356,6 @@ void KAudioPluginVST3Adapter::BeginGesture(int32_t index) { host_.BeginEdit(stat
 
 void KAudioPluginVST3Adapter::SendAutomationValue(int32_t index, double normalized) {
   host_.PerformEdit(static_cast<ParamID>(index), normalized);
-}
-
-// The component handler belongs to the user-interface thread; from inside processing a value
-// goes out with the block's output parameter changes instead.
-void KAudioPluginVST3Adapter::SendAutomationValueFromProcess(int32_t index, double normalized) {
-  if (!processing_ || !processing_->outputParameterChanges) return;
-  int32_t queueIndex = 0, pointIndex = 0;
-  const auto id = static_cast<ParamID>(index);
-  if (IParamValueQueue* queue = processing_->outputParameterChanges->AddParameterData(id, queueIndex))
-    queue->AddPoint(0, normalized, pointIndex);
 }
 
 void KAudioPluginVST3Adapter::EndGesture(int32_t index) { host_.EndEdit(static_cast<ParamID>(index)); }

@@ -146,7 +146,6 @@ public:
   // ---- KAudioPluginInterface: the plug-in's way back to the host
   void BeginGesture(int32_t index) override;
   void SendAutomationValue(int32_t index, double normalized) override;
-  void SendAutomationValueFromProcess(int32_t index, double normalized) override;
   void EndGesture(int32_t index) override;
   void SendMIDIEvent(int32_t sampleOffset, const uint8_t bytes[4]) override;
   void ReportLatency(int32_t samples) override;
@@ -173,6 +172,4 @@ private:
   // Silence and the discard buffer for buses the host leaves out, sized at setupProcessing.
   KHostChannelMap channels_;
   KHostState state_;
-  // The block being processed, for values the plug-in sends from inside processing.
-  KVST3::ProcessData* processing_ = nullptr;
 };

@@ -4,13 +4,14 @@
 #include <cstring>
 
 #include "hosts/common/KHostGuard.h"
-#include "plugins/KPluginEditors.h"
+#include "ui/editor/KEditor.h"
+#include "ui/editor/KEditorFactory.h"
 #include "ui/platform/KEditorWindowX11.h"
 
 using namespace KVST3;
 
 KAudioPluginVST3Adapter::KEditor::KEditor(KAudioPluginVST3Adapter& adapter)
-    : adapter_(adapter), editor_(KMakePluginEditor(*adapter.plugin_, this, KStyle::Load(KStyle::UserSkinPath()))) {
+    : adapter_(adapter), editor_(KMakeEditor(*adapter.plugin_, this, KStyle::Load(KStyle::UserSkinPath()))) {
   adapter_.AddRef();
 }
 

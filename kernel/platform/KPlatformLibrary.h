@@ -15,6 +15,8 @@ void* OpenLibrary(const std::string& path) noexcept;
 void* FindSymbol(void* library, const char* name) noexcept;
 // Drops one reference to a library OpenLibrary answered.
 void CloseLibrary(void* library) noexcept;
+// Whether the library at `path` is loaded in this process; never loads it.
+bool IsLibraryLoaded(const std::string& path) noexcept;
 // The path of the loaded file that holds `address` (any object or function of the caller's own
 // module); empty when the system cannot tell.
 std::string LibraryPathOf(const void* address);

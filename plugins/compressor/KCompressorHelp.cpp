@@ -1,4 +1,5 @@
 #include "plugins/KPluginHelp.h"
+#include "plugins/compressor/KCompressorPlugin.h"
 
 namespace {
 constexpr KParameterHelp kParameters[] = {

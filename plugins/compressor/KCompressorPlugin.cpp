@@ -110,6 +110,18 @@ KCompressorPlugin::KCompressorPlugin()
 
 KAudioPlugin* KCompressorPlugin::Create(KModule*, const KPluginRecord*) { return new KCompressorPlugin; }
 
+constinit const KPluginDescription kCompressorDescription{
+    .key = "KCompressorPlugin",
+    .factory = &KCompressorPlugin::Create,
+    .moduleKey = "Compressor",
+    .category = "Dynamics",
+    .name = "Compressor",
+    .vst3SubCategories = "Fx|Dynamics",
+    .vst2Id = "TvCo",
+    .identity = "KCompressorPlugin",
+    .help = &KCompressorHelp,
+};
+
 std::span<const KCompressorPlugin::Point> KCompressorPlugin::DefaultCustomShape() noexcept { return kDefaultShape; }
 
 void KCompressorPlugin::SetCustomShape(std::span<const Point> points) {

@@ -9,7 +9,7 @@
 #include "dsp/KDynamicsProcessor.h"
 #include "dsp/KSectionRunner.h"
 #include "dsp/KTransferCurve.h"
-#include "kernel/KPluginRegistry.h"
+#include "kernel/KPluginDescription.h"
 
 // The compressor: the dynamics engine behind a parameter table, with a side-chain input bus
 // (the second input bus) that can drive the detector, detector band limits, an audition of what
@@ -92,3 +92,8 @@ private:
   std::atomic<int32_t> spare_{1};
   int32_t reading_ = 2;  // audio thread
 };
+
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
+// help (beside it in this folder).
+extern const KPluginDescription kCompressorDescription;
+const KPluginHelp& KCompressorHelp();

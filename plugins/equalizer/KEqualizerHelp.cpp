@@ -1,4 +1,5 @@
 #include "plugins/KPluginHelp.h"
+#include "plugins/equalizer/KEqualizerPlugin.h"
 
 namespace {
 constexpr KParameterHelp kParameters[] = {

@@ -188,6 +188,18 @@ KEqualizerPlugin::KEqualizerPlugin() : KAudioPlugin(kParameters, kShape) {}
 
 KAudioPlugin* KEqualizerPlugin::Create(KModule*, const KPluginRecord*) { return new KEqualizerPlugin; }
 
+constinit const KPluginDescription kEqualizerDescription{
+    .key = "KEqualizerPlugin",
+    .factory = &KEqualizerPlugin::Create,
+    .moduleKey = "Equalizer",
+    .category = "EQs & Filters",
+    .name = "Equalizer",
+    .vst3SubCategories = "Fx|EQ",
+    .vst2Id = "TvEq",
+    .identity = "KEqualizerPlugin",
+    .help = &KEqualizerHelp,
+};
+
 void KEqualizerPlugin::ProcessUpdate() {
   double targets[kBandCount][5];
   DesignTargets(targets);

@@ -2,7 +2,7 @@
 
 #include "core/KAudioPlugin.h"
 #include "dsp/KFilterSection.h"
-#include "kernel/KPluginRegistry.h"
+#include "kernel/KPluginDescription.h"
 
 // An 8-band parametric equalizer: each band one filter section of any designer type, in series,
 // then an output gain.
@@ -69,3 +69,8 @@ private:
   bool jump_ = true;       // the next update lands at once (first block, reset)
   bool tidy_ = false;      // a flat band still rings: look again at the next sub-block
 };
+
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
+// help (beside it in this folder).
+extern const KPluginDescription kEqualizerDescription;
+const KPluginHelp& KEqualizerHelp();

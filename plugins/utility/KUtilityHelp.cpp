@@ -1,4 +1,5 @@
 #include "plugins/KPluginHelp.h"
+#include "plugins/utility/KUtilityPlugin.h"
 
 namespace {
 constexpr KParameterHelp kParameters[] = {

@@ -41,6 +41,18 @@ KUtilityPlugin::KUtilityPlugin() : KAudioPlugin(kParameters, kShape) {}
 
 KAudioPlugin* KUtilityPlugin::Create(KModule*, const KPluginRecord*) { return new KUtilityPlugin; }
 
+constinit const KPluginDescription kUtilityDescription{
+    .key = "KUtilityPlugin",
+    .factory = &KUtilityPlugin::Create,
+    .moduleKey = "Utility",
+    .category = "Stereo",
+    .name = "Utility",
+    .vst3SubCategories = "Fx|Tools",
+    .vst2Id = "TvUt",
+    .identity = "KUtilityPlugin",
+    .help = &KUtilityHelp,
+};
+
 void KUtilityPlugin::TargetMatrix(double (&m)[4]) const {
   auto on = [this](int32_t p) { return GetParameter(p).Working() >= 0.5; };
   const double gain = on(kMute) ? 0.0 : Linear(GetParameter(kGain).Working());

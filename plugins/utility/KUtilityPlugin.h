@@ -1,7 +1,7 @@
 #pragma once
 
 #include "core/KAudioPlugin.h"
-#include "kernel/KPluginRegistry.h"
+#include "kernel/KPluginDescription.h"
 
 // A channel utility: gain, balance, stereo width, polarity, channel swap, mono and mute.
 // Every setting becomes one 2x2 matrix from input to output; when it changes, each coefficient
@@ -31,3 +31,8 @@ private:
   int32_t glideLeft_ = 0;  // samples until current_ reaches target_
   bool jumpToTarget_ = true;
 };
+
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
+// help (beside it in this folder).
+extern const KPluginDescription kUtilityDescription;
+const KPluginHelp& KUtilityHelp();

@@ -67,6 +67,18 @@ KSampleWarmer::KSampleWarmer() : KAudioPlugin(kParameters, kPluginShape) { Confi
 
 KAudioPlugin* KSampleWarmer::Create(KModule*, const KPluginRecord*) { return new KSampleWarmer; }
 
+constinit const KPluginDescription kSampleWarmerDescription{
+    .key = "KSampleWarmer",
+    .factory = &KSampleWarmer::Create,
+    .moduleKey = "SampleWarmer",
+    .category = "Distortion",
+    .name = "SampleWarmer",
+    .vst3SubCategories = "Fx|Distortion",
+    .vst2Id = "TvSW",
+    .identity = "KSampleWarmer",
+    .help = &KSampleWarmerHelp,
+};
+
 bool KSampleWarmer::SetSampleRate(double sampleRate) {
   if (!KAudioPlugin::SetSampleRate(sampleRate)) return false;
   Configure();

@@ -4,7 +4,7 @@
 #include "dsp/KFilterSection.h"
 #include "dsp/KHalfBandOversampler.h"
 #include "dsp/KSectionRunner.h"
-#include "kernel/KPluginRegistry.h"
+#include "kernel/KPluginDescription.h"
 
 // A saturator: drive into one of three curves, run at 4 times the sample rate below 88.2 kHz and
 // at twice it above, then a tone tilt, and a dry/wet mix with an output gain.
@@ -88,3 +88,8 @@ private:
   float dry_[kChannels][kPiece] = {};
   float wet_[kChannels][kPiece] = {};
 };
+
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
+// help (beside it in this folder).
+extern const KPluginDescription kSampleWarmerDescription;
+const KPluginHelp& KSampleWarmerHelp();

@@ -1,4 +1,5 @@
 #include "plugins/KPluginHelp.h"
+#include "plugins/warmer/KSampleWarmer.h"
 
 namespace {
 constexpr KParameterHelp kParameters[] = {

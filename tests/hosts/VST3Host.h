@@ -136,19 +136,24 @@ struct KInstance {  // as a host holds it: the component and its processor and c
   }
 };
 
+// A bundle's files.
+inline std::string BundleBinaries(const std::string& name) { return TORVANE_VST3_DIR "/" + name + ".vst3/Contents/" TORVANE_VST3_ARCH "/"; }
+
 // A bundle loaded as a host loads it (module, ModuleEntry with its handle, factory), and unloaded.
+// A bundle that is missing or broken fails the test; the factory is then null.
 struct KBundle {
   void* library; IPluginFactory* factory = nullptr;
-  explicit KBundle(const std::string& name)
-      : library(KPlatform::OpenLibrary(TORVANE_VST3_DIR "/" + name + ".vst3/Contents/" TORVANE_VST3_ARCH "/" + name + ".so")) {
+  explicit KBundle(const std::string& name) : library(KPlatform::OpenLibrary(BundleBinaries(name) + name + ".so")) {
     const auto entry = reinterpret_cast<ModuleEntryFunction>(KPlatform::FindSymbol(library, "ModuleEntry"));
     const auto get = reinterpret_cast<GetPluginFactoryFunction>(KPlatform::FindSymbol(library, "GetPluginFactory"));
-    EXPECT_TRUE(library && entry && get && entry(library)) << KPlatform::LibraryError();
-    factory = get ? get() : nullptr;
+    EXPECT_TRUE(library && entry && get && entry(library)) << name << ": " << KPlatform::LibraryError();
+    factory = get && entry ? get() : nullptr;
   }
   ~KBundle() {
     if (factory) factory->Release();
-    EXPECT_TRUE(reinterpret_cast<ModuleExitFunction>(KPlatform::FindSymbol(library, "ModuleExit"))());
+    if (!library) return;
+    const auto exit = reinterpret_cast<ModuleExitFunction>(KPlatform::FindSymbol(library, "ModuleExit"));
+    EXPECT_TRUE(exit && exit());
     KPlatform::CloseLibrary(library);
   }
   FUnknown* Create() {

@@ -4,26 +4,27 @@
 #include "hosts/vst3/KVST3ClassId.h"
 #include "hosts/vst3/KVST3Parameters.h"
 #include "kernel/KEntryPoints.h"
+#include "kernel/KPluginIdentifiers.h"
 #include "plugins/utility/KUtilityPlugin.h"
 #include "tests/core/AllocationCounter.h"
 #include "tests/core/RecordingPlugin.h"
 #include "tests/hosts/VST3Host.h"
 
+#include <filesystem>
 #include <random>
 
 using namespace KVST3Test;
 
 namespace {
-// A key's bundle: the key without its "K" and without a trailing "Plugin".
-std::string BundleName(std::string key) { return key.ends_with("Plugin") ? key.substr(1, key.size() - 7) : key.substr(1); }
 ParamID Parameters(const char* key) { return static_cast<ParamID>(std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(KString::Static(key)))->ParameterCount()); }
 FUnknown* Adapt(KAudioPlugin* plugin) { return static_cast<IComponent*>(new KAudioPluginVST3Adapter(std::unique_ptr<KAudioPlugin>(plugin))); }
 }  // namespace
 
 TEST(VST3Bundles, EveryCataloguePluginHasABundleThatDescribesAndMakesIt) {
   for (const KString& key : GetTorvanePluginList()) {
-    const std::string name = BundleName(key.ToUtf8());
+    const std::string name = KPluginIds::BundleName(key.ToUtf8());
     KBundle bundle(name);
+    ASSERT_TRUE(bundle.factory) << name;
     PFactoryInfo factory{}; PClassInfoW info{};
     IPluginFactory3* factory3 = Query<IPluginFactory3>(bundle.factory);
     ASSERT_TRUE(factory3) << name;
@@ -44,6 +45,46 @@ TEST(VST3Bundles, EveryCataloguePluginHasABundleThatDescribesAndMakesIt) {
     }
     EXPECT_EQ(made.component->Terminate(), kResultOk);
   }
+}
+
+// When a host unloads the last bundle, the kernel leaves the process with it (no symbol of it pins
+// it in memory), so that a second load starts from fresh globals; and it loads again.
+TEST(VST3Bundles, TheKernelUnloadsWithTheLastBundleAndLoadsAgain) {
+  const std::string binaries = BundleBinaries("Utility");
+  for (int round = 1; round <= 2; ++round) {
+    {
+      KBundle bundle("Utility");
+      ASSERT_TRUE(bundle.factory);
+      KInstance made(bundle.Create());
+      EXPECT_TRUE(KPlatform::IsLibraryLoaded(binaries + "libtorvane.so"));
+    }
+    EXPECT_FALSE(KPlatform::IsLibraryLoaded(binaries + "libtorvane.so")) << "round " << round;
+    EXPECT_FALSE(KPlatform::IsLibraryLoaded(binaries + "Utility.so")) << "round " << round;
+  }
+}
+
+// A bundle whose name the kernel does not know (renamed by hand) loads, offers no factory and
+// says why; nothing crashes.
+TEST(VST3Bundles, ABundleOfAnUnknownNameOffersNoFactory) {
+  namespace fs = std::filesystem;
+  const fs::path folder = TORVANE_VST3_DIR "-unknown";
+  const fs::path binaries = folder / "Nope.vst3/Contents" / TORVANE_VST3_ARCH;
+  fs::create_directories(binaries);
+  fs::copy_file(BundleBinaries("Utility") + "Utility.so", binaries / "Nope.so", fs::copy_options::overwrite_existing);
+  fs::copy_file(BundleBinaries("Utility") + "libtorvane.so", binaries / "libtorvane.so", fs::copy_options::overwrite_existing);
+  void* library = KPlatform::OpenLibrary(binaries / "Nope.so");
+  ASSERT_TRUE(library) << KPlatform::LibraryError();
+  const auto entry = reinterpret_cast<ModuleEntryFunction>(KPlatform::FindSymbol(library, "ModuleEntry"));
+  const auto get = reinterpret_cast<GetPluginFactoryFunction>(KPlatform::FindSymbol(library, "GetPluginFactory"));
+  const auto exit = reinterpret_cast<ModuleExitFunction>(KPlatform::FindSymbol(library, "ModuleExit"));
+  ASSERT_TRUE(entry && get && exit);
+  EXPECT_TRUE(entry(library));
+  testing::internal::CaptureStderr();
+  EXPECT_EQ(get(), nullptr);
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "Torvane: the kernel knows no plug-in of the bundle Nope\n");
+  EXPECT_TRUE(exit());
+  KPlatform::CloseLibrary(library);
+  fs::remove_all(folder);
 }
 
 // Two bundles at once, each with its own kernel. The compressor's buses and parameters; its state

@@ -41,7 +41,7 @@ KAudioPlugin* ThrowSilent(KModule* context, const KPluginRecord*) {
 }
 KAudioPlugin* ThrowStandard(KModule*, const KPluginRecord*) { throw std::runtime_error("not for users"); }
 KAudioPlugin* CreateNothing(KModule*, const KPluginRecord*) { return nullptr; }
-const KCatalogueEntry kTestPlugins[] = {{"KSilent", ThrowSilent, nullptr, nullptr}, {"KStandard", ThrowStandard, nullptr, nullptr},
+const KPluginDescription kTestPlugins[] = {{"KSilent", ThrowSilent, nullptr, nullptr}, {"KStandard", ThrowStandard, nullptr, nullptr},
                                         {"KNothing", CreateNothing, nullptr, nullptr}};
 const KCatalogue kTestCatalogue{kTestPlugins, {}};
 }  // namespace

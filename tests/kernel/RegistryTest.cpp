@@ -73,7 +73,7 @@ TEST(KPluginRegistry, FindsExactThenWithoutTheKThenTheFirstPrefixMatch) {
 }
 
 namespace {
-const KCatalogueEntry kTestPlugins[] = {
+const KPluginDescription kTestPlugins[] = {
     {"KStereoWidth", CreateProbe, "StereoWidth", "Stereo"}, {"KCompressor", CreateProbe, "Compressor", "Dynamics"},
     {"KPipeline", CreateProbe, nullptr, nullptr},           {"KReverb", CreateProbe, "Reverb", "Reverb & Delay"},
     {"KWarmer", CreateNothing, "Warmer", "Distortion"},     {"KChorus", CreateProbe, "Chorus", "Modulation"},
@@ -86,7 +86,7 @@ const char* const kTestHosts[] = {"KPipeline", "KPipelineMini"};
 // The main registry keeps catalogue order; the module registry lists short keys by category.
 // Thousands of further plug-ins make the build last long enough for the threads to meet in it.
 TEST(KRegistries, BuiltOnceFromManyThreadsWithModulesInCategoryOrder) {
-  std::vector<KCatalogueEntry> entries(std::begin(kTestPlugins), std::end(kTestPlugins));
+  std::vector<KPluginDescription> entries(std::begin(kTestPlugins), std::end(kTestPlugins));
   std::vector<std::string> keys(20000);
   for (size_t i = 0; i < keys.size(); ++i)
     entries.push_back({(keys[i] = "KMore" + std::to_string(i)).c_str(), CreateProbe, nullptr, nullptr});

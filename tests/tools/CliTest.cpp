@@ -38,9 +38,9 @@ Audio ProcessDirectly(const char* key, const Audio& input, int32_t block, const 
 
 TEST_F(CliTest, ListsRegistryKeysInOrderAndModulesByCategory) {
   std::string keys, modules;
-  for (const KCatalogueEntry& entry : KProductCatalogue().plugins) keys += entry.key + std::string("\n");
+  for (const KPluginDescription& entry : KProductCatalogue().plugins) keys += entry.key + std::string("\n");
   for (const char* category : KRegistries::kCategories)
-    for (const KCatalogueEntry& entry : KProductCatalogue().plugins)
+    for (const KPluginDescription& entry : KProductCatalogue().plugins)
       if (entry.moduleKey && std::string(category) == entry.category) modules += std::string(category) + "\t" + entry.moduleKey + "\n";
   EXPECT_EQ(Run({"list"}).out, keys);
   EXPECT_EQ(Run({"list", "--modules"}).out, modules);

@@ -58,7 +58,7 @@ protected:
 };
 
 TEST_F(BrowserTest, EveryHelpPageLoadsCleanlyAndRenders) {
-  for (const KCatalogueEntry& entry : KProductCatalogue().plugins) {
+  for (const KPluginDescription& entry : KProductCatalogue().plugins) {
     SCOPED_TRACE(entry.key);
     const fs::path page = kFolder / (std::string(entry.key) + ".html");
     std::ofstream(page, std::ios::binary) << HelpPage(entry.key);

@@ -55,7 +55,7 @@ void DrawBoth(const char* key, double scale) {
 }
 
 TEST(HelpPicture, EveryCataloguePluginDrawsTheSameOnBothDrawers) {
-  for (const KCatalogueEntry& entry : KProductCatalogue().plugins) DrawBoth(entry.key, 1);
+  for (const KPluginDescription& entry : KProductCatalogue().plugins) DrawBoth(entry.key, 1);
   DrawBoth("KCompressorPlugin", 2);
 }
 

@@ -90,7 +90,7 @@ TEST_P(EveryPluginEditor, HasOneControlPerParameterHelpForEachAndDrawsAtEverySca
 
 std::vector<const char*> CatalogueKeys() {
   std::vector<const char*> keys;
-  for (const KCatalogueEntry& entry : KProductCatalogue().plugins) keys.push_back(entry.key);
+  for (const KPluginDescription& entry : KProductCatalogue().plugins) keys.push_back(entry.key);
   return keys;
 }
 INSTANTIATE_TEST_SUITE_P(Catalogue, EveryPluginEditor, ::testing::ValuesIn(CatalogueKeys()));

@@ -31,7 +31,7 @@ std::string FirstControl(const KString& markup) {
 
 TEST(PluginHelp, EveryParameterOfEveryCataloguePluginHasHelp) {
   ASSERT_FALSE(KProductCatalogue().plugins.empty());
-  for (const KCatalogueEntry& entry : KProductCatalogue().plugins) {
+  for (const KPluginDescription& entry : KProductCatalogue().plugins) {
     SCOPED_TRACE(entry.key);
     const auto plugin = Create(entry.key);
     ASSERT_NE(plugin, nullptr);

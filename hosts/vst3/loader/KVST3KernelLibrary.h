@@ -24,6 +24,9 @@ public:
   // The plug-in `key` as a VST 3 object with one reference, or null. Opens the library for good
   // when the host never called ModuleEntry.
   FUnknown* Create(FUnknown* context, const char* key) noexcept;
+  // The plug-in of the bundle this loader is named after, as the kernel describes it. Opens the
+  // library for good, as Create does, when the host never called ModuleEntry.
+  bool Describe(KClassDescription& description) noexcept;
 
 private:
   bool OpenLocked() noexcept;
@@ -31,6 +34,7 @@ private:
   std::mutex mutex_;
   void* library_ = nullptr;
   DispatchFunction dispatch_ = nullptr;
+  DescribeFunction describe_ = nullptr;
   int opens_ = 0;
 };
 

@@ -1,6 +1,6 @@
-// The file a host loads for one plug-in: a VST 3 module that holds no plug-in code. It finds
-// the kernel library in its own bundle and asks it for instances. The build names the plug-in:
-// TORVANE_VST3_KEY, TORVANE_VST3_NAME, TORVANE_VST3_SUBCATEGORIES, TORVANE_VST3_VERSION.
+// The file a host loads for one plug-in: a VST 3 module that holds no plug-in code. Every bundle
+// carries a copy of this one loader, named after the bundle; it finds the kernel library beside
+// it, asks it which plug-in its bundle holds, and asks it for instances of that plug-in.
 
 #include "hosts/vst3/loader/KVST3KernelLibrary.h"
 #include "hosts/vst3/loader/KVST3PluginFactory.h"
@@ -9,7 +9,7 @@
 
 namespace {
 KVST3::KKernelLibrary gKernel;
-KVST3::KPluginFactory gFactory({TORVANE_VST3_KEY, TORVANE_VST3_NAME, TORVANE_VST3_SUBCATEGORIES, TORVANE_VST3_VERSION}, gKernel);
+KVST3::KPluginFactory gFactory(gKernel);
 }  // namespace
 
 // The host's first call after loading the module.
@@ -21,7 +21,9 @@ KVST3_LOADER_EXPORT bool ModuleExit() {
   return true;
 }
 
+// Null when the kernel cannot be loaded or does not know the bundle's plug-in.
 KVST3_LOADER_EXPORT KVST3::IPluginFactory* GetPluginFactory() {
+  if (!gFactory.Describe()) return nullptr;
   gFactory.AddRef();
   return &gFactory;
 }

@@ -2,7 +2,6 @@
 
 #include <cstring>
 
-#include "hosts/vst3/KVST3ClassId.h"
 
 namespace KVST3 {
 namespace {
@@ -16,8 +15,8 @@ void Copy(const char* text, Char (&field)[N]) noexcept {
 
 // The fields every class-info record has.
 template <class Info>
-void FillBasic(Info& info, const KUID& classId, const KPluginDescription& description) noexcept {
-  classId.CopyTo(info.cid);
+void FillBasic(Info& info, const KClassDescription& description) noexcept {
+  std::memcpy(info.cid, description.classId, sizeof info.cid);
   info.cardinality = PClassInfo::kManyInstances;
   Copy(kAudioModuleClass, info.category);
   Copy(description.name, info.name);
@@ -25,18 +24,22 @@ void FillBasic(Info& info, const KUID& classId, const KPluginDescription& descri
 
 // The fields the second and third forms add (one text width each).
 template <class Info>
-void FillExtended(Info& info, const KUID& classId, const KPluginDescription& description) noexcept {
-  FillBasic(info, classId, description);
+void FillExtended(Info& info, const KClassDescription& description) noexcept {
+  FillBasic(info, description);
   info.classFlags = 0;  // processor and controller are one object: not distributable
   Copy(description.subCategories, info.subCategories);
-  Copy(KPluginFactory::kVendor, info.vendor);
+  Copy(description.vendor, info.vendor);
   Copy(description.version, info.version);
   Copy(KPluginFactory::kSdkVersion, info.sdkVersion);
 }
 }  // namespace
 
-KPluginFactory::KPluginFactory(const KPluginDescription& description, KKernelLibrary& kernel) noexcept
-    : description_(description), classId_(KClassIdOf(description.key)), kernel_(kernel) {}
+bool KPluginFactory::Describe() noexcept {
+  if (described_.load(std::memory_order_acquire)) return true;
+  std::lock_guard<std::mutex> lock(describing_);
+  if (!described_.load(std::memory_order_relaxed) && kernel_.Describe(description_)) described_.store(true, std::memory_order_release);
+  return described_.load(std::memory_order_relaxed);
+}
 
 TResult KPluginFactory::QueryInterface(const char* iid, void** object) {
   if (!object) return kInvalidArgument;
@@ -57,7 +60,7 @@ uint32_t KPluginFactory::Release() {
 
 TResult KPluginFactory::GetFactoryInfo(PFactoryInfo* info) {
   if (!info) return kInvalidArgument;
-  Copy(kVendor, info->vendor);
+  Copy(description_.vendor, info->vendor);
   Copy("", info->url);
   Copy("", info->email);
   info->flags = PFactoryInfo::kUnicode;
@@ -68,26 +71,26 @@ int32_t KPluginFactory::CountClasses() { return 1; }
 
 TResult KPluginFactory::GetClassInfo(int32_t index, PClassInfo* info) {
   if (index != 0 || !info) return kInvalidArgument;
-  FillBasic(*info, classId_, description_);
+  FillBasic(*info, description_);
   return kResultOk;
 }
 
 TResult KPluginFactory::GetClassInfo2(int32_t index, PClassInfo2* info) {
   if (index != 0 || !info) return kInvalidArgument;
-  FillExtended(*info, classId_, description_);
+  FillExtended(*info, description_);
   return kResultOk;
 }
 
 TResult KPluginFactory::GetClassInfoUnicode(int32_t index, PClassInfoW* info) {
   if (index != 0 || !info) return kInvalidArgument;
-  FillExtended(*info, classId_, description_);
+  FillExtended(*info, description_);
   return kResultOk;
 }
 
 TResult KPluginFactory::CreateInstance(FIDString classId, FIDString iid, void** object) {
   if (!object) return kInvalidArgument;
   *object = nullptr;
-  if (!classId_.Is(classId)) return kNoInterface;
+  if (!classId || std::memcmp(classId, description_.classId, sizeof description_.classId) != 0) return kNoInterface;
   FUnknown* instance = kernel_.Create(hostContext_, description_.key);
   if (!instance) return kResultFalse;
   const TResult result = instance->QueryInterface(iid, object);

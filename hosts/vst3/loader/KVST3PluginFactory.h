@@ -1,30 +1,25 @@
 #pragma once
 
 #include <atomic>
+#include <mutex>
 
 #include "hosts/vst3/KVST3Factory.h"
 #include "hosts/vst3/loader/KVST3KernelLibrary.h"
 
 namespace KVST3 {
 
-// What a loader tells its host about its one plug-in.
-struct KPluginDescription {
-  const char* key;            // the registry key, e.g. "KCompressorPlugin"
-  const char* name;           // the name hosts list, e.g. "Compressor"
-  const char* subCategories;  // e.g. "Fx|Dynamics"
-  const char* version;        // the project's version
-};
-
-// The factory of one plug-in's module: one class, vendor "Torvane", category "Audio Module
-// Class", its class identifier derived from the key (KVST3ClassId.h). Instances come from the
-// kernel library of the bundle. Lives as long as the module; the host's references are counted
-// only to let go of the host context when the last one goes.
+// The factory of one plug-in's module: one class of category "Audio Module Class", described
+// by the kernel library of the bundle (name, vendor, sub-categories, version and the class
+// identifier of KVST3ClassId.h), which also makes its instances. Lives as long as the module;
+// the host's references are counted only to let go of the host context when the last one goes.
 class KPluginFactory final : public IPluginFactory3 {
 public:
-  static constexpr const char* kVendor = "Torvane";
   static constexpr const char* kSdkVersion = "VST 3.7.0";
 
-  KPluginFactory(const KPluginDescription& description, KKernelLibrary& kernel) noexcept;
+  explicit KPluginFactory(KKernelLibrary& kernel) noexcept : kernel_(kernel) {}
+
+  // Asks the kernel for the description once; false while it cannot be had.
+  bool Describe() noexcept;
 
   TResult QueryInterface(const char* iid, void** object) override;
   uint32_t AddRef() override;
@@ -38,8 +33,9 @@ public:
   TResult SetHostContext(FUnknown* context) override;
 
 private:
-  KPluginDescription description_;
-  KUID classId_;
+  std::mutex describing_;
+  std::atomic<bool> described_{false};
+  KClassDescription description_{};
   KKernelLibrary& kernel_;
   std::atomic<uint32_t> references_{0};
   FUnknown* hostContext_ = nullptr;

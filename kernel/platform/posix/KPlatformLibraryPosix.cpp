@@ -10,6 +10,12 @@ void KPlatform::CloseLibrary(void* library) noexcept {
   if (library) ::dlclose(library);
 }
 
+bool KPlatform::IsLibraryLoaded(const std::string& path) noexcept {
+  void* library = ::dlopen(path.c_str(), RTLD_NOW | RTLD_NOLOAD);
+  if (library) ::dlclose(library);
+  return library != nullptr;
+}
+
 std::string KPlatform::LibraryPathOf(const void* address) {
   Dl_info info{};
   if (::dladdr(address, &info) == 0 || !info.dli_fname) return {};

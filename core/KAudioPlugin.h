@@ -111,6 +111,14 @@ public:
   // Tells the host, at its next idle, when the latency changed.
   void ReportLatency(int32_t samples) noexcept;
 
+  // ---- tail (any thread; derived from the parameters, not from the audio thread's state)
+  // Samples at the current rate for which the plug-in may go on producing output, or need
+  // processing to come to rest, once its input has fallen silent: how long a host must keep
+  // calling before it may stop. 0 for a plug-in without memory.
+  static constexpr uint32_t kInfiniteTail = 0xFFFFFFFFu;  // it may never end
+  // Unless a plug-in says otherwise it may ring forever: no host ever cuts it short.
+  virtual uint32_t TailSamples() const noexcept { return kInfiniteTail; }
+
   // ---- audio thread
   // Queues one MIDI message of the current host block at `sampleOffset`.
   void ScheduleMIDIEvent(int32_t sampleOffset, KMIDIBytes bytes) noexcept;

@@ -181,8 +181,12 @@ void KAudioPluginBase::ApplyOverflowValues() noexcept {
 }
 
 void KAudioPluginBase::AcceptPostedRamps() noexcept {
-  if (overflowPending_.exchange(false, std::memory_order_acq_rel)) ApplyOverflowValues();
+  if (overflowPending_.load(std::memory_order_relaxed) && overflowPending_.exchange(false, std::memory_order_acq_rel))
+    ApplyOverflowValues();
+  // Most blocks find nothing posted and nothing to give back: they take no lock at all.
+  if (!rampsPosted_.load(std::memory_order_acquire) && postedReturns_.IsEmpty()) return;
   if (!rampMutex_.try_lock()) return;
+  rampsPosted_.store(false, std::memory_order_relaxed);
   postedFree_.Splice(postedReturns_);
   while (ParameterRamp* ramp = posted_.PopFront()) {
     RetireRampsOf(ramp->parameter);
@@ -208,6 +212,7 @@ void KAudioPluginBase::PostRamp(int32_t parameter, std::span<const RampPoint> po
   if (ParameterRamp* ramp = postedFree_.PopFront()) {
     Fill(*ramp, parameter, points, fine);
     posted_.PushBack(ramp);
+    rampsPosted_.store(true, std::memory_order_release);
     return;
   }
   overflowValues_[parameter].store(points.back().value, std::memory_order_release);

@@ -56,7 +56,9 @@ public:
   // Makes the next block apply every ramp's final value at once (state load, reset).
   void RequestJump() noexcept { stateFlags_.fetch_or(kJump, std::memory_order_release); }
   // Clears the update-pending bit; answers whether it was set.
+  // Read first: most sub-blocks find nothing pending and need no locked write.
   bool TakeUpdatePending() noexcept {
+    if ((stateFlags_.load(std::memory_order_acquire) & kUpdatePending) == 0) return false;
     return (stateFlags_.fetch_and(~kUpdatePending, std::memory_order_acq_rel) & kUpdatePending) != 0;
   }
 
@@ -126,7 +128,7 @@ private:
   std::mutex rampMutex_;
   KRampList postedFree_;
   KRampList posted_;
-  // Final values that found no free posted record, one slot per parameter.
+  std::atomic<bool> rampsPosted_{false};  // posted_ may hold records: set after a push  // Final values that found no free posted record, one slot per parameter.
   std::unique_ptr<std::atomic<double>[]> overflowValues_;
   std::atomic<bool> overflowPending_{false};
 

@@ -10,12 +10,19 @@
 class KDenormalScope {
 public:
 #if defined(__SSE__) || defined(_M_X64)
-  KDenormalScope() noexcept : saved_(_mm_getcsr()) { _mm_setcsr(saved_ | kFlushToZero | kDenormalsAreZero); }
-  ~KDenormalScope() { _mm_setcsr(saved_); }
+  // Writing the control register stalls the processor: it is written only when the host's
+  // thread does not flush already (most audio threads do).
+  KDenormalScope() noexcept : saved_(_mm_getcsr()) {
+    if ((saved_ & kFlush) != kFlush) _mm_setcsr(saved_ | kFlush);
+  }
+  ~KDenormalScope() {
+    if ((saved_ & kFlush) != kFlush) _mm_setcsr(saved_);
+  }
 
 private:
   static constexpr unsigned kFlushToZero = 0x8000;
   static constexpr unsigned kDenormalsAreZero = 0x0040;
+  static constexpr unsigned kFlush = kFlushToZero | kDenormalsAreZero;
   unsigned saved_;
 #else
   KDenormalScope() noexcept = default;

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <xmmintrin.h>
+
 #include <atomic>
 #include <cmath>
 #include <cstdint>
@@ -10,9 +12,22 @@ class KLevelMeter {
 public:
   void Accumulate(const float* samples, int32_t n) noexcept {
     float peak = level_.load(std::memory_order_relaxed);
-    // Compare-and-select rather than fmax: the compiler turns it into packed maxima, and a NaN
-    // sample is skipped just the same.
-    for (int32_t i = 0; i < n; ++i) {
+    // Sixteen samples at a time in four registers, so that no compare waits for the one before.
+    // maxps answers its second operand when either is NaN: a NaN sample is skipped.
+    const __m128 sign = _mm_set1_ps(-0.0f);
+    __m128 a = _mm_set1_ps(peak), b = a, c = a, d = a;
+    int32_t i = 0;
+    for (; i + 16 <= n; i += 16) {
+      a = _mm_max_ps(_mm_andnot_ps(sign, _mm_loadu_ps(samples + i)), a);
+      b = _mm_max_ps(_mm_andnot_ps(sign, _mm_loadu_ps(samples + i + 4)), b);
+      c = _mm_max_ps(_mm_andnot_ps(sign, _mm_loadu_ps(samples + i + 8)), c);
+      d = _mm_max_ps(_mm_andnot_ps(sign, _mm_loadu_ps(samples + i + 12)), d);
+    }
+    __m128 top = _mm_max_ps(_mm_max_ps(a, b), _mm_max_ps(c, d));
+    top = _mm_max_ps(top, _mm_movehl_ps(top, top));
+    top = _mm_max_ss(top, _mm_shuffle_ps(top, top, 1));
+    peak = _mm_cvtss_f32(top);
+    for (; i < n; ++i) {
       const float magnitude = std::fabs(samples[i]);
       peak = magnitude > peak ? magnitude : peak;
     }

@@ -1,6 +1,9 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
+#include <span>
+#include <string_view>
 
 #include "core/KValueKind.h"
 
@@ -15,3 +18,12 @@ struct KParameterInfo {
   double defaultValue;  // working units
   uint32_t flags;
 };
+
+// The index of the row with `key` in a parameter table, found while compiling, so that a
+// plug-in's parameter indices come from its table and cannot drift from it. A key that is not
+// in the table stops the compilation.
+consteval int32_t KParameterRow(std::span<const KParameterInfo> table, std::string_view key) {
+  for (size_t row = 0; row < table.size(); ++row)
+    if (key == table[row].key) return static_cast<int32_t>(row);
+  throw "no parameter of this key in the table";
+}

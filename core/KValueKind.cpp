@@ -56,15 +56,34 @@ double KValueKind::Clamp(double working) const noexcept {
   return working > minimum_ ? (working < maximum_ ? working : maximum_) : minimum_;
 }
 
-// ---- linear
-double KLinearKind::ToWorking(double normalized) const noexcept {
-  return minimum_ + (maximum_ - minimum_) * Clamp01(normalized);
+// ---- curves
+double KValueKind::ToWorking(double normalized) const noexcept {
+  const double n = Clamp01(normalized), span = maximum_ - minimum_;
+  switch (curve_) {
+    case KValueCurve::kSquare: return minimum_ + span * n * n;
+    case KValueCurve::kCube: return minimum_ + span * n * n * n;
+    case KValueCurve::kLogarithmic: return minimum_ * std::pow(maximum_ / minimum_, n);
+    case KValueCurve::kWhole: return minimum_ + std::round(n * span);
+    case KValueCurve::kLinear: break;
+  }
+  return minimum_ + span * n;
 }
-double KLinearKind::ToNormalized(double working) const noexcept {
-  return maximum_ > minimum_ ? (Clamp(working) - minimum_) / (maximum_ - minimum_) : 0.0;
+double KValueKind::ToNormalized(double working) const noexcept {
+  if (!(maximum_ > minimum_)) return 0.0;
+  const double w = Clamp(working), span = maximum_ - minimum_;
+  switch (curve_) {
+    case KValueCurve::kSquare: return std::sqrt((w - minimum_) / span);
+    case KValueCurve::kCube: return std::cbrt((w - minimum_) / span);
+    case KValueCurve::kLogarithmic: return std::log(w / minimum_) / std::log(maximum_ / minimum_);
+    case KValueCurve::kWhole: return (std::round(w) - minimum_) / span;
+    case KValueCurve::kLinear: break;
+  }
+  return (w - minimum_) / span;
 }
-KString KLinearKind::ToText(double working) const { return KFormatText(KString::Static(pattern_), Clamp(working)); }
-bool KLinearKind::FromText(const KString& text, double& working) const {
+
+// ---- number
+KString KNumberKind::ToText(double working) const { return KFormatText(KString::Static(pattern_), Clamp(working)); }
+bool KNumberKind::FromText(const KString& text, double& working) const {
   double value;
   if (!ParseWithUnit(text, Unit(), value)) return false;
   working = Clamp(value);
@@ -72,13 +91,6 @@ bool KLinearKind::FromText(const KString& text, double& working) const {
 }
 
 // ---- ratio
-double KRatioKind::ToWorking(double normalized) const noexcept {
-  const double n = Clamp01(normalized);
-  return minimum_ + (maximum_ - minimum_) * n * n;
-}
-double KRatioKind::ToNormalized(double working) const noexcept {
-  return maximum_ > minimum_ ? std::sqrt((Clamp(working) - minimum_) / (maximum_ - minimum_)) : 0.0;
-}
 KString KRatioKind::ToText(double working) const { return KFormatText("{0.2} : 1", Clamp(working)); }
 bool KRatioKind::FromText(const KString& text, double& working) const {
   const std::string s = text.ToUtf8();
@@ -93,13 +105,6 @@ bool KRatioKind::FromText(const KString& text, double& working) const {
 }
 
 // ---- time
-double KTimeKind::ToWorking(double normalized) const noexcept {
-  const double n = Clamp01(normalized);
-  return minimum_ + (maximum_ - minimum_) * n * n * n;
-}
-double KTimeKind::ToNormalized(double working) const noexcept {
-  return maximum_ > minimum_ ? std::cbrt((Clamp(working) - minimum_) / (maximum_ - minimum_)) : 0.0;
-}
 KString KTimeKind::ToText(double working) const {
   const double ms = Clamp(working) * 1000.0;
   const KString pattern = ms < 10.0 ? KString("{0.2}") : (ms < 100.0 ? KString("{0.1}") : KString("{0.0}"));
@@ -117,12 +122,6 @@ bool KTimeKind::FromText(const KString& text, double& working) const {
 }
 
 // ---- frequency
-double KFrequencyKind::ToWorking(double normalized) const noexcept {
-  return minimum_ * std::pow(maximum_ / minimum_, Clamp01(normalized));
-}
-double KFrequencyKind::ToNormalized(double working) const noexcept {
-  return maximum_ > minimum_ ? std::log(Clamp(working) / minimum_) / std::log(maximum_ / minimum_) : 0.0;
-}
 KString KFrequencyKind::ToText(double working) const {
   const double hz = Clamp(working);
   return KFormatText(hz < 100.0 ? KString("{0.1}") : KString("{0.0}"), hz);
@@ -142,12 +141,6 @@ bool KFrequencyKind::FromText(const KString& text, double& working) const {
 }
 
 // ---- integer
-double KIntegerKind::ToWorking(double normalized) const noexcept {
-  return minimum_ + std::round(Clamp01(normalized) * (maximum_ - minimum_));
-}
-double KIntegerKind::ToNormalized(double working) const noexcept {
-  return maximum_ > minimum_ ? (std::round(Clamp(working)) - minimum_) / (maximum_ - minimum_) : 0.0;
-}
 KString KIntegerKind::ToText(double working) const {
   return KFormatText("{0}", static_cast<int64_t>(std::round(Clamp(working))));
 }
@@ -182,7 +175,7 @@ bool KListKind::FromText(const KString& text, double& working) const {
 KString KBalanceKind::ToText(double working) const {
   const double percent = std::round(Clamp(working));
   if (percent == 0.0) return KString("C");
-  KString text = KLinearKind::ToText(std::fabs(percent));
+  KString text = KNumberKind::ToText(std::fabs(percent));
   text.Append(percent < 0.0 ? KString(" L") : KString(" R"));
   return text;
 }

@@ -41,7 +41,7 @@ public:
     double complement = 1.0;
   };
 
-  KDynamicsProcessor() noexcept { Update(KDynamicsSettings{}); }
+  KDynamicsProcessor() noexcept;
 
   // Sizes the buffers for blocks of up to maxChannels × maxFrames (longer blocks run in pieces,
   // extra channels are left alone) and clears the detector. Not for the audio thread.
@@ -58,6 +58,11 @@ public:
   // Advances the detector through n samples of silence.
   void Decay(int32_t n) noexcept;
   void Reset() noexcept;
+  // Samples of silence after which a detector that stood at full scale (times the input gain)
+  // has released to the law's rest, where the gain no longer depends on the past: how long the
+  // engine must go on running after its input stops before the next sound finds it at rest.
+  // 0 when idle.
+  uint32_t ReleaseSamples() const noexcept;
 
   // The chosen law, for the editor's graph and meters.
   double Gain(double d) noexcept { return curve_.Gain(d); }
@@ -85,9 +90,18 @@ public:
   // Envelope and gain of every sample of the last piece processed (row 0 when linked).
   const float* EnvelopeBuffer(int32_t channel) const noexcept { return Row(envelope_, channel); }
   const float* GainBuffer(int32_t channel) const noexcept { return Row(gains_, channel); }
+  // The lowest gain of the last Process over every sample and channel, in single precision as
+  // the gain rows hold it; the total gain G when the engine is idle.
+  float LowestGain() const noexcept { return lowestGain_; }
 
 private:
   using Detector = void (*)(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
+  // The passes around the envelope, chosen once for the processor: four samples at a time with
+  // AVX, two without.
+  using SquareSumPass = void (*)(const float* const* x, int32_t channels, int32_t from, int32_t frames, double gIn,
+                                 double share, double* sums) noexcept;
+  using StoreGainsPass = float (*)(const double* gains, float* stored, int32_t frames, float lowest) noexcept;
+  using ApplyGainsPass = void (*)(const double* gains, const float* in, float* out, int32_t frames) noexcept;
 
   static void DetectLinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
   static void DetectUnlinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
@@ -103,6 +117,9 @@ private:
   Pole meanSquare_, shortAverage_, longAverage_;
   KTransferCurve curve_;
   Detector detector_ = DetectLinked;
+  SquareSumPass squareSum_;
+  StoreGainsPass storeGains_;
+  ApplyGainsPass applyGains_;
   bool idle_ = false;
   bool linked_ = true;
   bool sideChain_ = false;
@@ -115,6 +132,8 @@ private:
   int32_t channels_ = 0;  // of the last Process, for Decay
   std::vector<double> p_, e_;
   std::vector<float> envelope_, gains_, filtered_;
+  std::vector<double> work_;  // one piece's detector values, then its gains
+  float lowestGain_ = 1.0f;
   std::vector<float*> filteredRows_, pieceOut_;
   std::vector<const float*> pieceIn_, pieceDetect_;
 };

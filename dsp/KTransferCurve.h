@@ -74,6 +74,9 @@ public:
 
   // The factor to multiply the input by at detector value d.
   double Gain(double d) noexcept { return gain_(*this, d); }
+  // Gain of every detector value of a block, to the last bit as Gain gives it; two values per
+  // instruction where the law allows. `gains` may be `levels`.
+  void Gains(const double* levels, double* gains, int32_t n) noexcept { gains_(*this, levels, gains, n); }
   // The output level of the transfer graph at d: the gain law without input and output gain.
   double Curve(double d) const noexcept { return curve_(*this, d); }
 
@@ -89,17 +92,22 @@ public:
   double TotalGain() const noexcept { return g_; }  // make-up · input gain · output gain
   double InverseGain() const noexcept { return inverseG_; }
   double KneeStart() const noexcept { return s0_; }  // of the linear and soft knees
+  // The detector value at and below which the law gives the plain gain G: where a detector has
+  // come to rest as far as the output can tell. Infinite when idle (any value will do).
+  double Rest() const noexcept;
   double KneeEnd() const noexcept { return s1_; }
 
 private:
   friend struct KTransferLaws;
   using GainLaw = double (*)(KTransferCurve&, double) noexcept;
   using CurveLaw = double (*)(const KTransferCurve&, double) noexcept;
+  using GainBlock = void (*)(KTransferCurve&, const double* levels, double* gains, int32_t n) noexcept;
 
   void ShapeKnee(int32_t kneeMode, double kneeSize) noexcept;
 
   GainLaw gain_;
   CurveLaw curve_;
+  GainBlock gains_;
   Variant variant_ = kHard;
 
   double t_ = 0.0, full_ = 0.0, m_ = 1.0, b_ = 0.0;

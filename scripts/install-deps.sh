@@ -1,7 +1,8 @@
 #!/usr/bin/env bash
 # Installs every package the build, the tests and the benchmarks need (Debian 12); chromium
 # opens the exported help pages headless; Xvfb and xdotool drive editor windows in the tests.
-# With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in.
+# With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in;
+# with --peers other makers' plug-ins that the VST 3 timing host sets beside ours (bench/README.md).
 set -euo pipefail
 SUDO=""
 [ "$(id -u)" -eq 0 ] || SUDO="sudo"
@@ -13,7 +14,13 @@ packages=(ca-certificates g++ cmake ninja-build pkg-config
   libepoxy-dev libegl-dev libegl1-mesa-dev libgl1-mesa-dri libcairo2-dev
   libx11-dev xvfb xdotool
   chromium)
-[ "${1:-}" = "--hosts" ] && packages+=(ardour)
+for option in "$@"; do
+  case "$option" in
+    --hosts) packages+=(ardour) ;;
+    --peers) packages+=(zam-plugins) ;;
+    *) echo "unknown option $option" >&2; exit 2 ;;
+  esac
+done
 # Wait for another package manager run (an unattended upgrade, say) instead of failing at once.
 apt_options=(-o DPkg::Lock::Timeout=900)
 $SUDO apt-get "${apt_options[@]}" update -q

@@ -103,7 +103,7 @@ protected:
   void Process(const float* const*, float* const*, int32_t) override {}
 
 private:
-  static inline const KLinearKind kKind{0.0, 1.0, "", "{0.00}"};
+  static inline const KNumberKind kKind{0.0, 1.0, "", "{0.00}"};
   static constexpr KParameterInfo kTable[] = {{"p", "Parameter", &kKind, 0.0, KParameterInfo::kAutomatable}};
 };
 

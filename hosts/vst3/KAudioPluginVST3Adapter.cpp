@@ -194,8 +194,7 @@ TResult KAudioPluginVST3Adapter::Process(ProcessData& data) {
   });
 }
 
-// The plug-ins do not say how long they ring after the input stops: the host keeps calling.
-uint32_t KAudioPluginVST3Adapter::GetTailSamples() { return kInfiniteTail; }
+uint32_t KAudioPluginVST3Adapter::GetTailSamples() { return plugin_->TailSamples(); }
 
 uint32_t KAudioPluginVST3Adapter::GetProcessContextRequirements() {
   return kNeedProjectTimeMusic | kNeedBarPositionMusic | kNeedCycleMusic | kNeedTempo | kNeedTimeSignature | kNeedTransportState;

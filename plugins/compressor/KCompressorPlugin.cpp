@@ -8,47 +8,9 @@
 
 #include "core/Element.h"
 #include "core/KParameter.h"
+#include "dsp/KDecibels.h"
 
 namespace {
-const KDecibelKind kGainKind(-24.0, 24.0);
-const KTimeKind kAttackKind(0.00001, 1.0);
-const KTimeKind kReleaseKind(0.001, 5.0);
-const KTimeKind kRmsLengthKind(0.00001, 0.5);
-// Not down to 0: a threshold of 0 leaves no full-scale output to make up from, and "Maximize to
-// 0dB" would divide by it. 0.001 is −60 dB.
-const KLinearKind kThresholdKind(0.001, 1.0, "", "{0.3}");
-const KRatioKind kRatioKind(1.0, 20.0);
-constexpr const char* kKneeNames[] = {"Hard", "Linear", "Soft"};
-const KListKind kKneeKind(kKneeNames);
-const KLinearKind kKneeSizeKind(0.0, 1.0, "", "{0.2}");
-const KSwitchKind kSwitch;
-// The ends switch their limit off.
-const KFrequencyKind kBandLimitKind(20.0, 20000.0);
-constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
-// Where the detector listens and whether it is auditioned are routing choices made while setting
-// up, not performance moves: hosts do not automate them.
-constexpr uint32_t kRouting = 0;
-
-constexpr KParameterInfo kParameters[] = {
-    {"gain", "Gain", &kGainKind, 0.0, kAutomatable},
-    {"outputgain", "Output gain", &kGainKind, 0.0, kAutomatable},
-    {"attack", "Attack", &kAttackKind, 0.01, kAutomatable},
-    {"release", "Release", &kReleaseKind, 0.05, kAutomatable},
-    {"rmslength", "RMS length", &kRmsLengthKind, 0.001, kAutomatable},
-    {"threshold", "Threshold", &kThresholdKind, 0.5, kAutomatable},
-    {"ratio", "Ratio", &kRatioKind, 1.8, kAutomatable},
-    {"kneemode", "Knee mode", &kKneeKind, KTransferCurve::kHardKnee, kAutomatable},
-    {"kneesize", "Knee size", &kKneeSizeKind, 0.25, kAutomatable},
-    {"linkchannels", "Link channels", &kSwitch, 1.0, kAutomatable},
-    {"maximize", "Maximize to 0dB", &kSwitch, 0.0, kAutomatable},
-    {"customshape", "Custom shape", &kSwitch, 0.0, kAutomatable},
-    {"SideChainInput", "Side-chain input", &kSwitch, 0.0, kRouting},
-    {"SideChainPlay", "Side-chain play", &kSwitch, 0.0, kRouting},
-    {"SideChainMinFrequency", "Side-chain min frequency", &kBandLimitKind, 20.0, kAutomatable},
-    {"SideChainMaxFrequency", "Side-chain max frequency", &kBandLimitKind, 20000.0, kAutomatable},
-};
-static_assert(std::size(kParameters) == KCompressorPlugin::kParameterCount);
-
 // A main bus and a side-chain bus in, one bus out.
 constexpr KAudioPlugin::Shape kShape{2, 1, false, false, false};
 constexpr int32_t kMaxChannelsPerBus =
@@ -158,10 +120,9 @@ void KCompressorPlugin::TakePublishedShape() noexcept {
     reading_ = spare_.exchange(reading_, std::memory_order_acq_rel) & ~kFresh;
 }
 
-void KCompressorPlugin::ProcessUpdate() {
+KDynamicsSettings KCompressorPlugin::Settings() const noexcept {
   auto value = [this](int32_t p) { return GetParameter(p).Working(); };
   auto on = [&](int32_t p) { return value(p) >= 0.5; };
-  TakePublishedShape();
   KDynamicsSettings s;
   s.gainDb = value(kGain);
   s.outputGainDb = value(kOutputGain);
@@ -175,12 +136,27 @@ void KCompressorPlugin::ProcessUpdate() {
   s.linkChannels = on(kLinkChannels);
   s.maximize = on(kMaximize);
   s.customShape = on(kCustomShape);
-  s.shape = &shapes_[reading_];
-  s.sideChain = sideChain_ = on(kSideChainInput);
+  s.sideChain = on(kSideChainInput);
   s.sideChainFilters = true;
   s.sideChainMinFrequency = value(kSideChainMinFrequency);
   s.sideChainMaxFrequency = value(kSideChainMaxFrequency);
   s.sampleRate = SampleRate();
+  return s;
+}
+
+// The output follows the input at once (gain times input), but the detector needs its release
+// to come to rest: a host that stopped sooner would start the next sound compressed.
+uint32_t KCompressorPlugin::TailSamples() const noexcept {
+  KDynamicsProcessor engine;
+  engine.Update(Settings());
+  return engine.ReleaseSamples();
+}
+
+void KCompressorPlugin::ProcessUpdate() {
+  TakePublishedShape();
+  KDynamicsSettings s = Settings();
+  s.shape = &shapes_[reading_];
+  sideChain_ = s.sideChain;
   engine_.Update(s);
 
   KFilterSection limits[2];
@@ -188,20 +164,19 @@ void KCompressorPlugin::ProcessUpdate() {
   if (engine_.HighPassActive()) limits[count++] = engine_.HighPass();
   if (engine_.LowPassActive()) limits[count++] = engine_.LowPass();
   audition_.SetSections(limits, count);
-  render_ = on(kSideChainPlay) ? &KCompressorPlugin::Audition : &KCompressorPlugin::Compress;
-  meteredRows_ = engine_.IsIdle() ? 0 : (s.linkChannels ? 1 : ChannelsPerBus());
+  render_ = GetParameter(kSideChainPlay).Working() >= 0.5 ? &KCompressorPlugin::Audition : &KCompressorPlugin::Compress;
 }
 
 void KCompressorPlugin::ResetState() {
   engine_.Reset();
   audition_.Reset();
-  gainReduction_.store(0.0f, std::memory_order_relaxed);
+  gainReduction_.store(1.0, std::memory_order_relaxed);
 }
 
 // The first ChannelsPerBus() inputs are the main bus, the next as many the side-chain.
 void KCompressorPlugin::Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) {
   (this->*render_)(inputs, outputs, sampleCount);
-  MeterGainReduction(sampleCount);
+  MeterGainReduction();
 }
 
 void KCompressorPlugin::Compress(const float* const* inputs, float* const* outputs, int32_t n) noexcept {
@@ -225,14 +200,15 @@ void KCompressorPlugin::Audition(const float* const* inputs, float* const* outpu
   }
 }
 
-void KCompressorPlugin::MeterGainReduction(int32_t n) noexcept {
+float KCompressorPlugin::GainReductionDecibels() const noexcept {
+  const double ratio = gainReduction_.load(std::memory_order_relaxed);
+  return ratio < 1.0 ? static_cast<float>(std::max(KLinearToDecibels(ratio), -200.0)) : 0.0f;
+}
+
+void KCompressorPlugin::MeterGainReduction() noexcept {
   // Compared in single precision, as the engine stored the gains, so that no reduction reads 0.
+  // The audio thread keeps the ratio; the reader turns it into decibels.
   const auto total = static_cast<float>(engine_.Transfer().TotalGain());
-  float lowest = total;
-  for (int32_t row = 0; row < meteredRows_; ++row) {
-    const float* gains = engine_.GainBuffer(row);
-    for (int32_t i = 0; i < n; ++i) lowest = gains[i] < lowest ? gains[i] : lowest;
-  }
-  const double decibels = lowest < total ? 8.685889638065037 * std::log(static_cast<double>(lowest) / total) : 0.0;
-  gainReduction_.store(static_cast<float>(std::max(decibels, -200.0)), std::memory_order_relaxed);
+  const float lowest = engine_.LowestGain();
+  gainReduction_.store(lowest < total ? static_cast<double>(lowest) / total : 1.0, std::memory_order_relaxed);
 }

@@ -2,21 +2,20 @@
 
 #include "core/KAudioPlugin.h"
 #include "dsp/KFilterSection.h"
+#include "dsp/KSectionRunner.h"
 #include "kernel/KPluginDescription.h"
 
 // An 8-band parametric equalizer: each band one filter section of any designer type, in series,
 // then an output gain.
 //
-// No setting clicks. Every change is designed once, in ProcessUpdate, and the running sections'
-// coefficients then travel in a straight line to the new design over kGlideSeconds, sample by
-// sample; a change that arrives mid-way turns from wherever they are. Second-order sections are
-// stable exactly when (a1, a2) lies in a triangle, which is convex, so every point on the way
-// between two stable designs is stable too: frequency, gain, Q and type changes (and switching a
-// band on and off, which glides to or from a pass-through) all take the same path.
+// No setting clicks. Every change is designed once, in ProcessUpdate, and the section runner's
+// coefficients then glide in a straight line to the new design over kGlideSeconds; a change that
+// arrives mid-way turns from wherever they are. Frequency, gain, Q and type changes (and
+// switching a band on and off, which glides to or from a pass-through) all take the same path.
 //
-// Bands whose response is exactly flat (a peak or shelf at 0 dB, a switched-off band) are left
-// out of the cascade once their last ringing has died away, so a default instance costs almost
-// nothing and passes audio through bit for bit.
+// Bands whose response is exactly flat (a peak or shelf at 0 dB, a switched-off band) leave the
+// cascade once their last ringing has died away, so a default instance costs almost nothing and
+// passes audio through bit for bit.
 class KEqualizerPlugin final : public KAudioPlugin {
 public:
   static constexpr int32_t kBandCount = 8;
@@ -27,21 +26,6 @@ public:
   static constexpr int32_t Index(int32_t band, BandField field) noexcept { return band * kFieldCount + field; }
   static constexpr double kGlideSeconds = 0.01;
 
-  // Coefficients of every band in the designer's order (b0, −a1, b1, −a2, b2), and their state.
-  struct Bands {
-    static constexpr int32_t kChannels = 2;
-    double current[kBandCount][5];
-    double target[kBandCount][5];
-    double step[kBandCount][5];
-    double state[kBandCount][2][kChannels];  // transposed direct form II, channels side by side
-    int32_t engaged[kBandCount];             // the bands in the cascade, in band order
-    int32_t engagedCount;
-    double gain, gainTarget, gainStep;  // output gain, linear
-  };
-  // Runs the engaged bands and the output gain over a block; the gliding kind also moves every
-  // coefficient by its step before each sample.
-  using Kernel = void (*)(Bands& bands, const float* const* inputs, float* const* outputs, int32_t frames) noexcept;
-
   KEqualizerPlugin();
   static KAudioPlugin* Create(KModule* context, const KPluginRecord* record);
 
@@ -49,25 +33,21 @@ public:
   // Frequencies above 0.499 of the sample rate are designed at that limit.
   const KFilterSection& BandDesign(int32_t band) const noexcept { return designs_[band]; }
 
+  uint32_t TailSamples() const noexcept override;
+
 protected:
   void ProcessUpdate() override;
   void Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) override;
   void ResetState() override;
 
 private:
-  void DesignTargets(double (&targets)[kBandCount][5]) noexcept;
-  void Glide(const double (&targets)[kBandCount][5], double gain) noexcept;
-  void Engage() noexcept;
-  void Land() noexcept;
-  void Settle() noexcept;
+  // Every band's design from the parameters, and the coefficients it runs with (a pass-through
+  // when switched off).
+  void Design(KSectionRunner::Row (&targets)[kBandCount], KFilterSection (&designs)[kBandCount]) const noexcept;
 
   KFilterSection designs_[kBandCount];
-  Bands bands_{};
-  Kernel steady_ = nullptr;
-  Kernel gliding_ = nullptr;
-  int32_t glideLeft_ = 0;  // samples until every coefficient reaches its target
-  bool jump_ = true;       // the next update lands at once (first block, reset)
-  bool tidy_ = false;      // a flat band still rings: look again at the next sub-block
+  KSectionRunner bands_;  // band b at position b, then the output gain
+  bool jump_ = true;      // the next update lands at once (first block, reset)
 };
 
 // What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its

@@ -2,33 +2,14 @@
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
 
 #include "core/KParameter.h"
+#include "dsp/KDecibels.h"
 
 namespace {
-const KDecibelKind kGainKind(-60.0, 24.0);
-const KBalanceKind kBalanceKind;
-const KLinearKind kWidthKind(0.0, 200.0, "%", "{0.0}");
-const KSwitchKind kSwitch;
-constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
-
-constexpr KParameterInfo kParameters[] = {
-    {"gain", "Gain", &kGainKind, 0.0, kAutomatable},
-    {"balance", "Balance", &kBalanceKind, 0.0, kAutomatable},
-    {"width", "Width", &kWidthKind, 100.0, kAutomatable},
-    {"invertleft", "Invert left", &kSwitch, 0.0, kAutomatable},
-    {"invertright", "Invert right", &kSwitch, 0.0, kAutomatable},
-    {"swap", "Swap channels", &kSwitch, 0.0, kAutomatable},
-    {"mono", "Mono", &kSwitch, 0.0, kAutomatable},
-    {"mute", "Mute", &kSwitch, 0.0, kAutomatable},
-};
-static_assert(std::size(kParameters) == KUtilityPlugin::kParameterCount);
-
 constexpr KAudioPlugin::Shape kShape{1, 1, false, false, false};
 constexpr double kQuarterTurn = 1.5707963267948966;
-
-// dB to a linear factor.
-double Linear(double decibels) { return std::exp(0.11512925464970228 * decibels); }
 
 void Multiply(double (&m)[4], const double (&by)[4]) {  // m = by x m
   const double r[4] = {by[0] * m[0] + by[1] * m[2], by[0] * m[1] + by[1] * m[3], by[2] * m[0] + by[3] * m[2],
@@ -55,7 +36,7 @@ constinit const KPluginDescription kUtilityDescription{
 
 void KUtilityPlugin::TargetMatrix(double (&m)[4]) const {
   auto on = [this](int32_t p) { return GetParameter(p).Working() >= 0.5; };
-  const double gain = on(kMute) ? 0.0 : Linear(GetParameter(kGain).Working());
+  const double gain = on(kMute) ? 0.0 : KDecibelsToLinear(GetParameter(kGain).Working());
   // Polarity acts on the inputs: it repairs a miswired channel, so it must come before any mix.
   m[0] = on(kInvertLeft) ? -gain : gain;
   m[1] = m[2] = 0.0;
@@ -74,49 +55,45 @@ void KUtilityPlugin::TargetMatrix(double (&m)[4]) const {
 }
 
 void KUtilityPlugin::ProcessUpdate() {
-  TargetMatrix(target_);
-  if (jumpToTarget_) {
-    std::copy(std::begin(target_), std::end(target_), std::begin(current_));
-    glideLeft_ = 0;
-    jumpToTarget_ = false;
-    return;
-  }
-  glideLeft_ = std::max(1, static_cast<int32_t>(SampleRate() * kGlideSeconds));
-  for (int k = 0; k < 4; ++k) step_[k] = (target_[k] - current_[k]) / glideLeft_;
+  double target[4];
+  TargetMatrix(target);
+  matrix_.Aim(target, static_cast<int32_t>(SampleRate() * kGlideSeconds), std::exchange(jumpToTarget_, false));
 }
 
 void KUtilityPlugin::ResetState() { jumpToTarget_ = true; }
 
+// Gliding, each matrix entry takes its step before the sample; then the rest of the block at rest.
 void KUtilityPlugin::Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) {
-  const int32_t gliding = std::min(glideLeft_, sampleCount);
+  const int32_t gliding = std::min(matrix_.left, sampleCount);
+  const double* step = matrix_.step;
+  double a = matrix_.value[0], b = matrix_.value[1], c = matrix_.value[2], d = matrix_.value[3];
   if (ChannelsPerBus() == 1) {
     const float* in = inputs[0];
     float* out = outputs[0];
-    double g = current_[0];
-    for (int32_t i = 0; i < gliding; ++i, g += step_[0]) out[i] = static_cast<float>(in[i] * g);
-    current_[0] = gliding == glideLeft_ ? target_[0] : g;
-    for (int32_t i = gliding; i < sampleCount; ++i) out[i] = static_cast<float>(in[i] * current_[0]);
-  } else {
-    const float* inL = inputs[0];
-    const float* inR = inputs[1];
-    float* outL = outputs[0];
-    float* outR = outputs[1];
-    double a = current_[0], b = current_[1], c = current_[2], d = current_[3];
-    for (int32_t i = 0; i < gliding; ++i) {
-      const double l = inL[i], r = inR[i];
-      outL[i] = static_cast<float>(a * l + b * r);
-      outR[i] = static_cast<float>(c * l + d * r);
-      a += step_[0], b += step_[1], c += step_[2], d += step_[3];
-    }
-    if (gliding == glideLeft_) {
-      a = target_[0], b = target_[1], c = target_[2], d = target_[3];
-    }
-    current_[0] = a, current_[1] = b, current_[2] = c, current_[3] = d;
-    for (int32_t i = gliding; i < sampleCount; ++i) {
-      const double l = inL[i], r = inR[i];
-      outL[i] = static_cast<float>(a * l + b * r);
-      outR[i] = static_cast<float>(c * l + d * r);
-    }
+    for (int32_t i = 0; i < gliding; ++i) out[i] = static_cast<float>(in[i] * (a += step[0]));
+    matrix_.value[0] = a;
+    matrix_.Passed(gliding);
+    a = matrix_.value[0];
+    for (int32_t i = gliding; i < sampleCount; ++i) out[i] = static_cast<float>(in[i] * a);
+    return;
   }
-  glideLeft_ -= gliding;
+  const float* inL = inputs[0];
+  const float* inR = inputs[1];
+  float* outL = outputs[0];
+  float* outR = outputs[1];
+  for (int32_t i = 0; i < gliding; ++i) {
+    a += step[0], b += step[1], c += step[2], d += step[3];
+    const double l = inL[i], r = inR[i];
+    outL[i] = static_cast<float>(a * l + b * r);
+    outR[i] = static_cast<float>(c * l + d * r);
+  }
+  const double reached[4] = {a, b, c, d};
+  std::copy_n(reached, 4, matrix_.value);
+  matrix_.Passed(gliding);
+  a = matrix_.value[0], b = matrix_.value[1], c = matrix_.value[2], d = matrix_.value[3];
+  for (int32_t i = gliding; i < sampleCount; ++i) {
+    const double l = inL[i], r = inR[i];
+    outL[i] = static_cast<float>(a * l + b * r);
+    outR[i] = static_cast<float>(c * l + d * r);
+  }
 }

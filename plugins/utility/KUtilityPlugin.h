@@ -1,6 +1,10 @@
 #pragma once
 
+#include <iterator>
+
 #include "core/KAudioPlugin.h"
+#include "core/KParameterInfo.h"
+#include "dsp/KGlide.h"
 #include "kernel/KPluginDescription.h"
 
 // A channel utility: gain, balance, stereo width, polarity, channel swap, mono and mute.
@@ -8,12 +12,40 @@
 // glides to its new value over a few milliseconds, so no setting ever clicks. The signal runs
 // polarity (on the input channels), swap, width, then balance and gain.
 class KUtilityPlugin final : public KAudioPlugin {
+  static inline const KDecibelKind kGainKind{-60.0, 24.0};
+  static inline const KBalanceKind kBalanceKind{};
+  static inline const KNumberKind kWidthKind{0.0, 200.0, "%", "{0.0}"};
+  static inline const KSwitchKind kSwitch{};
+  static constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
+
 public:
-  enum ParameterIndex : int32_t { kGain, kBalance, kWidth, kInvertLeft, kInvertRight, kSwap, kMono, kMute, kParameterCount };
+  // The parameter table; each index below is its key's row.
+  static constexpr KParameterInfo kParameters[] = {
+      {"gain", "Gain", &kGainKind, 0.0, kAutomatable},
+      {"balance", "Balance", &kBalanceKind, 0.0, kAutomatable},
+      {"width", "Width", &kWidthKind, 100.0, kAutomatable},
+      {"invertleft", "Invert left", &kSwitch, 0.0, kAutomatable},
+      {"invertright", "Invert right", &kSwitch, 0.0, kAutomatable},
+      {"swap", "Swap channels", &kSwitch, 0.0, kAutomatable},
+      {"mono", "Mono", &kSwitch, 0.0, kAutomatable},
+      {"mute", "Mute", &kSwitch, 0.0, kAutomatable},
+  };
+  static constexpr int32_t kGain = KParameterRow(kParameters, "gain");
+  static constexpr int32_t kBalance = KParameterRow(kParameters, "balance");
+  static constexpr int32_t kWidth = KParameterRow(kParameters, "width");
+  static constexpr int32_t kInvertLeft = KParameterRow(kParameters, "invertleft");
+  static constexpr int32_t kInvertRight = KParameterRow(kParameters, "invertright");
+  static constexpr int32_t kSwap = KParameterRow(kParameters, "swap");
+  static constexpr int32_t kMono = KParameterRow(kParameters, "mono");
+  static constexpr int32_t kMute = KParameterRow(kParameters, "mute");
+  static constexpr int32_t kParameterCount = static_cast<int32_t>(std::size(kParameters));
   static constexpr double kGlideSeconds = 0.005;
 
   KUtilityPlugin();
   static KAudioPlugin* Create(KModule* context, const KPluginRecord* record);
+
+  // Output is a matrix times the input of the same sample: nothing rings.
+  uint32_t TailSamples() const noexcept override { return 0; }
 
 protected:
   void ProcessUpdate() override;
@@ -25,10 +57,7 @@ private:
   void TargetMatrix(double (&m)[4]) const;
 
   // Output = matrix x input: left = m[0]·L + m[1]·R, right = m[2]·L + m[3]·R.
-  double current_[4] = {1.0, 0.0, 0.0, 1.0};
-  double target_[4] = {1.0, 0.0, 0.0, 1.0};
-  double step_[4] = {};
-  int32_t glideLeft_ = 0;  // samples until current_ reaches target_
+  KGlide<4> matrix_;
   bool jumpToTarget_ = true;
 };
 

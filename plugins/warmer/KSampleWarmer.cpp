@@ -2,29 +2,12 @@
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
 
 #include "core/KParameter.h"
+#include "dsp/KDecibels.h"
 
 namespace {
-constexpr const char* kShapeNames[] = {"Soft clip", "Tanh", "Tube"};
-static_assert(std::size(kShapeNames) == KSampleWarmer::kShapeCount);
-
-const KDecibelKind kDriveKind(0.0, 36.0);
-const KListKind kShapeKind(kShapeNames);
-const KLinearKind kToneKind(-100.0, 100.0, "%", "{0.0}");
-const KDecibelKind kOutputKind(-24.0, 12.0);
-const KLinearKind kMixKind(0.0, 100.0, "%", "{0.0}");
-constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
-
-constexpr KParameterInfo kParameters[] = {
-    {"drive", "Drive", &kDriveKind, 6.0, kAutomatable},
-    {"shape", "Shape", &kShapeKind, KSampleWarmer::kTube, kAutomatable},
-    {"tone", "Tone", &kToneKind, 0.0, kAutomatable},
-    {"outputgain", "Output gain", &kOutputKind, 0.0, kAutomatable},
-    {"mix", "Dry/wet", &kMixKind, 100.0, kAutomatable},
-};
-static_assert(std::size(kParameters) == KSampleWarmer::kParameterCount);
-
 constexpr KAudioPlugin::Shape kPluginShape{1, 1, false, false, false};
 
 // A gentle slope: the tilt's shelves blend over several octaves about the pivot.
@@ -32,8 +15,6 @@ constexpr double kTiltQ = 0.5;
 // The tube curve's bias: the positive half saturates sooner than the negative one, which adds
 // even harmonics and a level-dependent DC offset (removed behind the curve).
 constexpr double kTubeBias = 0.25;
-
-double Linear(double decibels) { return std::exp(0.11512925464970228 * decibels); }
 
 // x − 4x³/27 up to |x| = 1.5, where it meets ±1 with zero slope.
 void SoftClip(double* samples, int32_t count) noexcept {
@@ -109,43 +90,41 @@ void KSampleWarmer::ResetState() {
   jump_ = true;
 }
 
-void KSampleWarmer::Glide::Aim(double to, int32_t samples, bool jump) noexcept {
-  target = to;
-  if (jump) {
-    value = to;
-    left = 0;
-  } else {
-    left = samples;
-    step = (to - value) / samples;
-  }
-}
-
-void KSampleWarmer::Glide::Fill(double* values, int32_t count) noexcept {
-  const int32_t gliding = std::min(left, count);
-  for (int32_t i = 0; i < gliding; ++i) values[i] = value += step;
-  left -= gliding;
-  if (left == 0) value = target;  // no rounding drift past the glide
-  std::fill(values + gliding, values + count, value);
-}
-
 void KSampleWarmer::ProcessUpdate() {
   const double rate = SampleRate();
-  const int32_t glide = std::max(1, static_cast<int32_t>(rate * kGlideSeconds));
-  drive_.Aim(Linear(GetParameter(kDrive).Working()), glide, jump_);
-  output_.Aim(Linear(GetParameter(kOutputGain).Working()), glide, jump_);
-  mix_.Aim(GetParameter(kMix).Working() / 100.0, glide, jump_);
-  jump_ = false;
+  const double targets[kGlides] = {KDecibelsToLinear(GetParameter(kDrive).Working()),
+                                    KDecibelsToLinear(GetParameter(kOutputGain).Working()),
+                                    GetParameter(kMix).Working() / 100.0};
+  glides_.Aim(targets, static_cast<int32_t>(rate * kGlideSeconds), std::exchange(jump_, false));
 
-  const int32_t shape = static_cast<int32_t>(std::lround(GetParameter(kShape).Working()));
-  curve_ = CurveOf(shape);
+  curve_ = CurveOf(static_cast<int32_t>(std::lround(GetParameter(kShape).Working())));
+  filters_.SetSections(sections_, DesignFilters(sections_));
+}
+
+int32_t KSampleWarmer::DesignFilters(KFilterSection (&sections)[3]) const noexcept {
+  const double rate = SampleRate();
   // At very low rates the pivot stays well below the Nyquist frequency.
   const double pivot = std::min(kTiltHz, 0.25 * rate);
   const double tilt = kTiltDb * GetParameter(kTone).Working() / 100.0;
-  sections_[0].Design(KFilterSection::kLowShelf, -tilt, pivot, rate, kTiltQ);
-  sections_[1].Design(KFilterSection::kHighShelf, tilt, pivot, rate, kTiltQ);
-  sections_[2].Design(KFilterSection::kBilinearHighPass, 0.0, kDCBlockerHz, rate, 1.0);
+  sections[0].Design(KFilterSection::kLowShelf, -tilt, pivot, rate, kTiltQ);
+  sections[1].Design(KFilterSection::kHighShelf, tilt, pivot, rate, kTiltQ);
+  sections[2].Design(KFilterSection::kBilinearHighPass, 0.0, kDCBlockerHz, rate, 1.0);
   // Only the asymmetric curve makes DC; the others keep their low end untouched.
-  filters_.SetSections(sections_, shape == kTube ? 3 : 2);
+  return std::lround(GetParameter(kShape).Working()) == kTube ? 3 : 2;
+}
+
+// The dry path's delay, the oversampler's filters on the way up and down (each about as long
+// as the latency), then the tilt and the DC blocker ringing out to −140 dB.
+uint32_t KSampleWarmer::TailSamples() const noexcept {
+  KFilterSection sections[3];
+  const int32_t count = DesignFilters(sections);
+  KSectionRunner::Row rows[3];
+  for (int32_t j = 0; j < count; ++j) {
+    const double row[5] = {sections[j].b0, sections[j].minusA1, sections[j].b1, sections[j].minusA2, sections[j].b2};
+    std::copy_n(row, 5, rows[j]);
+  }
+  const uint32_t ring = KSectionRunner::RingSamples(rows, count, 1e-7);
+  return ring == UINT32_MAX ? ring : ring + 2u * static_cast<uint32_t>(KHalfBandOversampler::LatencyFor(OversamplingFor(SampleRate())));
 }
 
 void KSampleWarmer::Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) {
@@ -163,9 +142,10 @@ void KSampleWarmer::Process(const float* const* inputs, float* const* outputs, i
 
 void KSampleWarmer::ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels,
                                  int32_t frames) noexcept {
-  drive_.Fill(driveGain_, frames);
-  output_.Fill(outputGain_, frames);
-  mix_.Fill(wetShare_, frames);
+  glides_.Fill(kDriveGlide, driveGain_, frames);
+  glides_.Fill(kOutputGlide, outputGain_, frames);
+  glides_.Fill(kMixGlide, wetShare_, frames);
+  glides_.Passed(frames);
   const int32_t factor = oversamplers_[0].Factor();
   constexpr int32_t kMask = kDelaySize - 1;
 

@@ -1,7 +1,11 @@
 #pragma once
 
+#include <iterator>
+
 #include "core/KAudioPlugin.h"
+#include "core/KParameterInfo.h"
 #include "dsp/KFilterSection.h"
+#include "dsp/KGlide.h"
 #include "dsp/KHalfBandOversampler.h"
 #include "dsp/KSectionRunner.h"
 #include "kernel/KPluginDescription.h"
@@ -20,8 +24,33 @@
 // reaches a filter's state, and silence decays to exact zero.
 class KSampleWarmer final : public KAudioPlugin {
 public:
-  enum ParameterIndex : int32_t { kDrive, kShape, kTone, kOutputGain, kMix, kParameterCount };
   enum ShapeChoice : int32_t { kSoftClip, kTanh, kTube, kShapeCount };
+
+private:
+  static constexpr const char* kShapeNames[] = {"Soft clip", "Tanh", "Tube"};
+  static_assert(std::size(kShapeNames) == kShapeCount);
+  static inline const KDecibelKind kDriveKind{0.0, 36.0};
+  static inline const KListKind kShapeKind{kShapeNames};
+  static inline const KNumberKind kToneKind{-100.0, 100.0, "%", "{0.0}"};
+  static inline const KDecibelKind kOutputKind{-24.0, 12.0};
+  static inline const KNumberKind kMixKind{0.0, 100.0, "%", "{0.0}"};
+  static constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
+
+public:
+  // The parameter table; each index below is its key's row.
+  static constexpr KParameterInfo kParameters[] = {
+      {"drive", "Drive", &kDriveKind, 6.0, kAutomatable},
+      {"shape", "Shape", &kShapeKind, kTube, kAutomatable},
+      {"tone", "Tone", &kToneKind, 0.0, kAutomatable},
+      {"outputgain", "Output gain", &kOutputKind, 0.0, kAutomatable},
+      {"mix", "Dry/wet", &kMixKind, 100.0, kAutomatable},
+  };
+  static constexpr int32_t kDrive = KParameterRow(kParameters, "drive");
+  static constexpr int32_t kShape = KParameterRow(kParameters, "shape");
+  static constexpr int32_t kTone = KParameterRow(kParameters, "tone");
+  static constexpr int32_t kOutputGain = KParameterRow(kParameters, "outputgain");
+  static constexpr int32_t kMix = KParameterRow(kParameters, "mix");
+  static constexpr int32_t kParameterCount = static_cast<int32_t>(std::size(kParameters));
   static constexpr double kGlideSeconds = 0.005;
   // The tilt pivots about kTiltHz; full tone lifts one end and lowers the other by kTiltDb.
   static constexpr double kTiltHz = 1000.0;
@@ -38,6 +67,7 @@ public:
   static KAudioPlugin* Create(KModule* context, const KPluginRecord* record);
 
   bool SetSampleRate(double sampleRate) override;
+  uint32_t TailSamples() const noexcept override;
 
 protected:
   void ProcessUpdate() override;
@@ -53,19 +83,13 @@ private:
   static constexpr int32_t kDelaySize = 128;
   static_assert(kDelaySize > KHalfBandOversampler::LatencyFor(kMaxFactor));
 
-  // A linear glide towards a target, one step per sample.
-  struct Glide {
-    double value = 0.0;
-    double target = 0.0;
-    double step = 0.0;
-    int32_t left = 0;
-    void Aim(double to, int32_t samples, bool jump) noexcept;
-    // The values of the next `count` samples.
-    void Fill(double* values, int32_t count) noexcept;
-  };
+  // Drive and output gain (linear) and the wet share, gliding together.
+  enum GlideLane : int32_t { kDriveGlide, kOutputGlide, kMixGlide, kGlides };
 
   // Sets the oversampling factor and the latency for the current sample rate; clears state.
   void Configure() noexcept;
+  // The tilt's shelves and the DC blocker as the parameters ask for them; answers how many run.
+  int32_t DesignFilters(KFilterSection (&sections)[3]) const noexcept;
   void ClearDelay() noexcept;
   void ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels, int32_t frames) noexcept;
 
@@ -73,7 +97,7 @@ private:
   KFilterSection sections_[3];  // low shelf and high shelf of the tilt, then the DC blocker
   KSectionRunner filters_;
   Curve curve_ = nullptr;
-  Glide drive_, output_, mix_;
+  KGlide<kGlides> glides_;
   bool jump_ = true;  // the next update lands at once (first block, reset)
   int32_t latency_ = 0;  // base-rate samples
   int32_t delayAt_ = 0;

@@ -4,6 +4,7 @@
 
 #include "core/KAudioPluginBase.h"
 #include "core/KParameter.h"
+#include "core/KParameterInfo.h"
 
 namespace {
 const KDecibelKind kGain(-60.0, 24.0);
@@ -29,3 +30,11 @@ TEST(Parameter, OnlyARealChangeMarksTheUpdatePending) {
   EXPECT_TRUE(plugin.TakeUpdatePending());
   EXPECT_DOUBLE_EQ(gain.Normalized(), 0.25);
 }
+
+// A parameter's index is its key's row, found while compiling (a key not in the table would not
+// compile), so a plug-in's indices cannot drift from its table.
+namespace {
+const KSwitchKind kRowSwitch;
+constexpr KParameterInfo kRows[] = {{"first", "First", &kRowSwitch, 0.0, 0}, {"second", "Second", &kRowSwitch, 1.0, 0}};
+static_assert(KParameterRow(kRows, "first") == 0 && KParameterRow(kRows, "second") == 1);
+}  // namespace

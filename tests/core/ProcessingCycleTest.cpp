@@ -1,6 +1,10 @@
 #include <gmock/gmock.h>
 
+#include <cmath>
 #include <utility>
+#include <vector>
+
+#include "core/KLevelMeter.h"
 
 #include "core/KChannelMode.h"
 #include "tests/core/RecordingPlugin.h"
@@ -136,3 +140,23 @@ TEST_F(ProcessingCycleTest, DenormalsAreFlushedInsideProcessAndTheCallersModeIsR
   EXPECT_EQ(after, saved & ~kFlushBits);
 }
 #endif
+
+// The peak of every length (the vector loop and its scalar end), NaN samples skipped, and the
+// peak held across calls.
+TEST(KLevelMeter, PeakOfAnyLengthSkipsNaN) {
+  for (int32_t n : {0, 1, 15, 16, 17, 64, 100}) {
+    std::vector<float> samples(static_cast<size_t>(n));
+    for (int32_t i = 0; i < n; ++i) samples[static_cast<size_t>(i)] = (i % 3 == 0 ? -1.0f : 0.5f) * static_cast<float>(i) / 128.0f;
+    if (n > 5) samples[5] = NAN;
+    KLevelMeter meter;
+    meter.Accumulate(samples.data(), n);
+    float peak = 0.0f;  // the plain way
+    for (float v : samples) peak = std::abs(v) > peak ? std::abs(v) : peak;
+    EXPECT_EQ(meter.Level(), peak) << n;
+    const float louder = 2.0f, quieter = 0.0f;
+    meter.Accumulate(&quieter, 1);
+    EXPECT_EQ(meter.Level(), peak) << n;
+    meter.Accumulate(&louder, 1);
+    EXPECT_EQ(meter.Level(), 2.0f) << n;
+  }
+}

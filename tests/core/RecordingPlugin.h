@@ -94,7 +94,7 @@ protected:
 
 private:
   static std::span<const KParameterInfo> Table(int32_t count) {
-    static const KLinearKind kind(0.0, 1.0, "", "{0.000}");
+    static const KNumberKind kind(0.0, 1.0, "", "{0.000}");
     static const std::vector<KParameterInfo> table(160, {"p", "Parameter", &kind, 0.0, KParameterInfo::kAutomatable});
     return {table.data(), static_cast<size_t>(count)};
   }

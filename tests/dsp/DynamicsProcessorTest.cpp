@@ -4,6 +4,7 @@
 #include <cmath>
 #include <cstdint>
 #include <random>
+#include <tuple>
 #include <vector>
 
 #include "dsp/KDynamicsProcessor.h"
@@ -128,4 +129,50 @@ TEST(DynamicsProcessor, NaNOrInfinitySpoilsOnlyItsOwnBlockAndChannel) {
     EXPECT_TRUE(hit.Level(0) == 0.0 && (link || hit.Level(1) == clean.Level(1))) << variant;
     EXPECT_EQ(hit.Run(Noise(2, 64, 7))[0], fresh.Run(Noise(2, 64, 7))[0]) << variant;
   }
+}
+
+// The lowest gain is the least of every gain row (as float), linked or not; idle it is G.
+TEST(DynamicsProcessor, LowestGainIsTheLeastOfTheGainRows) {
+  for (bool link : {true, false}) {
+    KDynamicsSettings s;
+    s.linkChannels = link, s.threshold = 0.3, s.ratio = 5.0, s.gainDb = 6.0, s.sampleRate = kRate;
+    Engine engine(s);
+    Channels x = Noise(2, 999, 4);  // odd: every pass has a scalar end
+    for (size_t i = 0; i < 999; ++i) x[1][i] *= i < 500 ? 0.1f : 1.0f;
+    engine.Run(x);
+    float lowest = float(engine.Transfer().TotalGain());
+    for (int32_t row = 0; row < (link ? 1 : 2); ++row)
+      for (int32_t i = 0; i < 999; ++i) lowest = std::min(lowest, engine.GainBuffer(row)[i]);
+    EXPECT_EQ(engine.LowestGain(), lowest) << link;
+    EXPECT_LT(engine.LowestGain(), 0.9f * float(engine.Transfer().TotalGain()));
+  }
+  KDynamicsSettings idle;
+  idle.ratio = 1.0, idle.outputGainDb = -6.0;
+  Engine plain(idle);
+  plain.Run(Noise(2, 100, 1));
+  EXPECT_EQ(plain.LowestGain(), float(plain.Transfer().TotalGain()));
+}
+
+// After full scale, ReleaseSamples of silence bring the envelope to the law's rest, not much
+// sooner than that; idle needs none.
+TEST(DynamicsProcessor, ReleaseSamplesBringTheDetectorToRest) {
+  for (auto [release, rms, gainDb] : {std::tuple{0.05, 0.001, 0.0}, {0.5, 0.02, 12.0}, {0.001, 0.3, -6.0}}) {
+    KDynamicsSettings s;
+    s.release = release, s.rmsLength = rms, s.gainDb = gainDb, s.threshold = 0.4, s.ratio = 3.0;
+    s.kneeMode = KTransferCurve::kSoftKnee, s.sampleRate = kRate;
+    Engine engine(s, 2, 4800);
+    const uint32_t tail = engine.ReleaseSamples();
+    engine.Run(Constant(2, 48000, 1.0f));
+    double level = engine.Level(0);
+    uint32_t rested = 0;
+    for (; level > engine.Transfer().Rest() && rested < 10 * tail + 48000; rested += 48) {
+      engine.Run(Constant(2, 48, 0.0f));
+      level = engine.Level(0);
+    }
+    EXPECT_LE(rested, tail + 48) << release;
+    EXPECT_GT(rested * 3, tail) << release;
+  }
+  KDynamicsSettings idle;
+  idle.ratio = 1.0;
+  EXPECT_EQ(Engine(idle).ReleaseSamples(), 0u);
 }

@@ -66,3 +66,46 @@ TEST(TransferShape, WalkingSearchAndCustomGain) {
   KTransferCurve curve = Make(kSoft, true, {.customShape = true, .shape = &shape, .inputGain = 2.0});
   for (double a = 0.02; a < 5.0; a += 0.01) EXPECT_NEAR(curve.Gain(a * a) * a * a / 2.0, std::pow(shape[linear(a)].At(a), 2), 1e-12) << a;
 }
+
+// The block law is the per-level law to the last bit, for every variant, across every region of
+// the knee, for odd lengths (the scalar tail) and NaN.
+TEST(TransferCurve, BlockGainsEqualTheLawLevelByLevel) {
+  KTransferShape shape;
+  const KTransferShape::Point points[] = {{0.0, 0.0}, {0.3, 0.35}, {1.0, 0.7}};
+  shape.SetPoints(points, 3);
+  std::vector<double> levels;
+  for (double d = 0.0; d < 1.6; d += 0.0037) levels.push_back(d);
+  levels.push_back(NAN);
+  levels.push_back(0.25);
+  for (int32_t knee : {KTransferCurve::kHardKnee, KTransferCurve::kLinearKnee, KTransferCurve::kSoftKnee}) {
+    for (bool custom : {false, true}) {
+      for (double ratio : {1.0, 3.0}) {
+        KTransferCurve curve, single;
+        const KTransferCurve::Settings settings{0.5, ratio, knee, 0.4, true, custom, &shape, 1.3, 0.8};
+        curve.Configure(settings);
+        single.Configure(settings);
+        for (size_t n : {levels.size(), levels.size() - 1, size_t{3}}) {
+          std::vector<double> gains(n);
+          curve.Gains(levels.data(), gains.data(), int32_t(n));
+          for (size_t i = 0; i < n; ++i) {
+            const double expected = single.Gain(levels[i]);
+            ASSERT_TRUE(gains[i] == expected || (std::isnan(gains[i]) && std::isnan(expected))) << knee << custom << ratio << " " << levels[i];
+          }
+        }
+      }
+    }
+  }
+}
+
+// Below Rest the gain is the plain G; just above it it is not (idle: everything is rest).
+TEST(TransferCurve, RestIsWhereTheGainStopsDependingOnTheLevel) {
+  for (int32_t knee : {KTransferCurve::kHardKnee, KTransferCurve::kSoftKnee}) {
+    KTransferCurve curve;
+    curve.Configure({0.5, 4.0, knee, 0.5, false, false, nullptr, 1.0, 1.0});
+    EXPECT_EQ(curve.Gain(curve.Rest()), curve.TotalGain());
+    EXPECT_LT(curve.Gain(curve.Rest() * 1.01), curve.TotalGain());
+  }
+  KTransferCurve idle;
+  idle.Configure({0.5, 1.0, KTransferCurve::kHardKnee, 0.0, false, false, nullptr, 1.0, 1.0});
+  EXPECT_TRUE(std::isinf(idle.Rest()));
+}

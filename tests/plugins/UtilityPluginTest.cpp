@@ -48,7 +48,7 @@ float LargestStep(const Channels& c) {
 class UtilityTest : public ::testing::Test {
 protected:
   UtilityTest() { EXPECT_TRUE(plugin.SetSampleRate(kRate)); }
-  void Set(U::ParameterIndex p, double working) { plugin.GetParameter(p).SetWorking(working); }
+  void Set(int32_t p, double working) { plugin.GetParameter(p).SetWorking(working); }
   U plugin;
 };
 }  // namespace
@@ -57,7 +57,7 @@ protected:
 // set before the first block hold from its first sample, whether or not the host works in place.
 TEST_F(UtilityTest, SettingsMixTheChannelsFromTheFirstSample) {
   const struct {
-    std::vector<std::pair<U::ParameterIndex, double>> settings;
+    std::vector<std::pair<int32_t, double>> settings;
     double a, b, c, d, tolerance;
   } rows[] = {
       {{}, 1, 0, 0, 1, 0},                                                  // defaults: unchanged

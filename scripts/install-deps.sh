@@ -1,7 +1,8 @@
 #!/usr/bin/env bash
 # Installs every package the build, the tests and the benchmarks need (Debian 12); chromium
-# opens the exported help pages headless; the LV2 headers, validator (sordi) and command-line
-# hosts (lilv-utils, lv2file) build and test the LV2 bundles.
+# opens the exported help pages headless; Xvfb and xdotool drive editor windows in the tests;
+# the LV2 headers, validator (sordi) and command-line hosts (lilv-utils, lv2file) build and test
+# the LV2 bundles.
 # With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in;
 # with --peers other makers' plug-ins that the VST 3 timing host and the LV2 comparison set
 # beside ours (bench/README.md, bench/lv2_peers.sh).
@@ -14,6 +15,7 @@ packages=(ca-certificates g++ cmake ninja-build pkg-config
   clang libclang-rt-14-dev
   libpng-dev libwebp-dev libfreetype-dev fonts-dejavu-core fonts-dejavu-extra
   libepoxy-dev libegl-dev libegl1-mesa-dev libgl1-mesa-dri libcairo2-dev
+  libx11-dev xvfb xauth xdotool
   chromium lv2-dev sordi lilv-utils lv2file)
 for option in "$@"; do
   case "$option" in

@@ -1,11 +1,13 @@
 #include "hosts/vst3/KAudioPluginVST3Adapter.h"
 
+#include <cstring>
 #include <string>
 #include <utility>
 
 #include "hosts/common/KHostGuard.h"
 #include "hosts/vst3/KVST3ChannelContext.h"
 #include "hosts/vst3/KVST3ClassId.h"
+#include "hosts/vst3/KVST3Editor.h"
 #include "hosts/vst3/KVST3MIDIOutput.h"
 #include "hosts/vst3/KVST3ProcessInput.h"
 #include "hosts/vst3/KVST3Util.h"
@@ -252,7 +254,12 @@ TResult KAudioPluginVST3Adapter::SetComponentHandler(IComponentHandler* handler)
   return kResultOk;
 }
 
-IPlugView* KAudioPluginVST3Adapter::CreateView(FIDString) { return nullptr; }
+IPlugView* KAudioPluginVST3Adapter::CreateView(FIDString name) {
+  return KHostGuarded("KAudioPluginVST3Adapter::createView", static_cast<IPlugView*>(nullptr), [&]() -> IPlugView* {
+    if (!name || std::strcmp(name, "editor") != 0) return nullptr;
+    return new KEditor(*this);
+  });
+}
 
 // ---- IEditController2
 

@@ -49,7 +49,7 @@ protected:
 // and the channel the host puts the plug-in on (KVST3ChannelContext). What every host format
 // shares (the method guard, transport rules, ramps from host points, echo recognition, channel
 // mapping, MIDI lists, the state text) lives in hosts/common.
-// No editor yet: CreateView answers none, and help and the about box are not offered.
+// The editor is a view of its own (KVST3Editor); help and the about box are not offered.
 //
 // Every method the host calls is guarded: a KException gives the neutral answer, anything else
 // is traced as "SYSTEM EXCEPTION! KAudioPluginVST3Adapter::<Method>" and gives it too.
@@ -72,6 +72,8 @@ public:
   ~KAudioPluginVST3Adapter() override;
 
   // ---- FUnknown, IPluginBase
+  class KEditor;
+
   TResult QueryInterface(const char* iid, void** object) override;
   uint32_t AddRef() override;
   uint32_t Release() override;

@@ -50,6 +50,16 @@ protected:
   ~IPlugFrame() = default;
 };
 
+// The host's display scale for a view (1 for 100 %, 2 for 200 %).
+class IPlugViewContentScaleSupport : public FUnknown {
+public:
+  static constexpr KUID kIID = KUID::FromWords(0x65ED9690, 0x8AC44525, 0x8AADEF7A, 0x72EA703F);
+  virtual TResult SetContentScaleFactor(float factor) = 0;
+
+protected:
+  ~IPlugViewContentScaleSupport() = default;
+};
+
 class IEventHandler : public FUnknown {
 public:
   static constexpr KUID kIID = KUID::FromWords(0x561E65C9, 0x13A0496F, 0x813A2C35, 0x654D7983);

@@ -43,6 +43,7 @@ constexpr KCommand kCommands[] = {
      "  or delete it.\n",
      KRunPresets},
     {"help", kHelpUsage, KRunHelp},
+    {"snapshot", kSnapshotUsage, KRunSnapshot},
 };
 }  // namespace
 

@@ -19,3 +19,5 @@ int KRunState(std::span<char* const> words);
 int KRunPresets(std::span<char* const> words);
 extern const char kHelpUsage[];
 int KRunHelp(std::span<char* const> words);
+extern const char kSnapshotUsage[];
+int KRunSnapshot(std::span<char* const> words);

@@ -1,0 +1,225 @@
+// The editor as a VST 3 host shows it, in a real X11 window (the tests run under Xvfb): attached
+// to the host's window, served only by the host's run loop, painted as the offline snapshot
+// paints it, driven by the mouse and keys through xdotool, resized to 200 %, closed and opened
+// again.
+#include <unistd.h>
+
+#include <cstdlib>
+#include <string>
+
+#include "hosts/vst3/KVST3View.h"
+#include "kernel/KEntryPoints.h"
+#include "plugins/KPluginEditors.h"
+#include "tests/hosts/VST3Host.h"
+#include "tests/ui/EditorTestSupport.h"
+#include "ui/controls/KLevelMeterControl.h"
+#include "ui/controls/KValueControl.h"
+// Last: X11's macros (None, Bool, Status) would break the headers above.
+#include <X11/Xlib.h>
+#include <X11/Xutil.h>
+
+using namespace KVST3Test;
+
+namespace {
+
+// The host's frame and run loop in one: it keeps the handlers the view registers and runs them
+// when the test pumps, as a host's loop would.
+struct KFrame final : KHostObject<IPlugFrame, IRunLoop> {
+  IEventHandler* handler = nullptr;
+  ITimerHandler* timer = nullptr;
+  int descriptor = -1;
+  std::vector<ViewRect> resizes;
+  TResult ResizeView(IPlugView* view, ViewRect* size) override {
+    resizes.push_back(*size);
+    return view->OnSize(size);  // a host that agrees sets the new size at once
+  }
+  TResult RegisterEventHandler(IEventHandler* h, int fd) override { return handler = h, descriptor = fd, kResultOk; }
+  TResult UnregisterEventHandler(IEventHandler* h) override { return handler = handler == h ? nullptr : handler, kResultOk; }
+  TResult RegisterTimer(ITimerHandler* h, uint64_t) override { return timer = h, kResultOk; }
+  TResult UnregisterTimer(ITimerHandler* h) override { return timer = timer == h ? nullptr : timer, kResultOk; }
+  void Pump(int rounds = 10) {
+    for (int i = 0; i < rounds; ++i) {
+      usleep(15000);
+      if (handler) handler->OnFDIsSet(descriptor);
+      if (timer) timer->OnTimer();
+    }
+  }
+};
+
+bool Shell(const std::string& command) { return std::system(command.c_str()) == 0; }
+
+struct EditorWindowFixture : ::testing::Test {
+  Display* display = XOpenDisplay(nullptr);
+  Window parent = 0;
+  KHost host;
+  KFrame frame;
+
+  void SetUp() override {
+    if (!display) GTEST_SKIP() << "no X display (the test runs under xvfb-run)";
+    if (!Shell("command -v xdotool > /dev/null")) GTEST_SKIP() << "xdotool is missing";
+    parent = XCreateSimpleWindow(display, DefaultRootWindow(display), 0, 0, 1800, 1200, 0, 0, 0x202020);
+    XMapWindow(display, parent);
+    XSync(display, False);
+  }
+  void TearDown() override {
+    if (!display) return;
+    if (parent) XDestroyWindow(display, parent);
+    XCloseDisplay(display);
+  }
+  // The view's window: the one child of the host's window.
+  Window Child() {
+    XSync(display, False);
+    Window root = 0, up = 0, *children = nullptr;
+    unsigned int count = 0;
+    XQueryTree(display, parent, &root, &up, &children, &count);
+    const Window child = count == 1 ? children[0] : 0;
+    if (children) XFree(children);
+    return child;
+  }
+  int32_t ChildCount() {
+    Window root = 0, up = 0, *children = nullptr;
+    unsigned int count = 0;
+    XQueryTree(display, parent, &root, &up, &children, &count);
+    if (children) XFree(children);
+    return static_cast<int32_t>(count);
+  }
+  KBitmap Screenshot(Window window, int32_t width, int32_t height) {
+    XImage* image = XGetImage(display, window, 0, 0, static_cast<unsigned>(width), static_cast<unsigned>(height), AllPlanes, ZPixmap);
+    KBitmap picture(width, height);
+    for (int32_t y = 0; y < height; ++y)
+      for (int32_t x = 0; x < width; ++x) picture.Row(y)[x] = 0xFF000000u | static_cast<uint32_t>(XGetPixel(image, x, y));
+    XDestroyImage(image);
+    return picture;
+  }
+  // Pixels further apart than the drawers' tolerance in any channel.
+  // Within `area` (pixels; the whole picture when empty).
+  static int64_t Differences(const KBitmap& a, const KBitmap& b, KRect area = {}) {
+    if (a.Width() != b.Width() || a.Height() != b.Height()) return -1;
+    if (area.IsEmpty()) area = a.Bounds();
+    int64_t beyond = 0;
+    for (int32_t y = area.top; y <= area.bottom; ++y)
+      for (int32_t x = area.left; x <= area.right; ++x)
+        for (int shift = 0; shift < 24; shift += 8)
+          if (std::abs(int((a.Pixel(x, y) >> shift) & 0xFF) - int((b.Pixel(x, y) >> shift) & 0xFF)) > 2) {
+            ++beyond;
+            break;
+          }
+    return beyond;
+  }
+};
+
+TEST_F(EditorWindowFixture, TheViewLivesInTheHostsWindowAndAnswersMouseKeysAndScale) {
+  KBundle bundle("Utility");
+  KInstance instance(bundle.Create());
+  instance.Start(host);
+  IPlugView* view = instance.controller->CreateView("editor");
+  ASSERT_NE(view, nullptr);
+  EXPECT_EQ(view->IsPlatformTypeSupported(kPlatformTypeX11EmbedWindowID), kResultTrue);
+  EXPECT_EQ(view->IsPlatformTypeSupported(kPlatformTypeHWND), kResultFalse);
+  EXPECT_EQ(view->Attached(reinterpret_cast<void*>(parent), kPlatformTypeHWND), kResultFalse);
+  ViewRect size{};
+  ASSERT_EQ(view->GetSize(&size), kResultOk);
+  ASSERT_EQ(view->SetFrame(&frame) | view->Attached(reinterpret_cast<void*>(parent), kPlatformTypeX11EmbedWindowID), kResultOk);
+  ASSERT_NE(frame.handler, nullptr);
+  ASSERT_NE(frame.timer, nullptr);
+  frame.Pump();
+  const Window child = Child();
+  ASSERT_NE(child, 0u);
+
+  // The same picture as the snapshot made without a host.
+  const std::unique_ptr<KAudioPlugin> offline(CreateTorvanePlugin(KString("KUtilityPlugin")));
+  const KBitmap expected = KBitmap::Decode(KPluginEditorSnapshotPNG(*offline, 1, false), "snapshot");
+  ASSERT_EQ(expected.Width(), size.right - size.left);
+  EXPECT_EQ(Differences(Screenshot(child, size.right, size.bottom), expected), 0);
+
+  // Where the width knob lies, from the same generated layout.
+  const std::unique_ptr<KEditor> layout = KMakePluginEditor(*offline, nullptr);
+  const int32_t width = offline->FindParameter(KString("width"))->Index();
+  KKnob* knob = KFindControl<KKnob>(layout->Tree().Root(), [&](KKnob& k) { return k.Link().Index() == width; });
+  ASSERT_NE(knob, nullptr);
+  const KPoint at = KCentreOf(*knob);
+  const double start = instance.controller->GetParamNormalized(static_cast<ParamID>(width));
+  const std::string w = std::to_string(child);
+  ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y) + " mousedown 1"));
+  for (int dy = 10; dy <= 40; dy += 10)
+    ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y + dy)));
+  ASSERT_TRUE(Shell("xdotool mouseup 1"));
+  frame.Pump();
+  const double dragged = instance.controller->GetParamNormalized(static_cast<ParamID>(width));
+  EXPECT_NEAR(dragged, start - 40 / KValueControl::kDragTravel, 1e-9);
+  std::string kinds;
+  for (const auto& [kind, id, value] : host.edits)
+    if (id == static_cast<ParamID>(width)) kinds += kind;
+  EXPECT_GE(kinds.size(), 3u);
+  EXPECT_EQ(kinds.front(), 'b');
+  EXPECT_EQ(kinds.back(), 'e');
+  EXPECT_EQ(kinds.substr(1, kinds.size() - 2), std::string(kinds.size() - 2, 'p'));
+
+  // F1 over the knob: the help card in the middle of the window (white paper).
+  ASSERT_TRUE(Shell("xdotool key F1"));
+  frame.Pump();
+  const KBitmap help = Screenshot(child, size.right, size.bottom);
+  EXPECT_EQ(help.Pixel(size.right / 2, size.bottom / 2 + 30) & 0xFFFFFF, 0xFFFFFFu);
+  ASSERT_TRUE(Shell("xdotool key Escape"));
+  frame.Pump();
+
+  // Ctrl+Z takes the drag back, and the host hears of it.
+  host.edits.clear();
+  ASSERT_TRUE(Shell("xdotool key ctrl+z"));
+  frame.Pump();
+  EXPECT_DOUBLE_EQ(instance.controller->GetParamNormalized(static_cast<ParamID>(width)), start);
+  ASSERT_FALSE(host.edits.empty());
+  EXPECT_EQ(std::get<0>(host.edits.front()), 'b');
+
+  // Host automation while the editor is open: the knob follows the processed value and looks
+  // as the offline editor draws that value (the meters, lit by the audio, are left out).
+  KBlock block(1, 1);
+  block.Change(static_cast<ParamID>(width), {{0, 0.25}});
+  ASSERT_EQ(instance.processor->Process(block.data), kResultOk);
+  frame.Pump();
+  EXPECT_DOUBLE_EQ(instance.controller->GetParamNormalized(static_cast<ParamID>(width)), 0.25);
+  offline->GetParameter(width).SetNormalized(0.25);
+  const KBitmap automated = KBitmap::Decode(KPluginEditorSnapshotPNG(*offline, 1, false), "snapshot");
+  EXPECT_EQ(Differences(Screenshot(child, size.right, size.bottom), automated, knob->Bounds()), 0);
+
+  // 200 %: the host is asked for twice the size and the window shows the sharp picture.
+  auto* scaling = Query<IPlugViewContentScaleSupport>(view);
+  ASSERT_NE(scaling, nullptr);
+  EXPECT_EQ(scaling->SetContentScaleFactor(2.0f), kResultOk);
+  scaling->Release();
+  ASSERT_EQ(frame.resizes.size(), 1u);
+  EXPECT_EQ(frame.resizes[0].right, 2 * size.right);
+  EXPECT_EQ(frame.resizes[0].bottom, 2 * size.bottom);
+  frame.Pump();
+  ViewRect large{};
+  view->GetSize(&large);
+  EXPECT_EQ(large.right, 2 * size.right);
+  const KBitmap expectedLarge = KBitmap::Decode(KPluginEditorSnapshotPNG(*offline, 2, false), "snapshot");
+  // Below the title bar (its redo button is lit by this session's history) and left of the meters
+  // (lit by the audio).
+  const KLevelMeterControl* meter = KFindControl<KLevelMeterControl>(layout->Tree().Root(), [](auto&) { return true; });
+  ASSERT_NE(meter, nullptr);
+  EXPECT_EQ(Differences(Screenshot(child, large.right, large.bottom), expectedLarge,
+                        KRect{0, 2 * KEditor::kHeaderHeight, 2 * meter->Bounds().left - 1, large.bottom - 1}),
+            0);
+
+  // Closed and opened again: the window goes with the view, the handlers are given back.
+  EXPECT_EQ(view->Removed(), kResultOk);
+  EXPECT_EQ(frame.handler, nullptr);
+  EXPECT_EQ(frame.timer, nullptr);
+  view->Release();
+  XSync(display, False);
+  EXPECT_EQ(ChildCount(), 0);
+  for (int round = 0; round < 3; ++round) {
+    IPlugView* again = instance.controller->CreateView("editor");
+    ASSERT_NE(again, nullptr);
+    ASSERT_EQ(again->SetFrame(&frame) | again->Attached(reinterpret_cast<void*>(parent), kPlatformTypeX11EmbedWindowID), kResultOk);
+    frame.Pump(2);
+    EXPECT_EQ(ChildCount(), 1);
+    EXPECT_EQ(again->Removed(), kResultOk);
+    again->Release();
+  }
+  instance.Stop();
+}
+
+}  // namespace

@@ -1,0 +1,198 @@
+// The editor of every catalogue plug-in, generated from its parameter table: a control for every
+// parameter, help on F1 over each, pictures at every scale, undo and redo through the keys, the
+// size asked of the host, and the plug-ins' own graphs.
+#include <gtest/gtest.h>
+
+#include <set>
+#include <string>
+
+#include "kernel/KCatalogue.h"
+#include "plugins/KPluginEditors.h"
+#include "tests/ui/DrawerTestSupport.h"
+#include "tests/ui/EditorTestSupport.h"
+#include "ui/KHelpTexts.h"
+#include "ui/controls/KButtons.h"
+#include "ui/controls/KGraphs.h"
+#include "ui/controls/KValueControl.h"
+#include "ui/editor/KHelpPanel.h"
+#include "plugins/compressor/KCompressorPlugin.h"
+
+namespace {
+
+// Controls that edit a parameter, by the parameter's key.
+void CollectEditing(KControl& control, std::multiset<std::string>& keys) {
+  const bool edits = dynamic_cast<KValueControl*>(&control) || dynamic_cast<KSwitch*>(&control) || dynamic_cast<KDropDown*>(&control);
+  if (edits) keys.insert(control.HelpKey().ToUtf8());
+  for (int32_t i = 0; i < control.ChildCount(); ++i) CollectEditing(control.Child(i), keys);
+}
+
+// Distinct colours in a picture, counted up to a limit.
+size_t ColourCount(const KBitmap& picture) {
+  std::set<KColor> colours;
+  for (int32_t y = 0; y < picture.Height() && colours.size() < 64; y += 3)
+    for (int32_t x = 0; x < picture.Width(); x += 3) colours.insert(picture.Pixel(x, y));
+  return colours.size();
+}
+
+class EveryPluginEditor : public ::testing::TestWithParam<const char*> {};
+
+TEST_P(EveryPluginEditor, HasOneControlPerParameterHelpForEachAndDrawsAtEveryScale) {
+  const std::unique_ptr<KAudioPlugin> plugin = KMakeCataloguePlugin(GetParam());
+  KRecordingEditorHost host;
+  const std::unique_ptr<KEditor> editor = KMakePluginEditor(*plugin, &host);
+  std::multiset<std::string> keys;
+  CollectEditing(editor->Tree().Root(), keys);
+  ASSERT_EQ(keys.size(), size_t(plugin->ParameterCount()));
+  for (int32_t i = 0; i < plugin->ParameterCount(); ++i) EXPECT_EQ(keys.count(plugin->GetParameter(i).Key().ToUtf8()), 1u) << i;
+
+  // Every control lies inside the window, and no two editing controls overlap.
+  std::vector<KRect> placed;
+  std::function<void(KControl&)> walk = [&](KControl& c) {
+    const KRect& r = c.Bounds();
+    EXPECT_TRUE(r.left >= 0 && r.top >= 0 && r.right < editor->Width() && r.bottom < editor->Height()) << c.HelpKey().ToUtf8();
+    if (dynamic_cast<KValueControl*>(&c) || dynamic_cast<KSwitch*>(&c) || dynamic_cast<KDropDown*>(&c)) {
+      for (const KRect& other : placed) EXPECT_FALSE(KIntersects(other, r)) << c.HelpKey().ToUtf8();
+      placed.push_back(r);
+    }
+    for (int32_t i = 0; i < c.ChildCount(); ++i) walk(c.Child(i));
+  };
+  walk(editor->Tree().Root());
+
+  // F1 over each knob shows that parameter's own help.
+  for (int32_t i = 0; i < plugin->ParameterCount(); ++i) {
+    const KString key = plugin->GetParameter(i).Key();
+    KControl* control = KFindControl<KControl>(editor->Tree().Root(), [&](KControl& c) {
+      return c.HelpKey() == key && (dynamic_cast<KValueControl*>(&c) || dynamic_cast<KSwitch*>(&c) || dynamic_cast<KDropDown*>(&c));
+    });
+    ASSERT_NE(control, nullptr);
+    editor->Tree().MouseMove({KCentreOf(*control)});
+    ASSERT_TRUE(editor->Tree().Key({kKeyF1, 0}));
+    auto* help = dynamic_cast<KHelpPanel*>(editor->Tree().Focused());
+    ASSERT_NE(help, nullptr) << key.ToUtf8();
+    EXPECT_EQ(help->Markup(), KPluginEditorHelp(*plugin, key));
+    EXPECT_EQ(help->Markup().ToUtf8().find(KHelpTexts::kNoHelp), std::string::npos) << key.ToUtf8();
+    editor->Tree().Key({kKeyEscape, 0});  // any key closes it
+    EXPECT_EQ(editor->Tree().Focused(), nullptr);
+  }
+
+  const KBitmap normal = editor->Render();
+  EXPECT_EQ(normal.Width(), editor->Width());
+  EXPECT_GT(ColourCount(normal), 20u);
+  ASSERT_TRUE(editor->SetScale(2));
+  EXPECT_EQ(host.width, 2 * editor->Width());
+  EXPECT_EQ(host.height, 2 * editor->Height());
+  const KBitmap large = editor->Render();
+  EXPECT_EQ(large.Width(), 2 * normal.Width());
+  EXPECT_EQ(large.Height(), 2 * normal.Height());
+  normal.Store(KPicturePath(std::string("editor_") + GetParam() + ".png"));
+  large.Store(KPicturePath(std::string("editor_") + GetParam() + "_x2.png"));
+}
+
+std::vector<const char*> CatalogueKeys() {
+  std::vector<const char*> keys;
+  for (const KPluginDescription& entry : KProductCatalogue().plugins) keys.push_back(entry.key);
+  return keys;
+}
+INSTANTIATE_TEST_SUITE_P(Catalogue, EveryPluginEditor, ::testing::ValuesIn(CatalogueKeys()));
+
+TEST(PluginEditor, CtrlZAndCtrlYUndoAndRedoAndTellTheHostWhatMoved) {
+  const std::unique_ptr<KAudioPlugin> plugin = KMakeCataloguePlugin("KUtilityPlugin");
+  KRecordingEditorHost host;
+  const std::unique_ptr<KEditor> editor = KMakePluginEditor(*plugin, &host);
+  const int32_t width = plugin->FindParameter(KString("width"))->Index();
+  KKnob* knob = KFindControl<KKnob>(editor->Tree().Root(), [&](KKnob& k) { return k.Link().Index() == width; });
+  ASSERT_NE(knob, nullptr);
+  const double start = plugin->GetParameter(width).Normalized();
+  editor->Tree().MouseDown({KCentreOf(*knob)}, 1000);
+  editor->Tree().MouseMove({{KCentreOf(*knob).x, KCentreOf(*knob).y + 30}});
+  editor->Tree().MouseUp({{KCentreOf(*knob).x, KCentreOf(*knob).y + 30}});
+  const double dragged = plugin->GetParameter(width).Normalized();
+  ASSERT_LT(dragged, start);
+  host.calls.clear();
+  EXPECT_TRUE(editor->Tree().Key({'z', kModControl}));
+  EXPECT_DOUBLE_EQ(plugin->GetParameter(width).Normalized(), start);
+  ASSERT_EQ(host.KindsOf(width), "bve");
+  EXPECT_DOUBLE_EQ(host.calls[1].value, start);
+  EXPECT_TRUE(editor->Tree().Key({'y', kModControl}));
+  EXPECT_DOUBLE_EQ(plugin->GetParameter(width).Normalized(), dragged);
+  // The buttons follow the history at the next tick.
+  KButton* redo = KFindControl<KButton>(editor->Tree().Root(), [](KButton& b) { return b.Caption() == KString("Redo"); });
+  ASSERT_NE(redo, nullptr);
+  editor->Tree().Tick();
+  EXPECT_FALSE(redo->IsEnabled());
+  editor->Undo();
+  editor->Tree().Tick();
+  EXPECT_TRUE(redo->IsEnabled());
+}
+
+TEST(PluginEditor, AHostThatRefusesASizeKeepsTheEditorAsItWas) {
+  const std::unique_ptr<KAudioPlugin> plugin = KMakeCataloguePlugin("KUtilityPlugin");
+  KRecordingEditorHost host;
+  host.acceptResize = false;
+  const std::unique_ptr<KEditor> editor = KMakePluginEditor(*plugin, &host);
+  EXPECT_FALSE(editor->SetScale(1.5));
+  EXPECT_EQ(editor->Scale(), 1);
+  EXPECT_EQ(editor->PixelWidth(), editor->Width());
+  const std::unique_ptr<KEditor> alone = KMakePluginEditor(*plugin, nullptr);
+  EXPECT_TRUE(alone->SetScale(1.5));
+  EXPECT_EQ(alone->PixelWidth(), static_cast<int32_t>(std::lround(alone->Width() * 1.5)));
+}
+
+TEST(PluginEditor, EqualizerNodesDragFrequencyAndGainInOneGestureEach) {
+  const std::unique_ptr<KAudioPlugin> plugin = KMakeCataloguePlugin("KEqualizerPlugin");
+  KRecordingEditorHost host;
+  const std::unique_ptr<KEditor> editor = KMakePluginEditor(*plugin, &host);
+  KResponseGraph* graph = KFindControl<KResponseGraph>(editor->Tree().Root(), [](KResponseGraph&) { return true; });
+  ASSERT_NE(graph, nullptr);
+  const KPointF node = graph->NodePosition(3);
+  const KPoint at{static_cast<int32_t>(node.x), static_cast<int32_t>(node.y)};
+  const int32_t freq = plugin->FindParameter(KString("band4freq"))->Index();
+  const int32_t gain = plugin->FindParameter(KString("band4gain"))->Index();
+  const double hz = plugin->GetParameter(freq).Working();
+  editor->Tree().MouseDown({at}, 1000);
+  editor->Tree().MouseMove({{at.x + 40, at.y - 30}});
+  editor->Tree().MouseUp({{at.x + 40, at.y - 30}});
+  EXPECT_GT(plugin->GetParameter(freq).Working(), hz);
+  EXPECT_GT(plugin->GetParameter(gain).Working(), 0);
+  EXPECT_EQ(host.KindsOf(freq), "bve");
+  EXPECT_EQ(host.KindsOf(gain), "bve");
+  // The summed response follows: the graph asks for a repaint and its curve rises.
+  editor->Tree().Tick();
+  EXPECT_TRUE(graph->IsDirty());
+  editor->Render();
+  const std::vector<double>& curve = graph->Curve();
+  ASSERT_EQ(curve.size(), size_t(KGraph::kSamples));
+  EXPECT_GT(*std::max_element(curve.begin(), curve.end()), 1.0);
+}
+
+TEST(PluginEditor, CompressorCustomShapePointsDragOnlyWhileTheShapeIsOnAndUndoAsOneStep) {
+  const std::unique_ptr<KAudioPlugin> plugin = KMakeCataloguePlugin("KCompressorPlugin");
+  auto& compressor = static_cast<KCompressorPlugin&>(*plugin);
+  const std::unique_ptr<KEditor> editor = KMakePluginEditor(*plugin, nullptr);
+  KTransferGraph* graph = KFindControl<KTransferGraph>(editor->Tree().Root(), [](KTransferGraph&) { return true; });
+  ASSERT_NE(graph, nullptr);
+  const std::vector<KCompressorPlugin::Point> before = compressor.CustomShape();
+  ASSERT_GE(before.size(), 3u);
+  // Where the middle point lies on the graph: -60..0 dB across and up the plot.
+  const KRect plot = KInset(graph->Bounds(), 1);
+  const auto pixel = [&](const KCompressorPlugin::Point& p) {
+    const double x = 20 * std::log10(p.level), y = 20 * std::log10(p.output);
+    return KPoint{static_cast<int32_t>(std::lround(plot.left + (x + 60) / 60 * (plot.right - plot.left))),
+                  static_cast<int32_t>(std::lround(plot.top + -y / 60 * (plot.bottom - plot.top)))};
+  };
+  const KPoint at = pixel(before[1]);
+  EXPECT_FALSE(editor->Tree().MouseDown({at}, 1000));  // the shape is off: nothing to drag
+  editor->Tree().MouseUp({at});
+  plugin->GetParameter(KCompressorPlugin::kCustomShape).SetNormalized(1);
+  ASSERT_TRUE(editor->Tree().MouseDown({at}, 5000));
+  editor->Tree().MouseMove({{at.x, at.y - 25}});
+  editor->Tree().MouseUp({{at.x, at.y - 25}});
+  const std::vector<KCompressorPlugin::Point> after = compressor.CustomShape();
+  ASSERT_EQ(after.size(), before.size());
+  EXPECT_GT(after[1].output, before[1].output);
+  EXPECT_DOUBLE_EQ(after[0].output, before[0].output);
+  editor->Undo();
+  EXPECT_NEAR(compressor.CustomShape()[1].output, before[1].output, 1e-9);
+}
+
+}  // namespace

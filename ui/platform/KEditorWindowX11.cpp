@@ -1,0 +1,161 @@
+#include "ui/platform/KEditorWindowX11.h"
+
+#include <X11/Xlib.h>
+#include <X11/Xutil.h>
+#include <X11/keysym.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cmath>
+
+#include "kernel/KException.h"
+#include "ui/KDrawerToKBitmap.h"
+#include "ui/editor/KEditor.h"
+
+namespace {
+
+uint32_t ModifiersOf(unsigned int state) noexcept {
+  return ((state & ShiftMask) ? kModShift : 0) | ((state & ControlMask) ? kModControl : 0) | ((state & Mod1Mask) ? kModAlt : 0);
+}
+
+int32_t KeyOf(KeySym symbol) noexcept {
+  switch (symbol) {
+    case XK_F1: return kKeyF1;
+    case XK_Return: case XK_KP_Enter: return kKeyReturn;
+    case XK_Escape: return kKeyEscape;
+    case XK_BackSpace: return kKeyBackspace;
+    case XK_Tab: return kKeyTab;
+    case XK_Delete: return kKeyDelete;
+    case XK_Left: return kKeyLeft;
+    case XK_Right: return kKeyRight;
+    case XK_Up: return kKeyUp;
+    case XK_Down: return kKeyDown;
+    case XK_Home: return kKeyHome;
+    case XK_End: return kKeyEnd;
+    default: break;
+  }
+  // Latin-1 key symbols are their characters.
+  return symbol >= 0x20 && symbol <= 0xFF ? static_cast<int32_t>(symbol) : kKeyNone;
+}
+
+}  // namespace
+
+KEditorWindowX11::KEditorWindowX11(unsigned long parent, KEditor& editor) : editor_(editor) {
+  display_ = XOpenDisplay(nullptr);
+  if (!display_) throw KException("The editor cannot open its window: there is no X display.");
+  window_ = XCreateSimpleWindow(display_, parent, 0, 0, static_cast<unsigned>(editor_.PixelWidth()),
+                                static_cast<unsigned>(editor_.PixelHeight()), 0, 0, 0);
+  XSelectInput(display_, window_,
+               ExposureMask | ButtonPressMask | ButtonReleaseMask | PointerMotionMask | KeyPressMask | StructureNotifyMask |
+                   EnterWindowMask);
+  gc_ = XCreateGC(display_, window_, 0, nullptr);
+  MakeBackBuffer();
+  XMapWindow(display_, window_);
+  XFlush(display_);
+}
+
+KEditorWindowX11::~KEditorWindowX11() {
+  drawer_.reset();
+  XFreeGC(display_, gc_);
+  XDestroyWindow(display_, window_);
+  XCloseDisplay(display_);
+}
+
+int KEditorWindowX11::FileDescriptor() const noexcept { return ConnectionNumber(display_); }
+
+void KEditorWindowX11::MakeBackBuffer() {
+  drawer_.reset();
+  backBuffer_ = KBitmap(editor_.PixelWidth(), editor_.PixelHeight());
+  drawer_ = std::make_unique<KDrawerToKBitmap>(backBuffer_, editor_.Scale());
+  editor_.Tree().InvalidateAll();
+}
+
+void KEditorWindowX11::Resize() {
+  XResizeWindow(display_, window_, static_cast<unsigned>(editor_.PixelWidth()), static_cast<unsigned>(editor_.PixelHeight()));
+  MakeBackBuffer();
+  PaintDirty();
+}
+
+void KEditorWindowX11::ProcessEvents() {
+  while (XPending(display_) > 0) {
+    XEvent event;
+    XNextEvent(display_, &event);
+    HandleEvent(event);
+  }
+  PaintDirty();
+}
+
+void KEditorWindowX11::Tick() {
+  editor_.Tree().Tick();
+  ProcessEvents();
+}
+
+void KEditorWindowX11::HandleEvent(const XEvent& event) {
+  KControlTree& tree = editor_.Tree();
+  const double scale = editor_.Scale();
+  const auto at = [scale](int x, int y) {
+    return KPoint{static_cast<int32_t>(std::floor(x / scale)), static_cast<int32_t>(std::floor(y / scale))};
+  };
+  switch (event.type) {
+    case Expose:
+      if (event.xexpose.count == 0) tree.InvalidateAll();
+      break;
+    case ButtonPress: {
+      const XButtonEvent& b = event.xbutton;
+      const KMouseEvent mouse{at(b.x, b.y), ModifiersOf(b.state), b.button == Button4 ? 1.0 : b.button == Button5 ? -1.0 : 0.0};
+      if (b.button == Button1) tree.MouseDown(mouse, b.time);
+      else if (mouse.wheel != 0) tree.Wheel(mouse);
+      break;
+    }
+    case ButtonRelease:
+      if (event.xbutton.button == Button1) tree.MouseUp({at(event.xbutton.x, event.xbutton.y), ModifiersOf(event.xbutton.state)});
+      break;
+    case MotionNotify:
+      tree.MouseMove({at(event.xmotion.x, event.xmotion.y), ModifiersOf(event.xmotion.state)});
+      break;
+    case EnterNotify:
+      // Keys reach a child window only with the focus; the host gives it back on leaving.
+      XSetInputFocus(display_, window_, RevertToParent, CurrentTime);
+      break;
+    case KeyPress: {
+      XKeyEvent key = event.xkey;
+      const KeySym symbol = XLookupKeysym(&key, (key.state & ShiftMask) ? 1 : 0);
+      const int32_t code = KeyOf(symbol);
+      if (code != kKeyNone) tree.Key({code, ModifiersOf(key.state)});
+      break;
+    }
+    default:
+      break;
+  }
+}
+
+int64_t KEditorWindowX11::PaintDirty() {
+  if (!editor_.Tree().NeedsPaint()) return 0;
+  const bool full = editor_.Tree().DirtyArea() == editor_.Tree().Root().Bounds();
+  const auto start = std::chrono::steady_clock::now();
+  const KRect area = editor_.Paint(*drawer_);
+  if (full) lastFullPaintMs_ = std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start).count();
+  if (area.IsEmpty()) return 0;
+  // The logical area in pixels, widened by one for anti-aliased edges.
+  const double s = editor_.Scale();
+  const int32_t left = std::max(0, static_cast<int32_t>(std::floor(area.left * s)) - 1);
+  const int32_t top = std::max(0, static_cast<int32_t>(std::floor(area.top * s)) - 1);
+  const int32_t right = std::min(backBuffer_.Width() - 1, static_cast<int32_t>(std::ceil((area.right + 1) * s)));
+  const int32_t bottom = std::min(backBuffer_.Height() - 1, static_cast<int32_t>(std::ceil((area.bottom + 1) * s)));
+  Present(left, top, right, bottom);
+  return int64_t{right - left + 1} * (bottom - top + 1);
+}
+
+void KEditorWindowX11::Present(int32_t left, int32_t top, int32_t right, int32_t bottom) {
+  if (right < left || bottom < top) return;
+  // The back buffer's pixels are 0xAARRGGBB words: the layout of a 24-bit TrueColor visual.
+  XImage* image = XCreateImage(display_, DefaultVisual(display_, DefaultScreen(display_)), 24, ZPixmap, 0,
+                               reinterpret_cast<char*>(backBuffer_.Pixels()), static_cast<unsigned>(backBuffer_.Width()),
+                               static_cast<unsigned>(backBuffer_.Height()), 32, backBuffer_.Width() * 4);
+  if (!image) return;
+  XPutImage(display_, window_, gc_, image, left, top, left, top, static_cast<unsigned>(right - left + 1),
+            static_cast<unsigned>(bottom - top + 1));
+  image->data = nullptr;  // the back buffer's, not the image's to free
+  XDestroyImage(image);
+  XFlush(display_);
+}

@@ -1,0 +1,50 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+
+#include "ui/KBitmap.h"
+
+class KEditor;
+class KDrawerToKBitmap;
+
+// An editor in an X11 child window of a host's window. It has no thread and no loop of its
+// own: the host's run loop calls ProcessEvents when the connection's descriptor is readable and
+// Tick on its timer. Painting goes through the software drawer into a back buffer, of which
+// only the repainted area is put on the window.
+class KEditorWindowX11 {
+public:
+  // Opens a connection of its own and a child window of `parent` the editor's pixel size.
+  // Throws KException when there is no display.
+  KEditorWindowX11(unsigned long parent, KEditor& editor);
+  ~KEditorWindowX11();
+  KEditorWindowX11(const KEditorWindowX11&) = delete;
+  KEditorWindowX11& operator=(const KEditorWindowX11&) = delete;
+
+  unsigned long Window() const noexcept { return window_; }
+  // The connection's descriptor, for the host's event handler.
+  int FileDescriptor() const noexcept;
+  // Handles every event waiting on the connection.
+  void ProcessEvents();
+  // The editor's tick, then whatever it made dirty painted.
+  void Tick();
+  // Follows the editor's pixel size (after a scale change or a host's resize).
+  void Resize();
+  // Paints what is dirty and puts it on the window; answers the pixels put.
+  int64_t PaintDirty();
+  // The milliseconds the last full repaint took.
+  double LastFullPaintMs() const noexcept { return lastFullPaintMs_; }
+
+private:
+  void HandleEvent(const union _XEvent& event);
+  void Present(int32_t left, int32_t top, int32_t right, int32_t bottom);
+  void MakeBackBuffer();
+
+  KEditor& editor_;
+  struct _XDisplay* display_ = nullptr;
+  unsigned long window_ = 0;
+  struct _XGC* gc_ = nullptr;
+  KBitmap backBuffer_;
+  std::unique_ptr<KDrawerToKBitmap> drawer_;
+  double lastFullPaintMs_ = 0;
+};

@@ -195,7 +195,9 @@ void KCoverageDrawer::PaintHorizontalGraph(const KRect& area, std::span<const do
   KGuard(Name(kOperationPaintHorizontalGraph), [&] {
     const std::vector<KPointF> points = CurvePoints(area, values, top, bottom);
     if (points.empty()) return;
-    const double baseline = CurvePoints(area, std::span<const double>(&base, 1), top, bottom)[0].y;
+    const std::vector<KPointF> basePoint = CurvePoints(area, std::span<const double>(&base, 1), top, bottom);
+    if (basePoint.empty()) return;
+    const double baseline = basePoint.front().y;
     // Closed along the base line: the end points drop onto it.
     std::vector<KPointF> closed = points;
     closed.push_back({points.back().x, baseline});

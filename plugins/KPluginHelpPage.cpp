@@ -28,14 +28,6 @@ KString Display(const KAudioPluginBase::Parameter& p, double normalized) {
   return KHelpTexts::Escape(kept);
 }
 
-// Mark-up rendered after the semantic tag sets.
-KRichTextDocument Render(const KString& markup) {
-  KRichTextRenderer renderer;
-  renderer.Render(KHelpTexts::SemanticTagSets());
-  renderer.Render(markup);
-  return renderer.TakeDocument();
-}
-
 }  // namespace
 
 KPluginHelpPage::KPluginHelpPage(KAudioPlugin& plugin) : plugin_(plugin), help_(HelpOf(plugin)) {}
@@ -65,7 +57,7 @@ KString KPluginHelpPage::Markup() const {
   return markup;
 }
 
-KRichTextDocument KPluginHelpPage::Document() const { return Render(Markup()); }
+KRichTextDocument KPluginHelpPage::Document() const { return KRenderHelpMarkup(Markup()); }
 
 std::string KPluginHelpPage::PlainText() const { return KRichTextPlainText(Document()); }
 
@@ -73,11 +65,11 @@ std::string KPluginHelpPage::Html() const {
   const KString title = KString::FromUtf8(help_.title);
   KRichTextHtml page(title);
   page.Heading(1, title);
-  page.Document(Render(KString::FromUtf8(help_.overview)));
+  page.Document(KRenderHelpMarkup(KString::FromUtf8(help_.overview)));
   for (int32_t i = 0; i < plugin_.ParameterCount(); ++i) {
     page.Heading(2, plugin_.GetParameter(i).Name());
     const KString text = ParameterText(i);
-    page.Document(Render(text.IsEmpty() ? KString::Static(KHelpTexts::kNoHelp) : text));
+    page.Document(KRenderHelpMarkup(text.IsEmpty() ? KString::Static(KHelpTexts::kNoHelp) : text));
   }
   return page.Finish();
 }

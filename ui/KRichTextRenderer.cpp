@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "ui/KHelpTexts.h"
+
 namespace {
 
 // What a built-in tag does, in the order in which the handler tests names: the first match wins.
@@ -421,4 +423,11 @@ bool KRichTextRenderer::PlayTagSets(const KString& name, bool closing) {
   }
   RecomputeFormat();
   return true;
+}
+
+KRichTextDocument KRenderHelpMarkup(const KString& markup) {
+  KRichTextRenderer renderer;
+  renderer.Render(KHelpTexts::SemanticTagSets());
+  renderer.Render(markup);
+  return renderer.TakeDocument();
 }

@@ -100,3 +100,6 @@ private:
   int32_t defining_ = -1;  // index of the tag set under definition
   int32_t played_ = 0;
 };
+
+// Help mark-up read after the semantic tag sets (name, value, control, ...) that every help text uses.
+TORVANE_API KRichTextDocument KRenderHelpMarkup(const KString& markup);

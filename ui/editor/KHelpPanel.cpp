@@ -12,18 +12,11 @@ namespace {
 
 constexpr int32_t kMargin = 14;
 
-KRichTextDocument Render(const KString& markup) {
-  KRichTextRenderer renderer;
-  renderer.Render(KHelpTexts::SemanticTagSets());
-  renderer.Render(markup);
-  return renderer.TakeDocument();
-}
-
 }  // namespace
 
 KHelpPanel::KHelpPanel(const KRect& window, const KString& markup) : KControl(window), markup_(markup) {
   const int32_t width = std::min<int32_t>(kWidth, static_cast<int32_t>(window.Width()) - 24);
-  const KRichTextLayout layout(Render(markup_), width - 2 * kMargin);
+  const KRichTextLayout layout(KRenderHelpMarkup(markup_), width - 2 * kMargin);
   textHeight_ = layout.Height();
   const int32_t height = std::min<int32_t>(textHeight_ + 2 * kMargin, static_cast<int32_t>(window.Height()) - 24);
   const int32_t left = window.left + (static_cast<int32_t>(window.Width()) - width) / 2;
@@ -36,7 +29,7 @@ void KHelpPanel::Paint(KDrawer& drawer, const KStyle& style) {
   drawer.FillRectangle(KInset(card_, -3), style.Get(KStyle::kHeader), 255, kDrawCopy);
   drawer.FillRoundRectangle(card_, 8, 0xFFFFFFFF, 255, kDrawBlend);
   drawer.RoundRectangle(card_, 8, style.Get(KStyle::kAccent), 255, kDrawBlend);
-  const KRichTextLayout layout(Render(markup_), static_cast<int32_t>(card_.Width()) - 2 * kMargin, drawer.Scale());
+  const KRichTextLayout layout(KRenderHelpMarkup(markup_), static_cast<int32_t>(card_.Width()) - 2 * kMargin, drawer.Scale());
   layout.Draw(drawer, {card_.left + kMargin, card_.top + kMargin});
 }
 

@@ -1,0 +1,45 @@
+#include "plugins/KPluginHelp.h"
+#include "plugins/multiband/KMultibandCompressorPlugin.h"
+
+namespace {
+constexpr KParameterHelp kParameters[] = {
+    {"bands",
+     "<control>Bands</control> is how many frequency bands the signal is split into, each compressed on its own. Range "
+     "<range>{0}</range> to <range>{1}</range>, default <value>{2}</value>."},
+    {"crossover#",
+     "<control>Crossover {3}</control> is the frequency where band {3} ends and the next begins. The bands overlap smoothly "
+     "and add up to the original sound when nothing is compressed. Range <range>{0}</range> to <range>{1}</range>, default "
+     "<value>{2}</value>.<p>Tip: place crossovers between instruments, for example below the vocal's body or below "
+     "the cymbals."},
+    {"band#threshold",
+     "<control>Band {3} threshold</control> is the level above which band {3} is compressed. Range <range>{0}</range> to "
+     "<range>{1}</range>, default <value>{2}</value>."},
+    {"band#ratio",
+     "<control>Band {3} ratio</control> is how strongly band {3} is compressed above its threshold: at <value>4 : 1</value> "
+     "four decibels over the threshold become one; <value>1 : 1</value> leaves the band alone. Range <range>{0}</range> to "
+     "<range>{1}</range>, default <value>{2}</value>."},
+    {"band#attack",
+     "<control>Band {3} attack</control> is how quickly band {3} is turned down when it gets loud. Range <range>{0}</range> "
+     "to <range>{1}</range>, default <value>{2}</value>.<p>Tip: low bands need longer attacks than high ones, or their "
+     "waves get distorted."},
+    {"band#release",
+     "<control>Band {3} release</control> is how quickly band {3} recovers. Range <range>{0}</range> to <range>{1}</range>, "
+     "default <value>{2}</value>."},
+    {"band#gain",
+     "<control>Band {3} gain</control> raises or lowers band {3} after its compression, to make up what was taken away or "
+     "to balance the bands. Range <range>{0}</range> to <range>{1}</range>, default <value>{2}</value>."},
+    {"outputgain",
+     "<control>Output gain</control> sets the level of the bands added together. Range <range>{0}</range> to "
+     "<range>{1}</range>, default <value>{2}</value>."},
+};
+
+constexpr KPluginHelp kHelp{
+    "KMultibandCompressorPlugin",
+    "MultibandCompressor",
+    "The <name>MultibandCompressor</name> splits the sound into up to four frequency bands and compresses each on its own, "
+    "so that a booming bass note no longer pushes the vocal down, and sharp highs can be tamed without dulling the rest.",
+    kParameters,
+};
+}  // namespace
+
+const KPluginHelp& KMultibandCompressorHelp() { return kHelp; }

@@ -33,12 +33,12 @@ struct PlainBiquad {
 };
 
 struct PlainSplitter {
-  explicit PlainSplitter(int32_t bands) : bands(bands) {
-    for (int32_t k = 0; k + 1 < bands; ++k) {
+  explicit PlainSplitter(int32_t count) : bands(count) {
+    for (int32_t k = 0; k + 1 < count; ++k) {
       const double hz = kCrossovers[k];
       crossovers.push_back({PlainBiquad::Of(KFilterSection::kLowPass, hz), PlainBiquad::Of(KFilterSection::kLowPass, hz),
                             PlainBiquad::Of(KFilterSection::kHighPass, hz), PlainBiquad::Of(KFilterSection::kHighPass, hz)});
-      for (int32_t m = k + 1; m + 1 < bands; ++m) turns.push_back(PlainBiquad::Of(KFilterSection::kAllPass, kCrossovers[m]));
+      for (int32_t m = k + 1; m + 1 < count; ++m) turns.push_back(PlainBiquad::Of(KFilterSection::kAllPass, kCrossovers[m]));
     }
   }
   void Process(const float* in, float* const* out, int32_t n) {

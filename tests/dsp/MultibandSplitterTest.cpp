@@ -108,9 +108,9 @@ TEST(MultibandSplitter, KeepsCrossoversOrderedAndInRange) {
   EXPECT_EQ(splitter.Crossover(1), 3000.0);
   EXPECT_EQ(splitter.Crossover(2), 3000.0);
   EXPECT_EQ(splitter.Crossover(3), KMultibandSplitter::kHighestShare * kRate);
-  splitter.SetCrossovers(wild, 9, kRate);
+  splitter.SetCrossovers(kCrossovers, 9, kRate);  // as many bands as there are crossovers for
   EXPECT_EQ(splitter.BandCount(), KMultibandSplitter::kMaxBands);
-  splitter.SetCrossovers(wild, 0, kRate);
+  splitter.SetCrossovers(kCrossovers, 0, kRate);
   EXPECT_EQ(splitter.BandCount(), KMultibandSplitter::kMinBands);
 }
 

@@ -10,13 +10,14 @@ constexpr KParameterHelp kParameters[] = {
     {"downsample",
      "<control>Downsample</control> holds each sample for this many samples, lowering the sample rate without a filter, so "
      "that high frequencies fold back as metallic tones. Range <range>{0}</range> to <range>{1}</range>, default "
-     "<value>{2}</value> (off)."},
+     "<value>{2}</value> (off).<p>Tip: small factors of <example>2 to 4</example> on drums give the crunch of early "
+     "samplers."},
     {"mix",
      "<control>Dry/wet</control> blends the crushed signal with the original. Range <range>{0}</range> to <range>{1}</range>, "
      "default <value>{2}</value>.<p>Tip: a little crushed signal under the original adds grit while the sound stays clear."},
     {"outputgain",
      "<control>Output gain</control> sets the level after the mix. Range <range>{0}</range> to <range>{1}</range>, default "
-     "<value>{2}</value>."},
+     "<value>{2}</value>.<p>Tip: low bit depths are loud and harsh; lower the output to judge the effect fairly."},
 };
 
 constexpr KPluginHelp kHelp{

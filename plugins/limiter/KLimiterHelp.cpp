@@ -15,7 +15,8 @@ constexpr KParameterHelp kParameters[] = {
     {"release",
      "<control>Release</control> is how quickly the gain recovers after a peak. Short times keep the level up but can "
      "distort low notes; long times are smooth but pump. Range <range>{0}</range> to <range>{1}</range>, default "
-     "<value>{2}</value>."},
+     "<value>{2}</value>.<p>Tip: on a full mix, start around <example>100 ms</example> and shorten it until the level "
+     "stays up without the bass getting rough."},
     {"lookahead",
      "<control>Lookahead</control> is how far ahead the limiter sees the peaks coming, so that it can lower the gain smoothly "
      "before they arrive. The output is delayed by the same time, which the host compensates. Range <range>{0}</range> to "
@@ -23,7 +24,8 @@ constexpr KParameterHelp kParameters[] = {
      "cleaner on full mixes."},
     {"linkchannels",
      "<control>Link channels</control> applies the same gain to every channel, so the stereo image stays where it is. Off, "
-     "each channel is limited on its own. Default <value>{2}</value>."},
+     "each channel is limited on its own. Default <value>{2}</value>.<p>Tip: leave it on for stereo mixes; switch it off "
+     "for two unrelated mono signals on one track."},
 };
 
 constexpr KPluginHelp kHelp{

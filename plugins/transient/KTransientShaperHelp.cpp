@@ -13,7 +13,7 @@ constexpr KParameterHelp kParameters[] = {
      "negative values dry up a roomy recording."},
     {"outputgain",
      "<control>Output gain</control> sets the level after the shaping. Range <range>{0}</range> to <range>{1}</range>, "
-     "default <value>{2}</value>."},
+     "default <value>{2}</value>.<p>Tip: more attack raises the peaks; lower the output to compare at equal loudness."},
 };
 
 constexpr KPluginHelp kHelp{

@@ -34,7 +34,6 @@ inline double Tick(const KMultibandSplitter::Section& k, double& s1, double& s2,
 void KMultibandSplitter::Prepare(int32_t maxFrames) {
   maxFrames_ = std::max(maxFrames, 1);
   rest_.assign(static_cast<size_t>(maxFrames_), 0.0);
-  band_.assign(static_cast<size_t>(maxFrames_), 0.0);
   Reset();
 }
 
@@ -69,34 +68,38 @@ uint32_t KMultibandSplitter::RingSamples(double fall) const noexcept {
   return KSectionRunner::RingSamples(rows, count, fall);
 }
 
+template <int Turns>
+void KMultibandSplitter::Split(const KMultibandSplitter& self, int32_t k, ChannelState& state, double* rest, float* out,
+                               int32_t frames) noexcept {
+  const Section low = self.low_[k], high = self.high_[k];
+  State* s = state.split[k];
+  State l1 = s[kLow1], l2 = s[kLow2], h1 = s[kHigh1], h2 = s[kHigh2];
+  // The phase turns of the crossovers above, which the bands above pass in their halves.
+  constexpr int kSlots = Turns > 0 ? Turns : 1;
+  Section turn[kSlots];
+  State p[kSlots];
+  for (int m = 0; m < Turns; ++m) turn[m] = self.allPass_[k + 1 + m], p[m] = state.phase[k][k + 1 + m];
+  for (int32_t i = 0; i < frames; ++i) {
+    const double x = rest[i];
+    double y = Tick(low, l2.s1, l2.s2, Tick(low, l1.s1, l1.s2, x));
+    rest[i] = Tick(high, h2.s1, h2.s2, Tick(high, h1.s1, h1.s2, x));
+    for (int m = 0; m < Turns; ++m) y = Tick(turn[m], p[m].s1, p[m].s2, y);
+    out[i] = static_cast<float>(y);
+  }
+  s[kLow1] = l1, s[kLow2] = l2, s[kHigh1] = h1, s[kHigh2] = h2;
+  for (int m = 0; m < Turns; ++m) state.phase[k][k + 1 + m] = p[m];
+}
+
 void KMultibandSplitter::Process(int32_t channel, const float* input, float* const* bands, int32_t frames) noexcept {
+  using Kernel = void (*)(const KMultibandSplitter&, int32_t, ChannelState&, double*, float*, int32_t) noexcept;
+  // Indexed by the number of crossovers above the one being split.
+  static constexpr Kernel kSplits[kMaxCrossovers] = {Split<0>, Split<1>, Split<2>, Split<3>, Split<4>};
   frames = std::min(frames, maxFrames_);
   ChannelState& state = channels_[channel];
   double* rest = rest_.data();
-  double* band = band_.data();
   for (int32_t i = 0; i < frames; ++i) rest[i] = input[i];
   const int32_t crossovers = bands_ - 1;
-  for (int32_t k = 0; k < crossovers; ++k) {
-    // The crossover: its low half becomes band k, its high half what is left.
-    State* s = state.split[k];
-    const Section low = low_[k], high = high_[k];
-    State l1 = s[kLow1], l2 = s[kLow2], h1 = s[kHigh1], h2 = s[kHigh2];
-    for (int32_t i = 0; i < frames; ++i) {
-      const double x = rest[i];
-      band[i] = Tick(low, l2.s1, l2.s2, Tick(low, l1.s1, l1.s2, x));
-      rest[i] = Tick(high, h2.s1, h2.s2, Tick(high, h1.s1, h1.s2, x));
-    }
-    s[kLow1] = l1, s[kLow2] = l2, s[kHigh1] = h1, s[kHigh2] = h2;
-    // The phase turns of the crossovers above, which the bands above pass in their halves.
-    for (int32_t m = k + 1; m < crossovers; ++m) {
-      const Section turn = allPass_[m];
-      State p = state.phase[k][m];
-      for (int32_t i = 0; i < frames; ++i) band[i] = Tick(turn, p.s1, p.s2, band[i]);
-      state.phase[k][m] = p;
-    }
-    float* out = bands[k];
-    for (int32_t i = 0; i < frames; ++i) out[i] = static_cast<float>(band[i]);
-  }
+  for (int32_t k = 0; k < crossovers; ++k) kSplits[crossovers - 1 - k](*this, k, state, rest, bands[k], frames);
   float* top = bands[crossovers];
   for (int32_t i = 0; i < frames; ++i) top[i] = static_cast<float>(rest[i]);
   Settle(state);

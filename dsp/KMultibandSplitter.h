@@ -56,6 +56,12 @@ private:
     State phase[kMaxBands][kMaxCrossovers];  // [band][crossover whose all-pass it passes]
   };
 
+  // One crossover over a block: its low half, through the `Turns` all-passes of the crossovers
+  // above, becomes a band; its high half stays in `rest` for the next. With the count known
+  // while compiling, every state can live in a register and the sample loop carries no tests.
+  template <int Turns>
+  static void Split(const KMultibandSplitter& self, int32_t k, ChannelState& state, double* rest, float* out,
+                    int32_t frames) noexcept;
   void Settle(ChannelState& state) noexcept;
 
   int32_t bands_ = kMinBands;
@@ -63,5 +69,5 @@ private:
   double frequencies_[kMaxCrossovers] = {};
   Section low_[kMaxCrossovers], high_[kMaxCrossovers], allPass_[kMaxCrossovers];
   ChannelState channels_[kMaxChannels];
-  std::vector<double> rest_, band_;  // what is left above the crossovers so far; one band
+  std::vector<double> rest_;  // what is left above the crossovers so far
 };

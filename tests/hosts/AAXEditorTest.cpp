@@ -1,0 +1,92 @@
+// The editor as an AAX host shows it: the GUI made through registration, framed in a container
+// that holds an X11 window (the tests run under Xvfb), run by the host's timer, painted as the
+// offline snapshot paints it, its edits reaching the host as touch, set and release requests.
+#include <unistd.h>
+
+#include <memory>
+#include <string>
+
+#include "kernel/KEntryPoints.h"
+#include "plugins/KPluginEditors.h"
+#include "tests/hosts/AAXHost.h"
+#include "tests/ui/EditorTestSupport.h"
+#include "ui/controls/KValueControl.h"
+#include "ui/editor/KEditor.h"
+// Last: X11's macros would break the headers above.
+#include "tests/hosts/X11EditorWindow.h"
+
+using namespace KAAXTest;
+using KX11Test::Shell;
+
+namespace {
+
+struct AAXEditorWindow : KX11Test::EditorWindowFixture {
+  static void Wake(KAAXGUI& gui, int rounds = 10) {
+    for (int i = 0; i < rounds; ++i) {
+      usleep(15000);
+      gui.TimerWakeup();
+    }
+  }
+};
+
+TEST_F(AAXEditorWindow, TheGUIShowsTheEditorInTheContainersWindowAndSendsItsEdits) {
+  KBundle bundle("Utility");
+  KController controller;
+  KAutomation automation;
+  KEffectParameters* effect = bundle.Create(controller, automation);
+  ASSERT_NE(effect, nullptr);
+  KView view;
+  view.type = kViewContainerX11Window;
+  view.window = reinterpret_cast<void*>(parent);
+  KAAXGUI* gui = bundle.Information().createGUI(effect);
+  ASSERT_NE(gui, nullptr);
+  ASSERT_EQ(gui->Create(&view), kSuccess);
+  ASSERT_EQ(gui->CreateViewContents(), kSuccess);
+  int32_t width = 0, height = 0;
+  ASSERT_EQ(gui->GetViewSize(&width, &height), kSuccess);
+  EXPECT_EQ(view.sizes, (std::vector<std::pair<int32_t, int32_t>>{{width, height}}));
+  Wake(*gui);
+  const Window child = Child();
+  ASSERT_NE(child, 0u);
+  EXPECT_EQ(SizeOf(child), std::pair(width, height));
+
+  const std::unique_ptr<KAudioPlugin> offline(CreateTorvanePlugin(KString("KUtilityPlugin")));
+  const KBitmap expected = KBitmap::Decode(KPluginEditorSnapshotPNG(*offline, 1, false), "snapshot");
+  ASSERT_EQ(std::pair(expected.Width(), expected.Height()), std::pair(width, height));
+  EXPECT_EQ(Differences(Screenshot(child, width, height), expected), 0);
+
+  // A drag on the width knob: a touch, values set on the parameter's identifier, a release.
+  const std::unique_ptr<KEditor> layout = KMakePluginEditor(*offline, nullptr);
+  const int32_t index = offline->FindParameter(KString("width"))->Index();
+  KKnob* knob = KFindControl<KKnob>(layout->Tree().Root(), [&](KKnob& k) { return k.Link().Index() == index; });
+  ASSERT_NE(knob, nullptr);
+  const KPoint at = KCentreOf(*knob);
+  const std::string w = std::to_string(child), id = std::to_string(index);
+  ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y) + " mousedown 1"));
+  for (int dy = 10; dy <= 40; dy += 10)
+    ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y + dy)));
+  ASSERT_TRUE(Shell("xdotool mouseup 1"));
+  Wake(*gui);
+  std::string kinds;
+  for (const auto& [kind, parameter, value] : automation.posts)
+    if (parameter == id) kinds += kind;
+  ASSERT_GE(kinds.size(), 3u);
+  EXPECT_EQ(kinds.front(), 't');
+  EXPECT_EQ(kinds.back(), 'r');
+  EXPECT_EQ(kinds.substr(1, kinds.size() - 2), std::string(kinds.size() - 2, 's'));
+  double value = 0;
+  ASSERT_EQ(effect->GetParameterNormalizedValue(id.c_str(), &value), kSuccess);
+  EXPECT_NEAR(value, offline->GetParameter(index).DefaultNormalized() - 40 / KValueControl::kDragTravel, 1e-9);
+
+  // The contents go and come back; the GUI goes before its effect.
+  EXPECT_EQ(gui->DeleteViewContents(), kSuccess);
+  EXPECT_EQ(ChildCount(), 0);
+  EXPECT_EQ(gui->CreateViewContents(), kSuccess);
+  Wake(*gui, 2);
+  EXPECT_EQ(ChildCount(), 1);
+  gui->Release();
+  EXPECT_EQ(ChildCount(), 0);
+  effect->Release();
+}
+
+}  // namespace

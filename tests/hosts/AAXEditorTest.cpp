@@ -7,16 +7,11 @@
 #include <string>
 
 #include "kernel/KEntryPoints.h"
-#include "plugins/KPluginEditors.h"
 #include "tests/hosts/AAXHost.h"
-#include "tests/ui/EditorTestSupport.h"
-#include "ui/controls/KValueControl.h"
-#include "ui/editor/KEditor.h"
 // Last: X11's macros would break the headers above.
 #include "tests/hosts/X11EditorWindow.h"
 
 using namespace KAAXTest;
-using KX11Test::Shell;
 
 namespace {
 
@@ -56,27 +51,17 @@ TEST_F(AAXEditorWindow, TheGUIShowsTheEditorInTheContainersWindowAndSendsItsEdit
   EXPECT_EQ(Differences(Screenshot(child, width, height), expected), 0);
 
   // A drag on the width knob: a touch, values set on the parameter's identifier, a release.
-  const std::unique_ptr<KEditor> layout = KMakePluginEditor(*offline, nullptr);
   const int32_t index = offline->FindParameter(KString("width"))->Index();
-  KKnob* knob = KFindControl<KKnob>(layout->Tree().Root(), [&](KKnob& k) { return k.Link().Index() == index; });
-  ASSERT_NE(knob, nullptr);
-  const KPoint at = KCentreOf(*knob);
-  const std::string w = std::to_string(child), id = std::to_string(index);
-  ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y) + " mousedown 1"));
-  for (int dy = 10; dy <= 40; dy += 10)
-    ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y + dy)));
-  ASSERT_TRUE(Shell("xdotool mouseup 1"));
+  const std::string id = std::to_string(index);
+  ASSERT_TRUE(KX11Test::DragDown(child, KX11Test::KnobCentre(*offline, "width")));
   Wake(*gui);
   std::string kinds;
   for (const auto& [kind, parameter, value] : automation.posts)
     if (parameter == id) kinds += kind;
-  ASSERT_GE(kinds.size(), 3u);
-  EXPECT_EQ(kinds.front(), 't');
-  EXPECT_EQ(kinds.back(), 'r');
-  EXPECT_EQ(kinds.substr(1, kinds.size() - 2), std::string(kinds.size() - 2, 's'));
+  EXPECT_TRUE(KX11Test::IsOneGesture(kinds, 't', 's', 'r')) << kinds;
   double value = 0;
   ASSERT_EQ(effect->GetParameterNormalizedValue(id.c_str(), &value), kSuccess);
-  EXPECT_NEAR(value, offline->GetParameter(index).DefaultNormalized() - 40 / KValueControl::kDragTravel, 1e-9);
+  EXPECT_NEAR(value, offline->GetParameter(index).DefaultNormalized() - KX11Test::kDragTravel, 1e-9);
 
   // The contents go and come back; the GUI goes before its effect.
   EXPECT_EQ(gui->DeleteViewContents(), kSuccess);

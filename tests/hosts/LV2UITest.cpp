@@ -15,15 +15,10 @@
 #include "hosts/lv2/KLV2Dispatch.h"
 #include "kernel/KEntryPoints.h"
 #include "kernel/platform/KPlatformLibrary.h"
-#include "plugins/KPluginEditors.h"
 #include "tests/hosts/LV2Host.h"
-#include "tests/ui/EditorTestSupport.h"
-#include "ui/controls/KValueControl.h"
-#include "ui/editor/KEditor.h"
 // Last: X11's macros would break the headers above.
 #include "tests/hosts/X11EditorWindow.h"
 
-using KX11Test::Shell;
 
 namespace {
 
@@ -95,16 +90,8 @@ TEST_F(LV2UIWindow, TheUIShowsTheEditorOnTheInstanceAndWritesItsEditsToTheContro
               0);
 
     // A drag on the width knob: its port touched, written in working units, released.
-    const std::unique_ptr<KEditor> layout = KMakePluginEditor(*offline, nullptr);
     KAudioPluginBase::Parameter& width = *offline->FindParameter(KString("width"));
-    KKnob* knob = KFindControl<KKnob>(layout->Tree().Root(), [&](KKnob& k) { return k.Link().Index() == width.Index(); });
-    ASSERT_NE(knob, nullptr);
-    const KPoint at = KCentreOf(*knob);
-    const std::string w = std::to_string(child);
-    ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y) + " mousedown 1"));
-    for (int dy = 10; dy <= 40; dy += 10)
-      ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y + dy)));
-    ASSERT_TRUE(Shell("xdotool mouseup 1"));
+    ASSERT_TRUE(KX11Test::DragDown(child, KX11Test::KnobCentre(*offline, "width")));
     for (int i = 0; i < 10; ++i) {
       usleep(15000);
       idle->idle(handle);
@@ -113,7 +100,7 @@ TEST_F(LV2UIWindow, TheUIShowsTheEditorOnTheInstanceAndWritesItsEditsToTheContro
     EXPECT_EQ(host.touches, (std::vector<std::pair<uint32_t, bool>>{{port, true}, {port, false}}));
     ASSERT_FALSE(host.writes.empty());
     for (const auto& [written, value] : host.writes) EXPECT_EQ(written, port);
-    const double dragged = width.Kind().ToWorking(width.DefaultNormalized() - 40 / KValueControl::kDragTravel);
+    const double dragged = width.Kind().ToWorking(width.DefaultNormalized() - KX11Test::kDragTravel);
     EXPECT_NEAR(host.writes.back().second, dragged, 1e-4 * (1 + std::abs(dragged)));
 
     ui.cleanup(handle);

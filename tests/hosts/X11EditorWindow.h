@@ -5,10 +5,16 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <memory>
 #include <string>
 
+#include "core/KAudioPlugin.h"
+#include "plugins/KPluginEditors.h"
+#include "tests/ui/EditorTestSupport.h"
 #include "ui/KBitmap.h"
 #include "ui/KGeometry.h"
+#include "ui/controls/KValueControl.h"
+#include "ui/editor/KEditor.h"
 // Last: X11's macros (None, Bool, Status) would break the headers above.
 #include <X11/Xlib.h>
 #include <X11/Xutil.h>
@@ -16,6 +22,30 @@
 namespace KX11Test {
 
 inline bool Shell(const std::string& command) { return std::system(command.c_str()) == 0; }
+
+// Where the knob of the parameter `key` lies in the plug-in's editor at scale 1 (the generated
+// layout is the same for every instance).
+inline KPoint KnobCentre(KAudioPlugin& plugin, const char* key) {
+  const std::unique_ptr<KEditor> layout = KMakePluginEditor(plugin, nullptr);
+  const int32_t index = plugin.FindParameter(KString::FromUtf8(key))->Index();
+  KKnob* knob = KFindControl<KKnob>(layout->Tree().Root(), [&](KKnob& k) { return k.Link().Index() == index; });
+  EXPECT_NE(knob, nullptr) << key;
+  return knob ? KCentreOf(*knob) : KPoint{};
+}
+
+// A drag of 40 pixels down from `at` in `window`, in steps of 10, as a user's mouse makes it.
+inline bool DragDown(unsigned long window, KPoint at) {
+  const std::string w = std::to_string(window), x = std::to_string(at.x);
+  bool moved = Shell("xdotool mousemove --window " + w + " " + x + " " + std::to_string(at.y) + " mousedown 1");
+  for (int dy = 10; dy <= 40; dy += 10) moved = moved && Shell("xdotool mousemove --window " + w + " " + x + " " + std::to_string(at.y + dy));
+  return Shell("xdotool mouseup 1") && moved;
+}
+// Whether `kinds` (one letter per host call on a parameter) is one whole gesture: a begin, at
+// least one value, an end.
+inline bool IsOneGesture(const std::string& kinds, char begin, char value, char end) {
+  return kinds.size() >= 3 && kinds.front() == begin && kinds.back() == end && kinds.substr(1, kinds.size() - 2) == std::string(kinds.size() - 2, value);
+}
+inline constexpr double kDragTravel = 40 / KValueControl::kDragTravel;  // the normalised change of DragDown
 
 struct EditorWindowFixture : ::testing::Test {
   Display* display = XOpenDisplay(nullptr);

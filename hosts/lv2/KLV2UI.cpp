@@ -13,6 +13,7 @@
 #include "hosts/common/KHostEntry.h"
 #include "hosts/common/KHostGuard.h"
 #include "hosts/lv2/KAudioPluginLV2Adapter.h"
+#include "hosts/lv2/KLV2Dispatch.h"
 #include "kernel/KCatalogue.h"
 #include "kernel/KPluginIdentifiers.h"
 #include "ui/platform/KEditorWindowX11.h"
@@ -110,18 +111,16 @@ std::mutex gUIsLock;
 std::deque<KUIEntry> gUIs;  // never shrinks: hosts keep descriptor pointers
 
 const LV2UI_Descriptor* Find(const char* bundleName) {
-  for (const KPluginDescription& plugin : KProductCatalogue().plugins) {
-    if (KPluginIds::BundleName(plugin.key) != bundleName) continue;
-    const std::string uri = UIURI(KPluginIds::LV2URI(plugin.identity));
-    std::lock_guard<std::mutex> lock(gUIsLock);
-    for (const KUIEntry& entry : gUIs)
-      if (entry.uri == uri) return &entry.descriptor;
-    KUIEntry& entry = gUIs.emplace_back(KUIEntry{{}, uri});
-    // The editor follows the plug-in itself: no port events are needed.
-    entry.descriptor = {entry.uri.c_str(), Instantiate, Cleanup, nullptr, ExtensionData};
-    return &entry.descriptor;
-  }
-  return nullptr;
+  const KPluginDescription* plugin = BundlePlugin(bundleName);
+  if (!plugin) return nullptr;
+  const std::string uri = UIURI(KPluginIds::LV2URI(plugin->identity));
+  std::lock_guard<std::mutex> lock(gUIsLock);
+  for (const KUIEntry& entry : gUIs)
+    if (entry.uri == uri) return &entry.descriptor;
+  KUIEntry& entry = gUIs.emplace_back(KUIEntry{{}, uri});
+  // The editor follows the plug-in itself: no port events are needed.
+  entry.descriptor = {entry.uri.c_str(), Instantiate, Cleanup, nullptr, ExtensionData};
+  return &entry.descriptor;
 }
 
 }  // namespace

@@ -85,9 +85,7 @@ TEST_F(LV2UIWindow, TheUIShowsTheEditorOnTheInstanceAndWritesItsEditsToTheContro
     ASSERT_EQ(host.sizes, (std::vector<std::pair<int, int>>{{expected.Width(), expected.Height()}}));
     EXPECT_EQ(SizeOf(child), std::pair(expected.Width(), expected.Height()));
     // Meters left out: the one run lit them.
-    EXPECT_EQ(Differences(Screenshot(child, expected.Width(), expected.Height()), expected,
-                          KRect{0, 0, expected.Width() * 3 / 4, expected.Height() - 1}),
-              0);
+    EXPECT_EQ(DifferencesFromSnapshot(child, *offline, 1, KRect{0, 0, expected.Width() * 3 / 4, expected.Height() - 1}), 0);
 
     // A drag on the width knob: its port touched, written in working units, released.
     KAudioPluginBase::Parameter& width = *offline->FindParameter(KString("width"));

@@ -48,7 +48,13 @@ inline bool IsOneGesture(const std::string& kinds, char begin, char value, char 
 inline constexpr double kDragTravel = 40 / KValueControl::kDragTravel;  // the normalised change of DragDown
 
 struct EditorWindowFixture : ::testing::Test {
-  Display* display = XOpenDisplay(nullptr);
+  // One connection for the whole program: a virtual X server resets when its last client leaves,
+  // and would refuse the next test's connection while it does.
+  static Display* SharedDisplay() {
+    static Display* const shared = XOpenDisplay(nullptr);
+    return shared;
+  }
+  Display* display = SharedDisplay();
   Window parent = 0;
 
   void SetUp() override {
@@ -59,9 +65,8 @@ struct EditorWindowFixture : ::testing::Test {
     XSync(display, False);
   }
   void TearDown() override {
-    if (!display) return;
-    if (parent) XDestroyWindow(display, parent);
-    XCloseDisplay(display);
+    if (display && parent) XDestroyWindow(display, parent);
+    if (display) XSync(display, False);
   }
   // The editor's window: the one child of the host's window.
   Window Child() {
@@ -94,6 +99,12 @@ struct EditorWindowFixture : ::testing::Test {
       for (int32_t x = 0; x < width; ++x) picture.Row(y)[x] = 0xFF000000u | static_cast<uint32_t>(XGetPixel(image, x, y));
     XDestroyImage(image);
     return picture;
+  }
+  // How far `window` is from the plug-in's offline snapshot at `scale` (Differences below).
+  int64_t DifferencesFromSnapshot(Window window, KAudioPlugin& plugin, double scale, KRect area = {}) {
+    const KBitmap expected = KBitmap::Decode(KPluginEditorSnapshotPNG(plugin, scale, false), "snapshot");
+    const auto [width, height] = SizeOf(window);
+    return Differences(Screenshot(window, width, height), expected, area);
   }
   // Pixels further apart than the drawers' tolerance in any channel, within `area` (pixels; the
   // whole picture when empty); -1 for pictures of different sizes.

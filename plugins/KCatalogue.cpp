@@ -9,6 +9,7 @@
   PLUGIN(kCompressorDescription)  \
   PLUGIN(kEqualizerDescription)   \
   PLUGIN(kSampleWarmerDescription) \
+  PLUGIN(kEffectPipelineDescription) \
   /* new plug-ins above this line */
 
 #define TORVANE_DECLARE(description) extern const KPluginDescription description;
@@ -18,6 +19,7 @@ TORVANE_CATALOGUE(TORVANE_DECLARE)
 const KCatalogue& KProductCatalogue() {
   // Copied on first use, after every description has been initialised.
   static const KPluginDescription plugins[] = {TORVANE_CATALOGUE(TORVANE_LIST)};
-  static const KCatalogue catalogue{plugins, {}};
+  static constexpr const char* kPipelineHosts[] = {"KEffectPipeline"};
+  static const KCatalogue catalogue{plugins, kPipelineHosts};
   return catalogue;
 }

@@ -22,6 +22,7 @@ constexpr EditorEntry kEditors[] = {
     {"KCompressorPlugin", &KCompressorEditor},
     {"KEqualizerPlugin", &KEqualizerEditor},
     {"KSampleWarmer", &KSampleWarmerEditor},
+    {"KEffectPipeline", &KEffectPipelineEditor},
 };
 
 // The host layer makes editors through the factory, which sees no plug-in: this maker is it.

@@ -28,3 +28,4 @@ KEditorDescription KUtilityEditor();
 KEditorDescription KCompressorEditor();
 KEditorDescription KEqualizerEditor();
 KEditorDescription KSampleWarmerEditor();
+KEditorDescription KEffectPipelineEditor();

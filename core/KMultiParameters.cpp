@@ -1,9 +1,7 @@
 #include "core/KMultiParameters.h"
 
 #include <algorithm>
-#include <charconv>
 #include <cmath>
-#include <string>
 
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
@@ -14,14 +12,8 @@ const KString kMultiParameter = KString::Static("MultiParameter");
 const KString kTarget = KString::Static("Target");
 const KString kValue = KString::Static("Value");
 
-// An attribute as a number, or `fallback` when it is absent or no finite number.
 double NumberOf(const Element& element, const char* name, double fallback) {
-  const KString* text = element.FindAttribute(KString::Static(name));
-  if (!text) return fallback;
-  const std::string utf8 = text->ToUtf8();
-  double value = fallback;
-  const auto [end, error] = std::from_chars(utf8.data(), utf8.data() + utf8.size(), value);
-  return error == std::errc() && end == utf8.data() + utf8.size() && std::isfinite(value) ? value : fallback;
+  return KStateSection::ReadNumber(element, KString::Static(name), fallback);
 }
 }  // namespace
 

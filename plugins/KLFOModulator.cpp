@@ -1,23 +1,18 @@
 #include "plugins/KLFOModulator.h"
 
 #include <algorithm>
-#include <charconv>
 #include <cmath>
 #include <string>
 
 #include "core/KParameter.h"
+#include "core/KStateSection.h"
 #include "dsp/KNoteValues.h"
 
 namespace {
 constexpr double kDefaultTempo = 120.0;
 
 double NumberOf(const Element& element, const char* name, double fallback) {
-  const KString* text = element.FindAttribute(KString::Static(name));
-  if (!text) return fallback;
-  const std::string utf8 = text->ToUtf8();
-  double value = fallback;
-  const auto [end, error] = std::from_chars(utf8.data(), utf8.data() + utf8.size(), value);
-  return error == std::errc() && end == utf8.data() + utf8.size() && std::isfinite(value) ? value : fallback;
+  return KStateSection::ReadNumber(element, KString::Static(name), fallback);
 }
 
 // The index of `text` among `names`, or `fallback`.

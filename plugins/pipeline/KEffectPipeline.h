@@ -33,7 +33,7 @@ private:
 // it: slot kinds look modules up in the instance's own chains.
 struct KPipelineTable {
   static constexpr int32_t kSlots = KModuleChain::kSlots;
-  static constexpr int32_t kSlotParameters = 48;  // enough for an eight-band equalizer
+  static constexpr int32_t kSlotParameters = 12;
   static constexpr int32_t kSlotStride = 1 + kSlotParameters;
   static constexpr int32_t kParameterCount = kSlots * kSlotStride;
 
@@ -48,9 +48,9 @@ struct KPipelineTable {
 // moved and bypassed on its own, stored with the plug-in's state and as an "Effect pipeline
 // file" (core/KPipelineFile.h).
 //
-// Host parameters: eight fixed slots of 49 parameters each. Slot s (from 0) owns the indices
-// s·49 ("slot<s+1>bypass") and s·49 + 1 + p ("slot<s+1>param<p+1>", the module's parameter p,
-// up to 48). A module keeps the slot it was given from being added until it is removed; moving
+// Host parameters: six fixed slots of 13 parameters each. Slot s (from 0) owns the indices
+// s·13 ("slot<s+1>bypass") and s·13 + 1 + p ("slot<s+1>param<p+1>", the module's parameter p,
+// up to 12; a module's later parameters live in its state only). A module keeps the slot it was given from being added until it is removed; moving
 // it changes only the processing order, so automation stays with its module whatever the
 // order. Parameters past a module's own count, and those of free slots, do nothing.
 //

@@ -12,7 +12,7 @@
 // never changed once published (KHandOver): an edit makes a new chain that shares the modules
 // it keeps, so that they go on sounding (tails, delay lines) across the swap.
 struct KModuleChain {
-  static constexpr int32_t kSlots = 8;
+  static constexpr int32_t kSlots = 6;
 
   struct Stage {
     std::shared_ptr<KAudioPlugin> module;

@@ -120,7 +120,7 @@ TEST(KEffectPipeline, SlotsStayWithTheirModules) {
   EXPECT_EQ(pipeline->GetParameter(P::ParameterIndex(3, 0)).Text().ToUtf8(), "-");  // a free slot
   EXPECT_EQ(pipeline->GetParameter(P::ParameterIndex(1, KUtilityPlugin::kParameterCount)).Text().ToUtf8(), "-");
   EXPECT_EQ(pipeline->GetParameter(P::BypassIndex(0)).Key().ToUtf8(), "slot1bypass");
-  EXPECT_EQ(pipeline->GetParameter(P::ParameterIndex(7, 47)).Key().ToUtf8(), "slot8param48");
+  EXPECT_EQ(pipeline->GetParameter(P::ParameterIndex(5, 11)).Key().ToUtf8(), "slot6param12");
 
   // The value reaches the module in the audio thread's next block, whatever the order.
   std::vector<Signal> audio = Program(256);
@@ -138,7 +138,7 @@ TEST(KEffectPipeline, SlotsStayWithTheirModules) {
   EXPECT_THROW(pipeline->AddModule(KString::Static("NoSuchModule")), KException);
   EXPECT_THROW(pipeline->AddModule(KString::Static("KCompressorPlugin")), KException);  // a registry key, not a module key
   EXPECT_THROW(pipeline->RemoveModule(5), KException);
-  for (int i = 0; i < 5; ++i) pipeline->AddModule(KString::Static("Utility"));
+  while (pipeline->ModuleCount() < P::kSlots) pipeline->AddModule(KString::Static("Utility"));
   EXPECT_EQ(pipeline->ModuleCount(), P::kSlots);
   EXPECT_THROW(pipeline->AddModule(KString::Static("Utility")), KException);
 }

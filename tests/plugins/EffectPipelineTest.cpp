@@ -34,10 +34,11 @@ std::vector<Signal> Program(size_t length) {
   return in;
 }
 
-// Runs `plugin` over `in` in host blocks of `block` samples, in place.
+// Runs `plugin` over `in` in host blocks of `block` samples, in place; a side-chain bus gets no
+// buffers (silence), as in the pipeline.
 void Play(KAudioPlugin& plugin, std::vector<Signal>& audio, size_t block) {
   for (size_t at = 0; at < audio[0].size(); at += block) {
-    const float* i[] = {audio[0].data() + at, audio[1].data() + at};
+    const float* i[KAudioPlugin::kMaxChannels] = {audio[0].data() + at, audio[1].data() + at};
     float* o[] = {audio[0].data() + at, audio[1].data() + at};
     plugin.ProcessHostBlock(i, o, static_cast<int32_t>(std::min(block, audio[0].size() - at)));
   }

@@ -16,6 +16,7 @@
   PLUGIN(kMultibandCompressorDescription) \
   PLUGIN(kDynamicEqualizerDescription) \
   PLUGIN(kWaveshaperDescription) \
+  PLUGIN(kEffectPipelineDescription) \
   /* new plug-ins above this line */
 
 #define TORVANE_DECLARE(description) extern const KPluginDescription description;
@@ -25,6 +26,7 @@ TORVANE_CATALOGUE(TORVANE_DECLARE)
 const KCatalogue& KProductCatalogue() {
   // Copied on first use, after every description has been initialised.
   static const KPluginDescription plugins[] = {TORVANE_CATALOGUE(TORVANE_LIST)};
-  static const KCatalogue catalogue{plugins, {}};
+  static constexpr const char* kPipelineHosts[] = {"KEffectPipeline"};
+  static const KCatalogue catalogue{plugins, kPipelineHosts};
   return catalogue;
 }

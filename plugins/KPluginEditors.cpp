@@ -29,6 +29,7 @@ constexpr EditorEntry kEditors[] = {
     {"KMultibandCompressorPlugin", &KMultibandCompressorEditor},
     {"KDynamicEqualizerPlugin", &KDynamicEqualizerEditor},
     {"KWaveshaperPlugin", &KWaveshaperEditor},
+    {"KEffectPipeline", &KEffectPipelineEditor},
 };
 
 // The host layer makes editors through the factory, which sees no plug-in: this maker is it.

@@ -35,3 +35,4 @@ KEditorDescription KTransientShaperEditor();
 KEditorDescription KMultibandCompressorEditor();
 KEditorDescription KDynamicEqualizerEditor();
 KEditorDescription KWaveshaperEditor();
+KEditorDescription KEffectPipelineEditor();

@@ -9,6 +9,14 @@
   PLUGIN(kCompressorDescription)  \
   PLUGIN(kEqualizerDescription)   \
   PLUGIN(kSampleWarmerDescription) \
+  PLUGIN(kDelayDescription) \
+  PLUGIN(kReverbDescription) \
+  PLUGIN(kChorusDescription) \
+  PLUGIN(kFlangerDescription) \
+  PLUGIN(kPhaserDescription) \
+  PLUGIN(kTremoloDescription) \
+  PLUGIN(kAutoPanDescription) \
+  PLUGIN(kAutoFilterDescription) \
   /* new plug-ins above this line */
 
 #define TORVANE_DECLARE(description) extern const KPluginDescription description;

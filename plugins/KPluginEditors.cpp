@@ -22,6 +22,14 @@ constexpr EditorEntry kEditors[] = {
     {"KCompressorPlugin", &KCompressorEditor},
     {"KEqualizerPlugin", &KEqualizerEditor},
     {"KSampleWarmer", &KSampleWarmerEditor},
+    {"KDelayPlugin", &KDelayEditor},
+    {"KReverbPlugin", &KReverbEditor},
+    {"KChorusPlugin", &KChorusEditor},
+    {"KFlangerPlugin", &KFlangerEditor},
+    {"KPhaserPlugin", &KPhaserEditor},
+    {"KTremoloPlugin", &KTremoloEditor},
+    {"KAutoPanPlugin", &KAutoPanEditor},
+    {"KAutoFilterPlugin", &KAutoFilterEditor},
 };
 
 // The host layer makes editors through the factory, which sees no plug-in: this maker is it.

@@ -1,0 +1,46 @@
+#pragma once
+
+#include "dsp/KGlide.h"
+#include "kernel/KPluginDescription.h"
+#include "plugins/KLFOPlugin.h"
+
+// A tremolo: the level rises and falls with an LFO, between full and (1 − depth). The right
+// channel's LFO may run behind the left's, up to half a cycle for a tremolo that swings from
+// side to side. Smoothing rounds off the edges of the square and stepped shapes.
+class KTremoloPlugin final : public KLFOPlugin {
+  static inline const KTimeKind kSmoothingKind{0.0, 0.05};
+  static constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
+
+public:
+  static constexpr KParameterInfo kParameters[] = {
+      {"rate", "Rate", &KLFOControls::kRateKind, 4.0, kAutomatable},
+      {"sync", "Sync", &KLFOControls::kSyncKind, 0.0, kAutomatable},
+      {"shape", "Shape", &KLFOControls::kShapeKind, KLFO::kSine, kAutomatable},
+      {"depth", "Depth", &KLFOControls::kPercentKind, 50.0, kAutomatable},
+      {"spread", "Stereo phase", &KLFOControls::kStereoPhaseKind, 0.0, kAutomatable},
+      {"smoothing", "Smoothing", &kSmoothingKind, 0.002, kAutomatable},
+  };
+  static constexpr int32_t kDepth = KParameterRow(kParameters, "depth");
+  static constexpr KLFOControls kLFO{.shape = KParameterRow(kParameters, "shape"),
+                                     .rate = KParameterRow(kParameters, "rate"),
+                                     .sync = KParameterRow(kParameters, "sync"),
+                                     .stereoPhase = KParameterRow(kParameters, "spread"),
+                                     .smoothing = KParameterRow(kParameters, "smoothing")};
+
+  KTremoloPlugin() : KLFOPlugin(kParameters, kLFO) {}
+  static KAudioPlugin* Create(KModule* context, const KPluginRecord* record);
+  uint32_t TailSamples() const noexcept override { return 0; }
+
+protected:
+  void UpdateEffect(bool jump) noexcept override;
+  void ProcessEffect(const float* const* inputs, float* const* outputs, int32_t channels, int32_t n) noexcept override;
+
+private:
+  static constexpr int32_t kPiece = 256;
+  KGlide<1> depth_;
+  double depthLane_[kPiece] = {};
+  double sweep_[kPiece] = {};
+};
+
+extern const KPluginDescription kTremoloDescription;
+const KPluginHelp& KTremoloHelp();

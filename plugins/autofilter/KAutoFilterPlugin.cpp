@@ -64,11 +64,13 @@ void KAutoFilterPlugin::ProcessEffect(const float* const* inputs, float* const* 
       float* out = outputs[c] + done;
       KSectionState& state = states_[c];
       KGlide<5>& glide = coefficients_[c];
+      bool jump = jump_;  // only the first design after a reset lands at once
       for (int32_t i = 0, at = first; i < m;) {
         if (at == 0) {
           KFilterSection section;
           Design(section, sweep_[i]);
-          glide.Aim(&section.b0, kStep, jump_);
+          glide.Aim(&section.b0, kStep, jump);
+          jump = false;
         }
         const int32_t length = std::min(kStep - at, m - i);
         for (int32_t k = 0; k < 5; ++k) glide.Fill(k, row_[k], length);

@@ -21,7 +21,7 @@ struct KLFOControls {
   static inline const KListKind kShapeKind{KLFO::kShapeNames};
   static inline const KFrequencyKind kRateKind{0.02, 20.0};
   static inline const KListKind kSyncKind{kSyncNames};
-  static inline const KNumberKind kStereoPhaseKind{0.0, 180.0, "°", "{0}"};
+  static inline const KNumberKind kStereoPhaseKind{0.0, 180.0, "\xB0", "{0}"};  // degrees; units are Latin-1 literals
   static inline const KNumberKind kPercentKind{0.0, 100.0, "%", "{0.0}"};
   static constexpr double kTempoUnknown = 120.0;  // what a synced LFO follows when the host tells no tempo
 

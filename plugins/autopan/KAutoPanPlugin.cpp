@@ -27,32 +27,23 @@ constinit const KPluginDescription kAutoPanDescription{
     .help = &KAutoPanHelp,
 };
 
-void KAutoPanPlugin::UpdateEffect(bool jump) noexcept {
-  const double width = GetParameter(kWidth).Working() / 100.0;
-  width_.Aim(&width, static_cast<int32_t>(0.02 * SampleRate()), jump);
-}
-
-void KAutoPanPlugin::ProcessEffect(const float* const* inputs, float* const* outputs, int32_t channels, int32_t n) noexcept {
-  for (int32_t done = 0; done < n; done += kPiece) {
-    const int32_t m = std::min(kPiece, n - done);
-    width_.Fill(0, widthLane_, m);
-    width_.Passed(m);
-    lfos_.Fill(0, sweep_, m);
-    if (channels < 2) {
-      for (int32_t i = 0; i < m; ++i) outputs[0][done + i] = std::isfinite(inputs[0][done + i]) ? inputs[0][done + i] : 0.0f;
-      continue;
-    }
-    const float* inL = inputs[0] + done;
-    const float* inR = inputs[1] + done;
-    float* outL = outputs[0] + done;
-    float* outR = outputs[1] + done;
-    for (int32_t i = 0; i < m; ++i) {
-      // The balance from −1 (left) to +1 (right): the side turned away fades, the other stays.
-      const double balance = widthLane_[i] * sweep_[i];
-      const double left = 1.0 - std::max(balance, 0.0), right = 1.0 + std::min(balance, 0.0);
-      const double xL = std::isfinite(inL[i]) ? inL[i] : 0.0, xR = std::isfinite(inR[i]) ? inR[i] : 0.0;
-      outL[i] = static_cast<float>(left * xL);
-      outR[i] = static_cast<float>(right * xR);
-    }
+void KAutoPanPlugin::ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels, int32_t from, int32_t n,
+                                  const double* width) noexcept {
+  lfos_.Fill(0, sweep_, n);
+  if (channels < 2) {
+    for (int32_t i = 0; i < n; ++i) outputs[0][from + i] = std::isfinite(inputs[0][from + i]) ? inputs[0][from + i] : 0.0f;
+    return;
+  }
+  const float* inL = inputs[0] + from;
+  const float* inR = inputs[1] + from;
+  float* outL = outputs[0] + from;
+  float* outR = outputs[1] + from;
+  for (int32_t i = 0; i < n; ++i) {
+    // The balance from −1 (left) to +1 (right): the side turned away fades, the other stays.
+    const double balance = width[i] * sweep_[i];
+    const double left = 1.0 - std::max(balance, 0.0), right = 1.0 + std::min(balance, 0.0);
+    const double xL = std::isfinite(inL[i]) ? inL[i] : 0.0, xR = std::isfinite(inR[i]) ? inR[i] : 0.0;
+    outL[i] = static_cast<float>(left * xL);
+    outR[i] = static_cast<float>(right * xR);
   }
 }

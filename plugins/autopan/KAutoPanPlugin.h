@@ -1,13 +1,12 @@
 #pragma once
 
-#include "dsp/KGlide.h"
 #include "kernel/KPluginDescription.h"
-#include "plugins/KLFOPlugin.h"
+#include "plugins/KLFOAmountPlugin.h"
 
 // An auto-pan: an LFO moves the balance between the two channels. At the LFO's top the left
 // channel is silent, at its bottom the right, at its middle both pass at full level; width
 // scales how far the balance travels. A single channel passes unchanged.
-class KAutoPanPlugin final : public KLFOPlugin {
+class KAutoPanPlugin final : public KLFOAmountPlugin {
   static inline const KTimeKind kSmoothingKind{0.0, 0.05};
   static constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
 
@@ -25,19 +24,12 @@ public:
                                      .sync = KParameterRow(kParameters, "sync"),
                                      .smoothing = KParameterRow(kParameters, "smoothing")};
 
-  KAutoPanPlugin() : KLFOPlugin(kParameters, kLFO) {}
+  KAutoPanPlugin() : KLFOAmountPlugin(kParameters, kLFO, kWidth) {}
   static KAudioPlugin* Create(KModule* context, const KPluginRecord* record);
-  uint32_t TailSamples() const noexcept override { return 0; }
 
 protected:
-  void UpdateEffect(bool jump) noexcept override;
-  void ProcessEffect(const float* const* inputs, float* const* outputs, int32_t channels, int32_t n) noexcept override;
-
-private:
-  static constexpr int32_t kPiece = 256;
-  KGlide<1> width_;
-  double widthLane_[kPiece] = {};
-  double sweep_[kPiece] = {};
+  void ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels, int32_t from, int32_t n,
+                    const double* width) noexcept override;
 };
 
 extern const KPluginDescription kAutoPanDescription;

@@ -1,6 +1,5 @@
 #include "plugins/tremolo/KTremoloPlugin.h"
 
-#include <algorithm>
 #include <cmath>
 
 #include "core/KParameter.h"
@@ -27,25 +26,16 @@ constinit const KPluginDescription kTremoloDescription{
     .help = &KTremoloHelp,
 };
 
-void KTremoloPlugin::UpdateEffect(bool jump) noexcept {
-  const double depth = GetParameter(kDepth).Working() / 100.0;
-  depth_.Aim(&depth, static_cast<int32_t>(0.02 * SampleRate()), jump);
-}
-
-void KTremoloPlugin::ProcessEffect(const float* const* inputs, float* const* outputs, int32_t channels, int32_t n) noexcept {
-  for (int32_t done = 0; done < n; done += kPiece) {
-    const int32_t m = std::min(kPiece, n - done);
-    depth_.Fill(0, depthLane_, m);
-    depth_.Passed(m);
-    for (int32_t c = 0; c < channels; ++c) {
-      lfos_.Fill(c, sweep_, m);
-      const float* in = inputs[c] + done;
-      float* out = outputs[c] + done;
-      for (int32_t i = 0; i < m; ++i) {
-        // Full level at the LFO's top, 1 − depth at its bottom.
-        const double gain = 1.0 - depthLane_[i] * (0.5 - 0.5 * sweep_[i]);
-        out[i] = std::isfinite(in[i]) ? static_cast<float>(gain * in[i]) : 0.0f;
-      }
+void KTremoloPlugin::ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels, int32_t from, int32_t n,
+                                  const double* depth) noexcept {
+  for (int32_t c = 0; c < channels; ++c) {
+    lfos_.Fill(c, sweep_, n);
+    const float* in = inputs[c] + from;
+    float* out = outputs[c] + from;
+    for (int32_t i = 0; i < n; ++i) {
+      // Full level at the LFO's top, 1 − depth at its bottom.
+      const double gain = 1.0 - depth[i] * (0.5 - 0.5 * sweep_[i]);
+      out[i] = std::isfinite(in[i]) ? static_cast<float>(gain * in[i]) : 0.0f;
     }
   }
 }

@@ -1,13 +1,12 @@
 #pragma once
 
-#include "dsp/KGlide.h"
 #include "kernel/KPluginDescription.h"
-#include "plugins/KLFOPlugin.h"
+#include "plugins/KLFOAmountPlugin.h"
 
 // A tremolo: the level rises and falls with an LFO, between full and (1 − depth). The right
 // channel's LFO may run behind the left's, up to half a cycle for a tremolo that swings from
 // side to side. Smoothing rounds off the edges of the square and stepped shapes.
-class KTremoloPlugin final : public KLFOPlugin {
+class KTremoloPlugin final : public KLFOAmountPlugin {
   static inline const KTimeKind kSmoothingKind{0.0, 0.05};
   static constexpr uint32_t kAutomatable = KParameterInfo::kAutomatable;
 
@@ -27,19 +26,12 @@ public:
                                      .stereoPhase = KParameterRow(kParameters, "spread"),
                                      .smoothing = KParameterRow(kParameters, "smoothing")};
 
-  KTremoloPlugin() : KLFOPlugin(kParameters, kLFO) {}
+  KTremoloPlugin() : KLFOAmountPlugin(kParameters, kLFO, kDepth) {}
   static KAudioPlugin* Create(KModule* context, const KPluginRecord* record);
-  uint32_t TailSamples() const noexcept override { return 0; }
 
 protected:
-  void UpdateEffect(bool jump) noexcept override;
-  void ProcessEffect(const float* const* inputs, float* const* outputs, int32_t channels, int32_t n) noexcept override;
-
-private:
-  static constexpr int32_t kPiece = 256;
-  KGlide<1> depth_;
-  double depthLane_[kPiece] = {};
-  double sweep_[kPiece] = {};
+  void ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels, int32_t from, int32_t n,
+                    const double* depth) noexcept override;
 };
 
 extern const KPluginDescription kTremoloDescription;

@@ -26,6 +26,7 @@ constinit const KPluginDescription kAutoFilterDescription{
     .vst2Id = "TvAF",
     .identity = "KAutoFilterPlugin",
     .help = &KAutoFilterHelp,
+    .presets = kPresets,
 };
 
 void KAutoFilterPlugin::Design(KFilterSection& section, double sweep) const noexcept {

@@ -25,6 +25,7 @@ constinit const KPluginDescription kAutoPanDescription{
     .vst2Id = "TvAP",
     .identity = "KAutoPanPlugin",
     .help = &KAutoPanHelp,
+    .presets = kPresets,
 };
 
 void KAutoPanPlugin::ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels, int32_t from, int32_t n,

@@ -20,4 +20,5 @@ constinit const KPluginDescription kChorusDescription{
     .vst2Id = "TvCh",
     .identity = "KChorusPlugin",
     .help = &KChorusHelp,
+    .presets = kPresets,
 };

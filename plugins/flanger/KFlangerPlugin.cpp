@@ -20,4 +20,5 @@ constinit const KPluginDescription kFlangerDescription{
     .vst2Id = "TvFl",
     .identity = "KFlangerPlugin",
     .help = &KFlangerHelp,
+    .presets = kPresets,
 };

@@ -28,6 +28,7 @@ constinit const KPluginDescription kPhaserDescription{
     .vst2Id = "TvPh",
     .identity = "KPhaserPlugin",
     .help = &KPhaserHelp,
+    .presets = kPresets,
 };
 
 double KPhaserPlugin::Coefficient(double frequency, double sampleRate) noexcept {

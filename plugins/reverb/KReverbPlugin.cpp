@@ -56,6 +56,7 @@ constinit const KPluginDescription kReverbDescription{
     .vst2Id = "TvRv",
     .identity = "KReverbPlugin",
     .help = &KReverbHelp,
+    .presets = kPresets,
 };
 
 int32_t KReverbPlugin::LineLength(int32_t line) const noexcept {

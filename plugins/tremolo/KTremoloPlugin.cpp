@@ -24,6 +24,7 @@ constinit const KPluginDescription kTremoloDescription{
     .vst2Id = "TvTr",
     .identity = "KTremoloPlugin",
     .help = &KTremoloHelp,
+    .presets = kPresets,
 };
 
 void KTremoloPlugin::ProcessPiece(const float* const* inputs, float* const* outputs, int32_t channels, int32_t from, int32_t n,

@@ -81,7 +81,11 @@ void KLFO::Follow(double quarterNotes) noexcept {
   const double cycles = quarterNotes / quarters_ + start_;
   const double wanted = (cycles - std::floor(cycles)) * length_;
   const double off = std::abs(wanted - position_);
-  if (std::min(off, length_ - off) > 0.5) position_ = std::min(wanted, std::nextafter(length_, 0.0));
+  if (std::min(off, length_ - off) > 0.5) SetPhase(cycles);
+}
+
+void KLFO::SetPhase(double cycles) noexcept {
+  position_ = std::min((cycles - std::floor(cycles)) * length_, std::nextafter(length_, 0.0));
 }
 
 double KLFO::Value(int32_t shape, double phase) noexcept {

@@ -44,6 +44,9 @@ public:
   // should be, when it is more than half a sample away; a host that plays on steadily never moves
   // it, so the output does not depend on how the host cuts its blocks.
   void Follow(double quarterNotes) noexcept;
+  // Puts the cycle at a phase (in cycles, wrapped), without touching the random values or the
+  // smoothing; for LFOs that must keep a set distance from another one.
+  void SetPhase(double cycles) noexcept;
   // Writes the next n values.
   void Fill(double* out, int32_t n) noexcept;
 

@@ -17,6 +17,14 @@
   PLUGIN(kDynamicEqualizerDescription) \
   PLUGIN(kWaveshaperDescription) \
   PLUGIN(kEffectPipelineDescription) \
+  PLUGIN(kDelayDescription) \
+  PLUGIN(kReverbDescription) \
+  PLUGIN(kChorusDescription) \
+  PLUGIN(kFlangerDescription) \
+  PLUGIN(kPhaserDescription) \
+  PLUGIN(kTremoloDescription) \
+  PLUGIN(kAutoPanDescription) \
+  PLUGIN(kAutoFilterDescription) \
   /* new plug-ins above this line */
 
 #define TORVANE_DECLARE(description) extern const KPluginDescription description;

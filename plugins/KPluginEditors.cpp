@@ -30,6 +30,14 @@ constexpr EditorEntry kEditors[] = {
     {"KDynamicEqualizerPlugin", &KDynamicEqualizerEditor},
     {"KWaveshaperPlugin", &KWaveshaperEditor},
     {"KEffectPipeline", &KEffectPipelineEditor},
+    {"KDelayPlugin", &KDelayEditor},
+    {"KReverbPlugin", &KReverbEditor},
+    {"KChorusPlugin", &KChorusEditor},
+    {"KFlangerPlugin", &KFlangerEditor},
+    {"KPhaserPlugin", &KPhaserEditor},
+    {"KTremoloPlugin", &KTremoloEditor},
+    {"KAutoPanPlugin", &KAutoPanEditor},
+    {"KAutoFilterPlugin", &KAutoFilterEditor},
 };
 
 // The host layer makes editors through the factory, which sees no plug-in: this maker is it.

@@ -20,6 +20,14 @@ inline void KCountPerSampleChannel(benchmark::State& state, int64_t samples) {
 // path's (register with ->UseManualTime()). Each call gets the block number; `samples` counts a
 // block's samples over all its channels. Reports the cost per sample of both and "ratio", how
 // many times longer the reference takes.
+// The counters of a timed pair: `count` samples over all channels took `hot` and `plain`
+// seconds on the hot path and on the reference.
+inline void KReportPair(benchmark::State& state, double count, double hot, double plain) {
+  state.counters["ns_per_sample_channel"] = hot / count;
+  state.counters["reference_ns_per_sample_channel"] = plain / count;
+  state.counters["ratio"] = plain / hot;
+}
+
 template <class HotPath, class Reference>
 void KTimePair(benchmark::State& state, int64_t samples, HotPath&& hotPath, Reference&& reference) {
   using Clock = std::chrono::steady_clock;
@@ -37,11 +45,8 @@ void KTimePair(benchmark::State& state, int64_t samples, HotPath&& hotPath, Refe
     hot += middle - start;
     plain += end - middle;
   }
-  const double count = static_cast<double>(block * samples);
-  const auto perSample = [count](Clock::duration t) { return std::chrono::duration<double>(t).count() / count; };
-  state.counters["ns_per_sample_channel"] = perSample(hot);
-  state.counters["reference_ns_per_sample_channel"] = perSample(plain);
-  state.counters["ratio"] = perSample(plain) / perSample(hot);
+  const auto seconds = [](Clock::duration t) { return std::chrono::duration<double>(t).count(); };
+  KReportPair(state, static_cast<double>(block * samples), seconds(hot), seconds(plain));
 }
 
 // The largest difference between two sets of channels, for a "max_difference" counter: NaN when

@@ -102,8 +102,10 @@ void KAudioPlugin::ProcessHostBlock(const float* const* inputs, float* const* ou
   }
   // Every message of the block arrives within it, even when there was no audio to cut or it is
   // stamped past the block's end (a host's mistake): no note hangs, none is carried over.
-  ProcessMIDIQueue(midi_, INT32_MAX);
-  midi_.Clear();
+  if (midi_.Count() > 0) {
+    ProcessMIDIQueue(midi_, INT32_MAX);
+    midi_.Clear();
+  }
 }
 
 void KAudioPlugin::PassThrough(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept {
@@ -145,7 +147,7 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
   const int32_t mode = chunkMode_ = channelsPerBus_ == 2 ? ChannelMode() : KChannelMode::kLeftRight;
   alignas(16) float scratch[kScratchSamples];
   const int32_t stride = ChunkLength();
-  for (int32_t c = 0; c + 1 < inputCount; c += 2)
+  for (int32_t c = 0; c + 1 < inputCount && mode != KChannelMode::kLeftRight; c += 2)
     KChannelMode::RouteInputs(mode, in[c], in[c + 1], scratch + c * stride, scratch + (c + 1) * stride, length);
   if (KChannelMode::SwapsOutputs(mode))
     for (int32_t c = 0; c + 1 < outputCount; c += 2) std::swap(out[c], out[c + 1]);
@@ -155,7 +157,7 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
   int32_t next = std::max(1, InterpolationPrepare(length, cap, fineSubBlockCap_));
   // Without event splitting every message of the chunk is handed over before its audio.
   const int32_t eventEnd = shape_.splitsAtEvents ? start + 1 : start + length;
-  ProcessMIDIQueue(midi_, eventEnd);
+  if (midi_.Count() > 0) ProcessMIDIQueue(midi_, eventEnd);
   int32_t stamp;
   if (shape_.splitsAtEvents && midi_.NextTimeStamp(stamp) && stamp - start < next) next = std::max(1, stamp - start);
 
@@ -202,8 +204,10 @@ void KAudioPlugin::ProcessAudio(const float* const* inputs, float* const* output
 void KAudioPlugin::ProcessAudio_Prepare(const float* const* inputs, int32_t sampleCount) noexcept {
   KGuard("KAudioPlugin::ProcessAudio_Prepare", [&] {
     // The meters show the main bus only: a mono plug-in's side-chain is no right channel.
-    const int32_t metered = shape_.inputBuses > 0 ? std::min(channelsPerBus_, 2) : 0;
-    for (int32_t c = 0; c < metered; ++c) meters_[kInputLeft + c].Accumulate(inputs[c], sampleCount);
+    if (shape_.inputBuses > 0 && channelsPerBus_ >= 2)
+      KLevelMeter::AccumulatePair(meters_[kInputLeft], meters_[kInputRight], inputs[0], inputs[1], sampleCount);
+    else if (shape_.inputBuses > 0)
+      meters_[kInputLeft].Accumulate(inputs[0], sampleCount);
   });
 }
 
@@ -213,14 +217,12 @@ void KAudioPlugin::ProcessAudio_Finish(float* const* outputs, int32_t sampleCoun
     // channel is the plug-in's second.
     const int32_t outputCount = OutputChannelCount();
     const int32_t swapped = KChannelMode::SwapsOutputs(chunkMode_) ? 1 : 0;
-    for (int32_t c = 0; c + 1 < outputCount; c += 2)
+    for (int32_t c = 0; c + 1 < outputCount && chunkMode_ != KChannelMode::kLeftRight; c += 2)
       KChannelMode::RestoreOutputs(chunkMode_, outputs[c + swapped], outputs[c + 1 - swapped], sampleCount);
-    if (shape_.outputBuses > 0 && channelsPerBus_ >= 2) {
-      meters_[kOutputLeft].Accumulate(outputs[swapped], sampleCount);
-      meters_[kOutputRight].Accumulate(outputs[1 - swapped], sampleCount);
-    } else if (shape_.outputBuses > 0) {
+    if (shape_.outputBuses > 0 && channelsPerBus_ >= 2)
+      KLevelMeter::AccumulatePair(meters_[kOutputLeft], meters_[kOutputRight], outputs[swapped], outputs[1 - swapped], sampleCount);
+    else if (shape_.outputBuses > 0)
       meters_[kOutputLeft].Accumulate(outputs[0], sampleCount);
-    }
     if (meterReset_.load(std::memory_order_relaxed))
       for (KLevelMeter& meter : meters_) meter.Reset();
   });

@@ -142,8 +142,9 @@ int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& sub
     return limit;
   }
   // Values must land at once: every ramp jumps to its end and retires. Both pools belong to
-  // the audio thread, so this needs no lock.
-  stateFlags_.fetch_and(~kJump, std::memory_order_acq_rel);
+  // the audio thread, so this needs no lock. Most blocks come here with no jump asked and no
+  // ramp: they make no locked write.
+  if (jump) stateFlags_.fetch_and(~kJump, std::memory_order_acq_rel);
   while (ParameterRamp* ramp = active_.Head()) {
     ApplyLast(*ramp);
     Retire(ramp);

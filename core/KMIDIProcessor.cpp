@@ -12,7 +12,7 @@ using Handler = void (KMIDIProcessorBase::*)(const KMIDIEvent&);
 
 // A KException ends only the event that raised it; anything else is traced under the
 // handler's operation name.
-void Deliver(KMIDIProcessorBase& receiver, Handler handler, const KString& operation, const KMIDIEvent& event) noexcept {
+void Deliver(KMIDIProcessorBase& receiver, Handler handler, const char* operation, const KMIDIEvent& event) noexcept {
   KGuard(operation, [&] {
     try {
       (receiver.*handler)(event);

@@ -215,7 +215,7 @@ void ApplyGains(const double* gains, const float* in, float* out, int32_t frames
     _mm256_storeu_pd(sums + i, _mm256_mul_pd(k, s));
   }
   _mm256_zeroupper();
-  SquareSum(x, channels, i, frames, gIn, share, sums);
+  if (i < frames) SquareSum(x, channels, i, frames, gIn, share, sums);
 }
 
 [[gnu::target("avx")]] float StoreGainsWide(const double* gains, float* stored, int32_t frames, float lowest) noexcept {
@@ -230,7 +230,7 @@ void ApplyGains(const double* gains, const float* in, float* out, int32_t frames
   float lanes[4];
   _mm_storeu_ps(lanes, low);
   for (float lane : lanes) lowest = lane < lowest ? lane : lowest;
-  return StoreGains(gains + i, stored + i, frames - i, lowest);
+  return i < frames ? StoreGains(gains + i, stored + i, frames - i, lowest) : lowest;
 }
 
 [[gnu::target("avx")]] void ApplyGainsWide(const double* gains, const float* in, float* out, int32_t frames) noexcept {
@@ -238,7 +238,7 @@ void ApplyGains(const double* gains, const float* in, float* out, int32_t frames
   for (; i + 4 <= frames; i += 4)
     _mm_storeu_ps(out + i, _mm256_cvtpd_ps(_mm256_mul_pd(_mm256_loadu_pd(gains + i), _mm256_cvtps_pd(_mm_loadu_ps(in + i)))));
   _mm256_zeroupper();
-  ApplyGains(gains + i, in + i, out + i, frames - i);
+  if (i < frames) ApplyGains(gains + i, in + i, out + i, frames - i);
 }
 
 }  // namespace

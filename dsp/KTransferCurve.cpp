@@ -102,15 +102,24 @@ struct KTransferLaws {
   using V = __m128d;
   static V Select(V mask, V yes, V no) noexcept { return _mm_or_pd(_mm_and_pd(mask, yes), _mm_andnot_pd(mask, no)); }
   static V LineNumerator(const K& k, V d) noexcept { return _mm_add_pd(_mm_set1_pd(k.bG_), _mm_mul_pd(_mm_set1_pd(k.mG_), d)); }
+  // The envelope moves slowly, so its levels come in long runs on one side of a bound: a register
+  // whose levels all rest at G, or that holds none inside the knee, skips the work whose lanes the
+  // selects would drop (a NaN rests nowhere and lies inside the knee, and takes every path).
   static V HardGain(const K& k, V d) noexcept {
-    return Select(_mm_cmple_pd(d, _mm_set1_pd(k.t_)), _mm_set1_pd(k.g_), _mm_div_pd(LineNumerator(k, d), d));
+    const V rest = _mm_cmple_pd(d, _mm_set1_pd(k.t_));
+    if (_mm_movemask_pd(rest) == 3) return _mm_set1_pd(k.g_);
+    return Select(rest, _mm_set1_pd(k.g_), _mm_div_pd(LineNumerator(k, d), d));
   }
   // Below the knee G; above it the line, inside it the knee's level times G, either over d: the
   // numerators are chosen first, so that one division serves both.
   template <V (*Knee)(const K&, V)>
   static V KneeGain(const K& k, V d) noexcept {
-    const V numerator = Select(_mm_cmpge_pd(d, _mm_set1_pd(k.s1_)), LineNumerator(k, d), _mm_mul_pd(Knee(k, d), _mm_set1_pd(k.g_)));
-    return Select(_mm_cmple_pd(d, _mm_set1_pd(k.s0_)), _mm_set1_pd(k.g_), _mm_div_pd(numerator, d));
+    const V rest = _mm_cmple_pd(d, _mm_set1_pd(k.s0_)), line = _mm_cmpge_pd(d, _mm_set1_pd(k.s1_));
+    if (_mm_movemask_pd(rest) == 3) return _mm_set1_pd(k.g_);
+    const V numerator = _mm_movemask_pd(_mm_or_pd(rest, line)) == 3
+                            ? LineNumerator(k, d)
+                            : Select(line, LineNumerator(k, d), _mm_mul_pd(Knee(k, d), _mm_set1_pd(k.g_)));
+    return Select(rest, _mm_set1_pd(k.g_), _mm_div_pd(numerator, d));
   }
   static V Chord(const K& k, V d) noexcept {
     return _mm_add_pd(_mm_set1_pd(k.y0_),
@@ -140,13 +149,18 @@ struct KTransferLaws {
     return _mm256_add_pd(_mm256_set1_pd(k.bG_), _mm256_mul_pd(_mm256_set1_pd(k.mG_), d));
   }
   [[gnu::target("avx")]] static W HardGain(const K& k, W d) noexcept {
-    return Select(_mm256_cmp_pd(d, _mm256_set1_pd(k.t_), _CMP_LE_OQ), _mm256_set1_pd(k.g_), _mm256_div_pd(LineNumerator(k, d), d));
+    const W rest = _mm256_cmp_pd(d, _mm256_set1_pd(k.t_), _CMP_LE_OQ);
+    if (_mm256_movemask_pd(rest) == 15) return _mm256_set1_pd(k.g_);
+    return Select(rest, _mm256_set1_pd(k.g_), _mm256_div_pd(LineNumerator(k, d), d));
   }
   template <W (*Knee)(const K&, W)>
   [[gnu::target("avx")]] static W KneeGain(const K& k, W d) noexcept {
-    const W numerator = Select(_mm256_cmp_pd(d, _mm256_set1_pd(k.s1_), _CMP_GE_OQ), LineNumerator(k, d),
-                               _mm256_mul_pd(Knee(k, d), _mm256_set1_pd(k.g_)));
-    return Select(_mm256_cmp_pd(d, _mm256_set1_pd(k.s0_), _CMP_LE_OQ), _mm256_set1_pd(k.g_), _mm256_div_pd(numerator, d));
+    const W rest = _mm256_cmp_pd(d, _mm256_set1_pd(k.s0_), _CMP_LE_OQ), line = _mm256_cmp_pd(d, _mm256_set1_pd(k.s1_), _CMP_GE_OQ);
+    if (_mm256_movemask_pd(rest) == 15) return _mm256_set1_pd(k.g_);
+    const W numerator = _mm256_movemask_pd(_mm256_or_pd(rest, line)) == 15
+                            ? LineNumerator(k, d)
+                            : Select(line, LineNumerator(k, d), _mm256_mul_pd(Knee(k, d), _mm256_set1_pd(k.g_)));
+    return Select(rest, _mm256_set1_pd(k.g_), _mm256_div_pd(numerator, d));
   }
   [[gnu::target("avx")]] static W Chord(const K& k, W d) noexcept {
     return _mm256_add_pd(_mm256_set1_pd(k.y0_), _mm256_mul_pd(_mm256_mul_pd(_mm256_sub_pd(d, _mm256_set1_pd(k.s0_)), _mm256_set1_pd(k.w_)),

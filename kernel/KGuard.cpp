@@ -11,3 +11,5 @@ void KReportSystemException(const KString& operation) noexcept {
     KTrace(operation);
   }
 }
+
+void KReportSystemException(const char* operation) noexcept { KReportSystemException(KString::Static(operation)); }

@@ -45,13 +45,15 @@ public:
   }
 
 private:
-  // The number of messages now in taken_ (0 when the lock was busy).
+  // The number of messages now in taken_ (0 when the lock was busy or nothing was appended).
   int32_t Swap() noexcept;
 
   std::mutex lock_;
   std::unique_ptr<Message[]> storage_;
   Message* filling_;  // under lock_
   int32_t count_ = 0;
+  // Set with the first append after a swap: most blocks find it clear and take no lock at all.
+  std::atomic<bool> filled_{false};
   Message* taken_;  // the processing thread's, between swaps
   std::atomic<std::thread::id> processThread_{};
 };

@@ -141,22 +141,36 @@ TEST_F(ProcessingCycleTest, DenormalsAreFlushedInsideProcessAndTheCallersModeIsR
 }
 #endif
 
-// The peak of every length (the vector loop and its scalar end), NaN samples skipped, and the
-// peak held across calls.
+// The peak of every length (the wide and narrow vector loops and the scalar end), wherever it
+// lies, NaN samples skipped (in a vector loop and at the end), and the peak held across calls.
 TEST(KLevelMeter, PeakOfAnyLengthSkipsNaN) {
-  for (int32_t n : {0, 1, 15, 16, 17, 64, 100}) {
-    std::vector<float> samples(static_cast<size_t>(n));
-    for (int32_t i = 0; i < n; ++i) samples[static_cast<size_t>(i)] = (i % 3 == 0 ? -1.0f : 0.5f) * static_cast<float>(i) / 128.0f;
-    if (n > 5) samples[5] = NAN;
-    KLevelMeter meter;
-    meter.Accumulate(samples.data(), n);
-    float peak = 0.0f;  // the plain way
-    for (float v : samples) peak = std::abs(v) > peak ? std::abs(v) : peak;
-    EXPECT_EQ(meter.Level(), peak) << n;
-    const float louder = 2.0f, quieter = 0.0f;
-    meter.Accumulate(&quieter, 1);
-    EXPECT_EQ(meter.Level(), peak) << n;
-    meter.Accumulate(&louder, 1);
-    EXPECT_EQ(meter.Level(), 2.0f) << n;
+  for (int32_t n : {0, 1, 15, 16, 17, 31, 32, 33, 48, 63, 64, 100}) {
+    for (int32_t at : {0, 9, 20, n - 1}) {
+      std::vector<float> samples(static_cast<size_t>(n));
+      for (int32_t i = 0; i < n; ++i) samples[static_cast<size_t>(i)] = (i % 3 == 0 ? -1.0f : 0.5f) * static_cast<float>(i) / 128.0f;
+      if (at >= 0 && at < n) samples[static_cast<size_t>(at)] = -1.5f;
+      if (n > 5) samples[5] = NAN;
+      if (n > 40) samples[static_cast<size_t>(n - 2)] = NAN;
+      KLevelMeter meter;
+      meter.Accumulate(samples.data(), n);
+      float peak = 0.0f;  // the plain way
+      for (float v : samples) peak = std::abs(v) > peak ? std::abs(v) : peak;
+      EXPECT_EQ(meter.Level(), peak) << n << " " << at;
+      // A pair metered together: each side as alone, the right one with its peak elsewhere.
+      std::vector<float> reversed(samples.rbegin(), samples.rend());
+      float reversedPeak = 0.25f;  // held from before
+      for (float v : reversed) reversedPeak = std::abs(v) > reversedPeak ? std::abs(v) : reversedPeak;
+      KLevelMeter left, right;
+      const float held = 0.25f;
+      right.Accumulate(&held, 1);
+      KLevelMeter::AccumulatePair(left, right, samples.data(), reversed.data(), n);
+      EXPECT_EQ(left.Level(), peak) << n << " " << at;
+      EXPECT_EQ(right.Level(), reversedPeak) << n << " " << at;
+      const float louder = 2.0f, quieter = 0.0f;
+      meter.Accumulate(&quieter, 1);
+      EXPECT_EQ(meter.Level(), peak) << n;
+      meter.Accumulate(&louder, 1);
+      EXPECT_EQ(meter.Level(), 2.0f) << n;
+    }
   }
 }

@@ -68,12 +68,14 @@ TEST(TransferShape, WalkingSearchAndCustomGain) {
 }
 
 // The block law is the per-level law to the last bit, for every variant, across every region of
-// the knee, for odd lengths (the scalar tail) and NaN.
+// the knee, for odd lengths (the scalar tail) and NaN; also for runs of four and of two that rest
+// entirely, that jump across the knee without a level inside it, or that hold a NaN.
 TEST(TransferCurve, BlockGainsEqualTheLawLevelByLevel) {
   KTransferShape shape;
   const KTransferShape::Point points[] = {{0.0, 0.0}, {0.3, 0.35}, {1.0, 0.7}};
   shape.SetPoints(points, 3);
-  std::vector<double> levels;
+  std::vector<double> levels = {0.01, 1.5, 0.02, 1.4, 0.0, 0.0, NAN, 0.0, 1.5, 1.5, 1.5, NAN, 0.01, 0.01, 0.01, 0.3,
+                                0.0,  0.0, 0.0,  0.0, 1.5, 1.2, 0.01, 1.1};
   for (double d = 0.0; d < 1.6; d += 0.0037) levels.push_back(d);
   levels.push_back(NAN);
   levels.push_back(0.25);

@@ -125,6 +125,13 @@ TEST(HostMIDIList, AppendsFromAnyThreadDrainInOrderAndAFullListDrops) {
   }
   ASSERT_EQ(offsets.size(), static_cast<size_t>(KHostMIDIList::kCapacity));
   EXPECT_EQ(offsets.back(), KHostMIDIList::kCapacity - 1);
+  // Drains that found the list empty do not hide what is appended after them.
+  const uint8_t late[4] = {0x80, 60, 0, 0};
+  ASSERT_TRUE(list.Append(7, late));
+  int32_t arrived = 0;
+  list.Drain([&](const KHostMIDIList::Message& m) { arrived += m.sampleOffset == 7 && m.bytes[0] == 0x80 ? 1 : 100; });
+  list.Drain([&](const KHostMIDIList::Message&) { arrived += 100; });
+  EXPECT_EQ(arrived, 1);
 }
 
 // The state text stays valid until the next store, and a broken text changes nothing.

@@ -3,6 +3,7 @@
 // size asked of the host, and the plug-ins' own graphs.
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <set>
 #include <string>
 

@@ -143,6 +143,22 @@ TEST_F(ProcessingCycleTest, DenormalsAreFlushedInsideProcessAndTheCallersModeIsR
 
 // The peak of every length (the vector loop and its scalar end), NaN samples skipped, and the
 // peak held across calls.
+// A reader polling from another thread sees the loudest block since its last take, though the
+// meter was reset after every block in between, and then nothing until more audio comes.
+TEST(KLevelMeter, TakenPeakSurvivesResetsUntilTaken) {
+  KLevelMeter meter;
+  const float loud = -0.75f, soft[2] = {0.25f, -0.5f};
+  meter.Accumulate(&loud, 1);
+  meter.Reset();
+  meter.Accumulate(soft, 2);
+  meter.Reset();
+  EXPECT_EQ(meter.Level(), 0.0f);
+  EXPECT_EQ(meter.TakePeak(), 0.75f);
+  EXPECT_EQ(meter.TakePeak(), 0.0f);
+  meter.Accumulate(soft, 2);
+  EXPECT_EQ(meter.TakePeak(), 0.5f);
+}
+
 TEST(KLevelMeter, PeakOfAnyLengthSkipsNaN) {
   for (int32_t n : {0, 1, 15, 16, 17, 64, 100}) {
     std::vector<float> samples(static_cast<size_t>(n));

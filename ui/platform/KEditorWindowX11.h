@@ -3,15 +3,13 @@
 #include <cstdint>
 #include <memory>
 
-#include "ui/KBitmap.h"
-
 class KEditor;
-class KDrawerToKBitmap;
+class KWindowSurface;
 
 // An editor in an X11 child window of a host's window. It has no thread and no loop of its
 // own: the host's run loop calls ProcessEvents when the connection's descriptor is readable and
-// Tick on its timer. Painting goes through the software drawer into a back buffer, of which
-// only the repainted area is put on the window.
+// Tick on its timer. The OpenGL drawer paints it where the system has OpenGL (EGL on the X
+// connection), else the software drawer; either repaints only what changed.
 class KEditorWindowX11 {
 public:
   // Opens a connection of its own and a child window of `parent` the editor's pixel size.
@@ -32,19 +30,18 @@ public:
   void Resize();
   // Paints what is dirty and puts it on the window; answers the pixels put.
   int64_t PaintDirty();
-  // The milliseconds the last full repaint took.
+  // The milliseconds the last full repaint took, until its pixels were on their way to the window.
   double LastFullPaintMs() const noexcept { return lastFullPaintMs_; }
+  bool PaintsWithOpenGL() const noexcept;
 
 private:
   void HandleEvent(const union _XEvent& event);
-  void Present(int32_t left, int32_t top, int32_t right, int32_t bottom);
-  void MakeBackBuffer();
+  // A surface of the editor's pixel size: OpenGL's when it can paint, else software.
+  void MakeSurface();
 
   KEditor& editor_;
   struct _XDisplay* display_ = nullptr;
   unsigned long window_ = 0;
-  struct _XGC* gc_ = nullptr;
-  KBitmap backBuffer_;
-  std::unique_ptr<KDrawerToKBitmap> drawer_;
+  std::unique_ptr<KWindowSurface> surface_;
   double lastFullPaintMs_ = 0;
 };

@@ -19,6 +19,7 @@
 #include "tests/ui/EditorTestSupport.h"
 #include "ui/controls/KLevelMeterControl.h"
 #include "ui/controls/KValueControl.h"
+#include "ui/platform/KEditorWindowX11.h"
 // Last: X11's macros (None, Bool, Status) would break the headers above.
 #include <X11/Xlib.h>
 #include <X11/Xutil.h>
@@ -262,7 +263,11 @@ TEST_F(EditorWindowFixture, AutomationPlaysIntoTheOpenEditorWhileTheAudioAllocat
   ASSERT_NE(view, nullptr);
   ASSERT_EQ(view->SetFrame(&frame) | view->Attached(reinterpret_cast<void*>(parent), kPlatformTypeX11EmbedWindowID), kResultOk);
   frame.Pump(2);
-  auto& editor = static_cast<KAudioPluginVST3Adapter::KEditor*>(view)->Editor();
+  auto* adapterView = static_cast<KAudioPluginVST3Adapter::KEditor*>(view);
+  auto& editor = adapterView->Editor();
+  // Mesa paints under Xvfb, so the window is the OpenGL drawer's.
+  ASSERT_NE(adapterView->Window(), nullptr);
+  EXPECT_TRUE(adapterView->Window()->PaintsWithOpenGL());
   const Window child = Child();
   ASSERT_NE(child, 0u);
 

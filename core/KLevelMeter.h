@@ -23,6 +23,9 @@ public:
     count_ = 0;
   }
   float Level() const noexcept { return level_.load(std::memory_order_relaxed); }
+  // The largest magnitude since the last take, resets or not (for a reader on another thread,
+  // which polls it and so misses no block in between).
+  float TakePeak() noexcept { return unread_.exchange(0.0f, std::memory_order_relaxed); }
   bool IsHolding() const noexcept { return hold_; }
   void SetHoldSamples(int32_t limit) noexcept { limit_ = limit; }
 
@@ -35,11 +38,14 @@ public:
 private:
   void Take(float peak, int32_t n) noexcept {
     level_.store(peak, std::memory_order_relaxed);
+    // A reader's take between this load and store is lost, and it sees this peak once more.
+    if (peak > unread_.load(std::memory_order_relaxed)) unread_.store(peak, std::memory_order_relaxed);
     count_ += n;
     hold_ = true;
   }
 
   std::atomic<float> level_{0.0f};
+  std::atomic<float> unread_{0.0f};
   float resetValue_ = 0.0f;
   int32_t count_ = 0;
   int32_t limit_ = 0;

@@ -146,6 +146,19 @@ void KDrawerOpenGL::EndPaint() {
   });
 }
 
+void KDrawerOpenGL::CopyToDefaultFramebuffer() {
+  KGuard("KDrawerOpenGL::CopyToDefaultFramebuffer", [&] {
+    CheckPainting();
+    if (!framebuffer_) return;
+    const int32_t w = context_.Width(), h = context_.Height();
+    glBindFramebuffer(GL_READ_FRAMEBUFFER, framebuffer_);
+    glBindFramebuffer(GL_DRAW_FRAMEBUFFER, 0);
+    glBlitFramebuffer(0, 0, w, h, 0, 0, w, h, GL_COLOR_BUFFER_BIT, GL_NEAREST);
+    glBindFramebuffer(GL_FRAMEBUFFER, framebuffer_);
+    ThrowOnError("The graphics card could not show the picture.");
+  });
+}
+
 KBitmap KDrawerOpenGL::GetScreenShot() {
   KBitmap picture;
   KGuard("KDrawerOpenGL::GetScreenShot", [&] {

@@ -23,6 +23,10 @@ public:
   void Attach();
   void BeginPaint();
   void EndPaint();
+  // Between BeginPaint and EndPaint: copies the off-screen picture into the context's default
+  // framebuffer (a window's back buffer). Without an off-screen framebuffer the picture is
+  // already there.
+  void CopyToDefaultFramebuffer();
   // The picture painted so far, top row first.
   KBitmap GetScreenShot();
 

@@ -141,6 +141,22 @@ TEST_F(ProcessingCycleTest, DenormalsAreFlushedInsideProcessAndTheCallersModeIsR
 }
 #endif
 
+// A reader polling from another thread sees the loudest block since its last take, though the
+// meter was reset after every block in between, and then nothing until more audio comes.
+TEST(KLevelMeter, TakenPeakSurvivesResetsUntilTaken) {
+  KLevelMeter meter;
+  const float loud = -0.75f, soft[2] = {0.25f, -0.5f};
+  meter.Accumulate(&loud, 1);
+  meter.Reset();
+  meter.Accumulate(soft, 2);
+  meter.Reset();
+  EXPECT_EQ(meter.Level(), 0.0f);
+  EXPECT_EQ(meter.TakePeak(), 0.75f);
+  EXPECT_EQ(meter.TakePeak(), 0.0f);
+  meter.Accumulate(soft, 2);
+  EXPECT_EQ(meter.TakePeak(), 0.5f);
+}
+
 // The peak of every length (the wide and narrow vector loops and the scalar end), wherever it
 // lies, NaN samples skipped (in a vector loop and at the end), and the peak held across calls.
 TEST(KLevelMeter, PeakOfAnyLengthSkipsNaN) {

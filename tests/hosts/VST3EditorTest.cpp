@@ -4,16 +4,22 @@
 // again.
 #include <unistd.h>
 
+#include <atomic>
+#include <chrono>
 #include <cstdlib>
 #include <string>
+#include <thread>
 
+#include "hosts/vst3/KVST3Editor.h"
 #include "hosts/vst3/KVST3View.h"
 #include "kernel/KEntryPoints.h"
 #include "plugins/KPluginEditors.h"
+#include "tests/core/AllocationCounter.h"
 #include "tests/hosts/VST3Host.h"
 #include "tests/ui/EditorTestSupport.h"
 #include "ui/controls/KLevelMeterControl.h"
 #include "ui/controls/KValueControl.h"
+#include "ui/platform/KEditorWindowX11.h"
 // Last: X11's macros (None, Bool, Status) would break the headers above.
 #include "tests/hosts/X11EditorWindow.h"
 
@@ -156,6 +162,116 @@ TEST_F(VST3EditorWindow, TheViewLivesInTheHostsWindowAndAnswersMouseKeysAndScale
     again->Release();
   }
   instance.Stop();
+}
+
+// A host whose component handler keeps the editor's thread waiting in an edit until told to
+// let go (as a slow host's user-interface thread would), at most 10 s.
+struct KStallingHost final : KHostObject<IHostApplication, IComponentHandler> {
+  std::atomic<bool> stall{false}, released{false}, stalled{false};
+  TResult GetName(String128 name) override { return std::copy_n(u"Test host", 10, name), kResultOk; }
+  TResult CreateInstance(char*, char*, void**) override { return kNotImplemented; }
+  TResult BeginEdit(ParamID) override { return kResultOk; }
+  TResult PerformEdit(ParamID, double) override {
+    stalled = stall.load();
+    for (const auto until = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+         stall && !released && std::chrono::steady_clock::now() < until;)
+      std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    return kResultOk;
+  }
+  TResult EndEdit(ParamID) override { return kResultOk; }
+  TResult RestartComponent(int32_t) override { return kResultOk; }
+};
+
+TEST_F(VST3EditorWindow, AutomationPlaysIntoTheOpenEditorWhileTheAudioAllocatesNothingAndWaitsOnNoEditor) {
+  KStallingHost stalling;
+  // In this process, so that every allocation of the audio path is counted.
+  KInstance instance(static_cast<IComponent*>(
+      new KAudioPluginVST3Adapter(std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(KString("KUtilityPlugin"))))));
+  ASSERT_EQ(instance.component->Initialize(static_cast<IHostApplication*>(&stalling)) |
+                instance.controller->SetComponentHandler(&stalling),
+            kResultOk);
+  std::vector<SpeakerArrangement> stereo(2, 3);
+  ProcessSetup setup{kRealtime, kSample32, kBlock, 48000.0};
+  ASSERT_EQ(instance.processor->SetBusArrangements(stereo.data(), 1, stereo.data() + 1, 1), kResultTrue);
+  ASSERT_EQ(instance.processor->SetupProcessing(setup) | instance.component->SetActive(1) | instance.processor->SetProcessing(1),
+            kResultOk);
+  IPlugView* view = instance.controller->CreateView("editor");
+  ASSERT_NE(view, nullptr);
+  ASSERT_EQ(view->SetFrame(&frame) | view->Attached(reinterpret_cast<void*>(parent), kPlatformTypeX11EmbedWindowID), kResultOk);
+  frame.Pump(2);
+  auto* adapterView = static_cast<KAudioPluginVST3Adapter::KEditor*>(view);
+  auto& editor = adapterView->Editor();
+  // Mesa paints under Xvfb, so the window is the OpenGL drawer's unless the run hides OpenGL.
+  ASSERT_NE(adapterView->Window(), nullptr);
+  const char* drawer = std::getenv("TORVANE_EXPECT_DRAWER");
+  EXPECT_EQ(adapterView->Window()->PaintsWithOpenGL(), !drawer || std::string(drawer) != "software");
+  const Window child = Child();
+  ASSERT_NE(child, 0u);
+
+  const std::unique_ptr<KAudioPlugin> offline(CreateTorvanePlugin(KString("KUtilityPlugin")));
+  const auto index = [&](const char* key) { return offline->FindParameter(KString::FromUtf8(key))->Index(); };
+  const int32_t width = index("width"), gain = index("gain");
+  const auto knobOf = [&](int32_t parameter) {
+    return KFindControl<KKnob>(editor.Tree().Root(), [&](KKnob& k) { return k.Link().Index() == parameter; });
+  };
+  ASSERT_TRUE(knobOf(width) && knobOf(gain));
+  const KRect widthKnob = knobOf(width)->Bounds();
+
+  // The audio thread automates the width from `from` to `to` over 20 blocks, each processing
+  // call counted for allocations.
+  std::atomic<int64_t> allocations{0};
+  std::atomic<bool> rendered{false};
+  const auto render = [&](double from, double to) {
+    return std::thread([&, from, to] {
+      KBlock block(1, 1);
+      for (int32_t b = 0; b < 20; ++b) {
+        block.changes.queues.clear();
+        block.Change(static_cast<ParamID>(width), {{0, from + (to - from) * b / 20}, {kBlock - 1, from + (to - from) * (b + 1) / 20}});
+        KAllocationCounter counter;
+        EXPECT_EQ(instance.processor->Process(block.data), kResultOk);
+        allocations += counter.Count();
+        std::this_thread::sleep_for(std::chrono::milliseconds(3));
+      }
+      rendered = true;
+    });
+  };
+  const auto expectKnobShows = [&](double value) {
+    EXPECT_DOUBLE_EQ(instance.controller->GetParamNormalized(static_cast<ParamID>(width)), value);
+    offline->GetParameter(width).SetNormalized(value);
+    const KBitmap expected = KBitmap::Decode(KPluginEditorSnapshotPNG(*offline, 1, false), "snapshot");
+    EXPECT_EQ(Differences(Screenshot(child, expected.Width(), expected.Height()), expected, widthKnob), 0) << value;
+  };
+
+  // The editor's thread serves its run loop while the audio plays.
+  std::thread audio = render(0, 0.5);
+  while (!rendered) frame.Pump(1);
+  audio.join();
+  frame.Pump(3);
+  expectKnobShows(0.5);
+
+  // The editor's thread held inside the host by an edit of the gain knob: the audio still plays
+  // every block, and the host lets go only then.
+  rendered = false;
+  stalling.stall = true;
+  audio = render(0.5, 1.0);
+  std::thread release([&] {
+    while (!rendered) std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    stalling.released = true;
+  });
+  const auto stallStart = std::chrono::steady_clock::now();
+  editor.Tree().Wheel({KCentreOf(*knobOf(gain)), 0, 1.0});
+  const double stalledSeconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - stallStart).count();
+  audio.join();
+  release.join();
+  EXPECT_TRUE(stalling.stalled);
+  EXPECT_LT(stalledSeconds, 9.0) << "the audio waited on the stalled editor";
+  frame.Pump(3);
+  expectKnobShows(1.0);
+  EXPECT_EQ(allocations, 0);
+
+  EXPECT_EQ(view->Removed(), kResultOk);
+  view->Release();
+  EXPECT_EQ(instance.processor->SetProcessing(0) | instance.component->SetActive(0) | instance.component->Terminate(), kResultOk);
 }
 
 }  // namespace

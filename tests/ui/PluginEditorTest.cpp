@@ -3,6 +3,7 @@
 // size asked of the host, and the plug-ins' own graphs.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <set>
 #include <string>
@@ -33,6 +34,28 @@ size_t ColourCount(const KBitmap& picture) {
   for (int32_t y = 0; y < picture.Height() && colours.size() < 64; y += 3)
     for (int32_t x = 0; x < picture.Width(); x += 3) colours.insert(picture.Pixel(x, y));
   return colours.size();
+}
+
+// Pixels of `a` and `b` that differ outside every knob and slider of the editor.
+int64_t DifferencesOutsideValueControls(KEditor& editor, const KBitmap& a, const KBitmap& b) {
+  std::vector<KRect> controls;
+  KFindControl<KValueControl>(editor.Tree().Root(), [&](KValueControl& c) { return controls.push_back(c.Bounds()), false; });
+  int64_t outside = 0;
+  for (int32_t y = 0; y < a.Height(); ++y)
+    for (int32_t x = 0; x < a.Width(); ++x)
+      if (a.Pixel(x, y) != b.Pixel(x, y) &&
+          std::none_of(controls.begin(), controls.end(), [&](const KRect& r) { return KContains(r, KPoint{x, y}); }))
+        ++outside;
+  return outside;
+}
+
+// Every knob's and slider's label as `label` (a copy of each control's own when empty).
+void Relabel(KEditor& editor, const KString& label, std::vector<KString>& kept) {
+  KFindControl<KValueControl>(editor.Tree().Root(), [&](KValueControl& c) {
+    kept.push_back(c.Label());
+    c.SetLabel(label);
+    return false;
+  });
 }
 
 class EveryPluginEditor : public ::testing::TestWithParam<const char*> {};
@@ -86,6 +109,19 @@ TEST_P(EveryPluginEditor, HasOneControlPerParameterHelpForEachAndDrawsAtEverySca
   EXPECT_EQ(large.Width(), 2 * normal.Width());
   EXPECT_EQ(large.Height(), 2 * normal.Height());
   normal.Store(KPicturePath(std::string("editor_") + GetParam() + ".png"));
+
+  // Labels stay inside their own controls, however long: none reaches a neighbour's.
+  ASSERT_TRUE(editor->SetScale(1));
+  std::vector<KString> labels;
+  Relabel(*editor, KString(), labels);
+  const KBitmap unlabelled = editor->Render();
+  size_t next = 0;
+  KFindControl<KValueControl>(editor->Tree().Root(), [&](KValueControl& c) { return c.SetLabel(labels[next++]), false; });
+  EXPECT_EQ(DifferencesOutsideValueControls(*editor, editor->Render(), unlabelled), 0);
+  Relabel(*editor, KString::FromUtf8("Sidechain high-pass filter frequency"), labels);
+  const KBitmap longLabels = editor->Render();
+  longLabels.Store(KPicturePath(std::string("editor_") + GetParam() + "_long_labels.png"));
+  EXPECT_EQ(DifferencesOutsideValueControls(*editor, longLabels, unlabelled), 0);
   large.Store(KPicturePath(std::string("editor_") + GetParam() + "_x2.png"));
 }
 

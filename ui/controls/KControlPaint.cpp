@@ -26,4 +26,22 @@ void Arc(KDrawer& drawer, KPointF centre, double radius, double from, double to,
 KRect Top(const KRect& r, int32_t height) noexcept { return {r.left, r.top, r.right, r.top + height - 1}; }
 KRect Bottom(const KRect& r, int32_t height) noexcept { return {r.left, r.bottom - height + 1, r.right, r.bottom}; }
 
+KString Fitted(const KDrawer& drawer, const KString& text, const KFont& font, const KRect& r) {
+  // A pixel of air on either side, so that anti-aliased edges stay inside too.
+  const double room = double(r.Width() - 2);
+  if (font.TextWidth(text, drawer.Scale()) <= room) return text;
+  const auto cut = [&](int32_t count) {
+    KString shorter = text.SubString(0, count);
+    while (shorter.Length() > 0 && shorter.CharAt(shorter.Length() - 1) == u' ') shorter = shorter.SubString(0, shorter.Length() - 1);
+    return shorter += u'\u2026';
+  };
+  // The longest beginning that fits with its ellipsis (widths grow with the count).
+  int32_t fits = 0, fails = text.Length();
+  while (fails - fits > 1) {
+    const int32_t middle = (fits + fails) / 2;
+    (font.TextWidth(cut(middle), drawer.Scale()) <= room ? fits : fails) = middle;
+  }
+  return cut(fits);
+}
+
 }  // namespace KControlPaint

@@ -107,13 +107,18 @@ double KValueControl::Origin() const noexcept {
   return 0;
 }
 
+void KValueControl::PaintLabel(KDrawer& drawer, const KStyle& style) const {
+  const KRect band = KControlPaint::Top(Bounds(), kLabelHeight);
+  drawer.AlignedTextOut(band, KControlPaint::Fitted(drawer, Label(), style.LabelFont(), band), style.LabelFont(),
+                        style.Get(KStyle::kText), kAlignCentre | kAlignMiddle, 255, kDrawBlend);
+}
+
 KRect KKnob::ValueTextArea() const noexcept { return KControlPaint::Bottom(Bounds(), kValueHeight); }
 
 void KKnob::Paint(KDrawer& drawer, const KStyle& style) {
   const KRect& r = Bounds();
   const double value = Link().Value();
-  drawer.AlignedTextOut(KControlPaint::Top(r, kLabelHeight), Label(), style.LabelFont(),
-                        style.Get(KStyle::kText), kAlignCentre | kAlignMiddle, 255, kDrawBlend);
+  PaintLabel(drawer, style);
   const double size = std::min<double>({style.Get(KStyle::kKnob), double(r.Width()) - 8,
                                         double(r.Height()) - kLabelHeight - kValueHeight - 6});
   const KPointF centre{(r.left + r.right) / 2.0, r.top + kLabelHeight + 3 + size / 2};
@@ -140,8 +145,7 @@ KRect KSlider::ValueTextArea() const noexcept { return KControlPaint::Bottom(Bou
 
 void KSlider::Paint(KDrawer& drawer, const KStyle& style) {
   const KRect& r = Bounds();
-  drawer.AlignedTextOut(KControlPaint::Top(r, kLabelHeight), Label(), style.LabelFont(),
-                        style.Get(KStyle::kText), kAlignCentre | kAlignMiddle, 255, kDrawBlend);
+  PaintLabel(drawer, style);
   const int32_t cx = (r.left + r.right) / 2;
   const KRect track{cx - 3, r.top + kLabelHeight + 8, cx + 3, r.bottom - kValueHeight - 8};
   drawer.FillRoundRectangle(track, 3, style.Get(KStyle::kKnobTrack), 255, kDrawBlend);

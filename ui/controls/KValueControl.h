@@ -34,6 +34,8 @@ protected:
   double Origin() const noexcept;
   // One step of the wheel or an arrow key.
   double Step(uint32_t modifiers) const noexcept;
+  // The label centred in the band at the top, cut short where it is wider than the control.
+  void PaintLabel(KDrawer& drawer, const KStyle& style) const;
 
 private:
   bool dragging_ = false;  // the gesture begins with the first change, so a click sends nothing

@@ -112,7 +112,7 @@ private:
 KEditor::KEditor(KAudioPlugin& plugin, const KString& title, const KEditorDescription& description, KEditorHost* host,
                  KStyle style)
     : plugin_(plugin), host_(host), style_(std::move(style)), description_(description) {
-  // The meters show each block's peak rather than everything since they were last reset.
+  // No peak held past its sub-block; the meters read the peaks taken since their last tick.
   plugin_.SetMeterReset(true);
   Build(description, title);
 }
@@ -265,8 +265,8 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
   };
   const auto levels = [this](KAudioPlugin::Meter first, KAudioPlugin::Meter second) {
     return [this, first, second](double& l, double& r) {
-      l = ToDecibels(plugin_.GetMeter(first).Level());
-      r = ToDecibels(plugin_.GetMeter(second).Level());
+      l = ToDecibels(plugin_.GetMeter(first).TakePeak());
+      r = ToDecibels(plugin_.GetMeter(second).TakePeak());
     };
   };
   if (plugin_.GetShape().inputBuses > 0) meter("In", KLevelMeterControl::kLevel, levels(KAudioPlugin::kInputLeft, KAudioPlugin::kInputRight));

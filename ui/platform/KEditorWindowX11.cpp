@@ -9,8 +9,9 @@
 #include <cmath>
 
 #include "kernel/KException.h"
-#include "ui/KDrawerToKBitmap.h"
 #include "ui/editor/KEditor.h"
+#include "ui/platform/KOpenGLWindowContext.h"
+#include "ui/platform/KWindowSurface.h"
 
 namespace {
 
@@ -48,31 +49,37 @@ KEditorWindowX11::KEditorWindowX11(unsigned long parent, KEditor& editor) : edit
   XSelectInput(display_, window_,
                ExposureMask | ButtonPressMask | ButtonReleaseMask | PointerMotionMask | KeyPressMask | StructureNotifyMask |
                    EnterWindowMask);
-  gc_ = XCreateGC(display_, window_, 0, nullptr);
-  MakeBackBuffer();
   XMapWindow(display_, window_);
-  XFlush(display_);
+  XSync(display_, False);
+  MakeSurface();
 }
 
 KEditorWindowX11::~KEditorWindowX11() {
-  drawer_.reset();
-  XFreeGC(display_, gc_);
+  surface_.reset();
   XDestroyWindow(display_, window_);
   XCloseDisplay(display_);
 }
 
+bool KEditorWindowX11::PaintsWithOpenGL() const noexcept { return surface_->IsOpenGL(); }
+
 int KEditorWindowX11::FileDescriptor() const noexcept { return ConnectionNumber(display_); }
 
-void KEditorWindowX11::MakeBackBuffer() {
-  drawer_.reset();
-  backBuffer_ = KBitmap(editor_.PixelWidth(), editor_.PixelHeight());
-  drawer_ = std::make_unique<KDrawerToKBitmap>(backBuffer_, editor_.Scale());
+void KEditorWindowX11::MakeSurface() {
+  surface_.reset();
+  const int32_t width = editor_.PixelWidth(), height = editor_.PixelHeight();
+  try {
+    surface_ = KWindowSurface::OpenGL(KOpenGLWindowContext::CreateForX11(display_, window_, width, height), editor_.Scale());
+  } catch (const KException&) {
+    // No OpenGL here (or not enough of it): the same picture in software.
+    surface_ = KWindowSurface::X11Software(display_, window_, width, height, editor_.Scale());
+  }
   editor_.Tree().InvalidateAll();
 }
 
 void KEditorWindowX11::Resize() {
   XResizeWindow(display_, window_, static_cast<unsigned>(editor_.PixelWidth()), static_cast<unsigned>(editor_.PixelHeight()));
-  MakeBackBuffer();
+  XSync(display_, False);
+  MakeSurface();
   PaintDirty();
 }
 
@@ -152,32 +159,22 @@ void KEditorWindowX11::HandleEvent(const XEvent& event) {
 }
 
 int64_t KEditorWindowX11::PaintDirty() {
-  if (!editor_.Tree().NeedsPaint()) return 0;
-  const bool full = editor_.Tree().DirtyArea() == editor_.Tree().Root().Bounds();
+  KControlTree& tree = editor_.Tree();
+  if (!tree.NeedsPaint()) return 0;
+  if (!surface_->KeepsPicture()) tree.InvalidateAll();
+  const bool full = tree.DirtyArea() == tree.Root().Bounds();
   const auto start = std::chrono::steady_clock::now();
-  const KRect area = editor_.Paint(*drawer_);
-  if (full) lastFullPaintMs_ = std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start).count();
-  if (area.IsEmpty()) return 0;
+  surface_->Begin();
+  const KRect area = editor_.Paint(surface_->Drawer());
   // The logical area in pixels, widened by one for anti-aliased edges.
   const double s = editor_.Scale();
-  const int32_t left = std::max(0, static_cast<int32_t>(std::floor(area.left * s)) - 1);
-  const int32_t top = std::max(0, static_cast<int32_t>(std::floor(area.top * s)) - 1);
-  const int32_t right = std::min(backBuffer_.Width() - 1, static_cast<int32_t>(std::ceil((area.right + 1) * s)));
-  const int32_t bottom = std::min(backBuffer_.Height() - 1, static_cast<int32_t>(std::ceil((area.bottom + 1) * s)));
-  Present(left, top, right, bottom);
-  return int64_t{right - left + 1} * (bottom - top + 1);
-}
-
-void KEditorWindowX11::Present(int32_t left, int32_t top, int32_t right, int32_t bottom) {
-  if (right < left || bottom < top) return;
-  // The back buffer's pixels are 0xAARRGGBB words: the layout of a 24-bit TrueColor visual.
-  XImage* image = XCreateImage(display_, DefaultVisual(display_, DefaultScreen(display_)), 24, ZPixmap, 0,
-                               reinterpret_cast<char*>(backBuffer_.Pixels()), static_cast<unsigned>(backBuffer_.Width()),
-                               static_cast<unsigned>(backBuffer_.Height()), 32, backBuffer_.Width() * 4);
-  if (!image) return;
-  XPutImage(display_, window_, gc_, image, left, top, left, top, static_cast<unsigned>(right - left + 1),
-            static_cast<unsigned>(bottom - top + 1));
-  image->data = nullptr;  // the back buffer's, not the image's to free
-  XDestroyImage(image);
-  XFlush(display_);
+  const KRect pixels =
+      area.IsEmpty() ? area
+                     : KRect{std::max(0, static_cast<int32_t>(std::floor(area.left * s)) - 1),
+                             std::max(0, static_cast<int32_t>(std::floor(area.top * s)) - 1),
+                             std::min(editor_.PixelWidth() - 1, static_cast<int32_t>(std::ceil((area.right + 1) * s))),
+                             std::min(editor_.PixelHeight() - 1, static_cast<int32_t>(std::ceil((area.bottom + 1) * s)))};
+  surface_->Show(pixels);
+  if (full) lastFullPaintMs_ = std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start).count();
+  return pixels.IsEmpty() ? 0 : int64_t{pixels.right - pixels.left + 1} * (pixels.bottom - pixels.top + 1);
 }

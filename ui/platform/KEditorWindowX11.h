@@ -3,15 +3,13 @@
 #include <cstdint>
 #include <memory>
 
-#include "ui/KBitmap.h"
-
 class KEditor;
-class KDrawerToKBitmap;
+class KWindowSurface;
 
 // An editor in an X11 child window of a host's window. It has no thread and no loop of its
 // own: the host's run loop calls ProcessEvents when the connection's descriptor is readable and
-// Tick on its timer. Painting goes through the software drawer into a back buffer, of which
-// only the repainted area is put on the window.
+// Tick on its timer. The OpenGL drawer paints it where the system has OpenGL (EGL on the X
+// connection), else the software drawer; either repaints only what changed.
 class KEditorWindowX11 {
 public:
   // Opens a connection of its own and a child window of `parent` the editor's pixel size.
@@ -36,19 +34,18 @@ public:
   // width × height plus the frame it has around the window below it; the climb stops at the
   // root or at a window whose frame exceeds `largestFrame` in either direction.
   void GrowAncestors(int32_t width, int32_t height, int32_t largestFrame);
-  // The milliseconds the last full repaint took.
+  // The milliseconds the last full repaint took, until its pixels were on their way to the window.
   double LastFullPaintMs() const noexcept { return lastFullPaintMs_; }
+  bool PaintsWithOpenGL() const noexcept;
 
 private:
   void HandleEvent(const union _XEvent& event);
-  void Present(int32_t left, int32_t top, int32_t right, int32_t bottom);
-  void MakeBackBuffer();
+  // A surface of the editor's pixel size: OpenGL's when it can paint, else software.
+  void MakeSurface();
 
   KEditor& editor_;
   struct _XDisplay* display_ = nullptr;
   unsigned long window_ = 0;
-  struct _XGC* gc_ = nullptr;
-  KBitmap backBuffer_;
-  std::unique_ptr<KDrawerToKBitmap> drawer_;
+  std::unique_ptr<KWindowSurface> surface_;
   double lastFullPaintMs_ = 0;
 };

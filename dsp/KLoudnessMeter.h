@@ -28,6 +28,8 @@ public:
   double Momentary() const noexcept { return momentary_.load(std::memory_order_relaxed); }
   double ShortTerm() const noexcept { return shortTerm_.load(std::memory_order_relaxed); }
   double Integrated() const noexcept { return integrated_.load(std::memory_order_relaxed); }
+  // 100 ms parts completed since the last reset (audio thread): tells when readings moved.
+  int32_t PartsSeen() const noexcept { return partsSeen_; }
 
   // The two stages of the K-weighting at a rate, as designed for the meter.
   static KFilterSection Shelf(double sampleRate) noexcept;

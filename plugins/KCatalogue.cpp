@@ -9,6 +9,12 @@
   PLUGIN(kCompressorDescription)  \
   PLUGIN(kEqualizerDescription)   \
   PLUGIN(kSampleWarmerDescription) \
+  PLUGIN(kConvolutionReverbDescription) \
+  PLUGIN(kLoudnessMeterDescription) \
+  PLUGIN(kSpectrumAnalyserDescription) \
+  PLUGIN(kMidSideDescription) \
+  PLUGIN(kStereoImagerDescription) \
+  PLUGIN(kToneGeneratorDescription) \
   /* new plug-ins above this line */
 
 #define TORVANE_DECLARE(description) extern const KPluginDescription description;

@@ -22,6 +22,12 @@ constexpr EditorEntry kEditors[] = {
     {"KCompressorPlugin", &KCompressorEditor},
     {"KEqualizerPlugin", &KEqualizerEditor},
     {"KSampleWarmer", &KSampleWarmerEditor},
+    {"KConvolutionReverbPlugin", &KConvolutionReverbEditor},
+    {"KLoudnessMeterPlugin", &KLoudnessMeterEditor},
+    {"KSpectrumAnalyserPlugin", &KSpectrumAnalyserEditor},
+    {"KMidSidePlugin", &KMidSideEditor},
+    {"KStereoImagerPlugin", &KStereoImagerEditor},
+    {"KToneGeneratorPlugin", &KToneGeneratorEditor},
 };
 
 // The host layer makes editors through the factory, which sees no plug-in: this maker is it.

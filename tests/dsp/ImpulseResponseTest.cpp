@@ -6,6 +6,7 @@
 #include <filesystem>
 #include <numeric>
 #include <string>
+#include <unistd.h>
 #include <vector>
 
 #include "dsp/KImpulseResponse.h"
@@ -14,7 +15,7 @@
 namespace {
 // A two-channel response (a smooth decay, the right side half as loud) written as `format`.
 std::string WriteResponse(const char* name, int format, int rate, int32_t frames) {
-  const std::string path = (std::filesystem::temp_directory_path() / name).string();
+  const std::string path = (std::filesystem::temp_directory_path() / (std::to_string(::getpid()) + name)).string();
   SF_INFO info{};
   info.samplerate = rate;
   info.channels = 2;
@@ -66,7 +67,7 @@ TEST(KImpulseResponse, RefusesMissingAndUnreadableFilesWithTheirName) {
   } catch (const KException& e) {
     EXPECT_NE(e.Message().ToUtf8().find("/nonexistent/room.wav"), std::string::npos);
   }
-  const std::string text = (std::filesystem::temp_directory_path() / "torvane_ir_text.wav").string();
+  const std::string text = (std::filesystem::temp_directory_path() / (std::to_string(::getpid()) + "torvane_ir_text.wav")).string();
   FILE* f = std::fopen(text.c_str(), "w");
   std::fputs("not a sound file", f);
   std::fclose(f);

@@ -19,8 +19,8 @@
 namespace {
 using R = KConvolutionReverbPlugin;
 
-KChannels Clicks(size_t n) {
-  KChannels in(2, std::vector<float>(n, 0.0f));
+Channels Clicks(size_t n) {
+  Channels in(2, std::vector<float>(n, 0.0f));
   in[0][0] = 1.0f;
   in[1][100] = 0.5f;
   return in;
@@ -59,15 +59,15 @@ TEST(ConvolutionReverb, WetIsTheSpacesResponseAndDryIsTheInput) {
     const auto plugin = Make(100.0);
     plugin->GetParameter(R::kImpulse).SetWorking(space);
     const KImpulseResponse response = R::SyntheticSpace(space, 48000.0);
-    const KChannels out = KRender(*plugin, Clicks(6000));
+    const Channels out = Render(*plugin, Clicks(6000), {512});
     for (size_t i = 0; i < 6000; ++i) {
       ASSERT_NEAR(out[0][i], response.channels[0][i], 1e-6) << "space " << space << " at " << i;
       ASSERT_NEAR(out[1][i], i >= 100 ? 0.5f * response.channels[1][i - 100] : 0.0f, 1e-6) << "space " << space << " at " << i;
     }
   }
   const auto dry = Make(0.0);
-  const KChannels in = Clicks(3000);
-  EXPECT_EQ(KRender(*dry, in), in);
+  const Channels in = Clicks(3000);
+  EXPECT_EQ(Render(*dry, in, {512}), in);
 }
 
 // The built-in spaces differ and decay: the hall rings longest, each carries unit energy, and the
@@ -104,9 +104,9 @@ TEST(ConvolutionReverb, AFileFromTheStateReplacesTheSpaceAndSurvivesARoundTrip) 
 
   const auto loaded = Make(100.0);
   loaded->ReadState(state);
-  KChannels in(2, std::vector<float>(2000, 0.0f));
+  Channels in(2, std::vector<float>(2000, 0.0f));
   in[0][0] = in[1][0] = 1.0f;
-  const KChannels out = KRender(*loaded, in);
+  const Channels out = Render(*loaded, in, {512});
   const auto peak = std::max_element(out[0].begin(), out[0].end()) - out[0].begin();
   EXPECT_EQ(peak, 480);
   EXPECT_NEAR(out[0][480], 0.5f, 0.03f);
@@ -121,7 +121,7 @@ TEST(ConvolutionReverb, AFileFromTheStateReplacesTheSpaceAndSurvivesARoundTrip) 
   missing->ReadState(state);
   EXPECT_EQ(missing->ImpulseResponseFile().ToUtf8(), path);
   EXPECT_EQ(missing->WriteState(), state);
-  const KChannels fallback = KRender(*missing, Clicks(3000));
+  const Channels fallback = Render(*missing, Clicks(3000), {512});
   const float hall = R::SyntheticSpace(1, 48000.0).channels[0][2000];
   ASSERT_NE(hall, 0.0f);
   EXPECT_NEAR(fallback[0][2000], hall, 1e-6);
@@ -132,11 +132,11 @@ TEST(ConvolutionReverb, AFileFromTheStateReplacesTheSpaceAndSurvivesARoundTrip) 
 TEST(ConvolutionReverb, SwapsSpacesWithoutAllocatingOnTheAudioThread) {
   const std::string path = WriteClick(48, 48000);
   const auto plugin = Make(100.0);
-  KChannels in(2, std::vector<float>(256, 0.25f));
-  KRender(*plugin, in);
+  Channels in(2, std::vector<float>(256, 0.25f));
+  Render(*plugin, in, {512});
   plugin->SetImpulseResponseFile(KString::FromUtf8(path));
   std::vector<const float*> x = {in[0].data(), in[1].data()};
-  KChannels out(2, std::vector<float>(256));
+  Channels out(2, std::vector<float>(256));
   std::vector<float*> y = {out[0].data(), out[1].data()};
   {
     KAllocationCounter counter;
@@ -149,8 +149,8 @@ TEST(ConvolutionReverb, SwapsSpacesWithoutAllocatingOnTheAudioThread) {
   plugin->SetImpulseResponseFile(KString());
   EXPECT_TRUE(plugin->ImpulseResponseFile().IsEmpty());
   // The hall starts from silence and answers after its 18 ms gap.
-  const KChannels hall = KRender(*plugin, KChannels(2, std::vector<float>(2000, 0.25f)));
+  const Channels hall = Render(*plugin, Channels(2, std::vector<float>(2000, 0.25f)), {512});
   EXPECT_LT(std::abs(hall[0][800]), 1e-6f);
-  EXPECT_GT(KRms(hall[0], 1000), 0.01);
+  EXPECT_GT(PeakOf(hall, 1000, 2000), 0.01f);
   std::filesystem::remove(path);
 }

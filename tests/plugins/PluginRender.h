@@ -2,35 +2,51 @@
 
 #include <algorithm>
 #include <cmath>
+#include <complex>
+#include <initializer_list>
 #include <vector>
 
 #include "core/KAudioPlugin.h"
 
-// Channels of samples, and a plug-in played over them as a host plays it.
-using KChannels = std::vector<std::vector<float>>;
+using Channels = std::vector<std::vector<float>>;
 
-// Runs `input` through `plugin` in host blocks of `block` samples.
-inline KChannels KRender(KAudioPlugin& plugin, const KChannels& input, size_t block = 512) {
-  KChannels output(static_cast<size_t>(plugin.OutputChannelCount()), std::vector<float>(input[0].size(), 99.0f));
-  for (size_t start = 0; start < input[0].size(); start += block) {
-    std::vector<const float*> in;
-    std::vector<float*> out;
-    for (const std::vector<float>& channel : input) in.push_back(channel.data() + start);
-    for (std::vector<float>& channel : output) out.push_back(channel.data() + start);
-    plugin.ProcessHostBlock(in.data(), out.data(), static_cast<int32_t>(std::min(block, input[0].size() - start)));
+// Plays `in` (one row per input channel) through `plugin` in host blocks whose sizes cycle
+// through `sizes`; one row per output channel comes back.
+inline Channels Render(KAudioPlugin& plugin, const Channels& in, std::initializer_list<int32_t> sizes) {
+  const size_t length = in.empty() ? 0 : in[0].size();
+  Channels out(static_cast<size_t>(plugin.OutputChannelCount()), std::vector<float>(length));
+  std::vector<const float*> x(in.size());
+  std::vector<float*> y(out.size());
+  for (size_t at = 0, k = 0; at < length; ++k) {
+    const auto n = std::min<size_t>(static_cast<size_t>(sizes.begin()[k % sizes.size()]), length - at);
+    for (size_t c = 0; c < in.size(); ++c) x[c] = in[c].data() + at;
+    for (size_t c = 0; c < out.size(); ++c) y[c] = out[c].data() + at;
+    plugin.ProcessHostBlock(x.data(), y.data(), static_cast<int32_t>(n));
+    at += n;
   }
-  return output;
+  return out;
 }
 
-// `n` samples of a sine of `hz` at 48 kHz with peaks at `amplitude`, starting at `phase`.
-inline std::vector<float> KSine(size_t n, double hz, double amplitude, double phase = 0.0) {
-  std::vector<float> x(n);
-  for (size_t i = 0; i < n; ++i) x[i] = static_cast<float>(amplitude * std::sin(6.283185307179586 * hz * static_cast<double>(i) / 48000.0 + phase));
-  return x;
+// `channels` rows of a sine of `amplitude` at `hz` (48 kHz), from sample `from` to `to`.
+inline Channels Sine(size_t channels, size_t length, double hz, double amplitude, size_t from = 0, size_t to = SIZE_MAX) {
+  Channels rows(channels, std::vector<float>(length));
+  for (auto& row : rows)
+    for (size_t i = from; i < std::min(length, to); ++i) row[i] = static_cast<float>(amplitude * std::sin(2.0 * M_PI * hz * static_cast<double>(i) / 48000.0));
+  return rows;
 }
 
-inline double KRms(const std::vector<float>& x, size_t from = 0) {
-  double sum = 0.0;
-  for (size_t i = from; i < x.size(); ++i) sum += static_cast<double>(x[i]) * x[i];
-  return std::sqrt(sum / static_cast<double>(x.size() - from));
+// The amplitude of the component at `hz` in samples [from, to) of `row` (48 kHz): a single
+// frequency of the transform, over whole periods for a steady tone.
+inline double Amplitude(const std::vector<float>& row, double hz, size_t from, size_t to) {
+  std::complex<double> sum;
+  for (size_t i = from; i < to; ++i) sum += static_cast<double>(row[i]) * std::polar(1.0, -2.0 * M_PI * hz * static_cast<double>(i) / 48000.0);
+  return 2.0 * std::abs(sum) / static_cast<double>(to - from);
+}
+
+// The largest magnitude in samples [from, to) of every row.
+inline float PeakOf(const Channels& rows, size_t from, size_t to) {
+  float peak = 0.0f;
+  for (const auto& row : rows)
+    for (size_t i = from; i < std::min(to, row.size()); ++i) peak = std::max(peak, std::abs(row[i]));
+  return peak;
 }

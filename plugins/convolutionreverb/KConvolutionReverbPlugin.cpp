@@ -55,16 +55,26 @@ KConvolutionReverbPlugin::~KConvolutionReverbPlugin() {
 
 KAudioPlugin* KConvolutionReverbPlugin::Create(KModule*, const KPluginRecord*) { return new KConvolutionReverbPlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kVocalRoom[] = {{"impulse", 0.0}, {"mix", 20.0}, {"width", 80.0}};
+constexpr KFactoryPreset::Value kBigHall[] = {{"impulse", 1.0}, {"mix", 35.0}, {"wetlevel", -2.0}};
+constexpr KFactoryPreset::Value kBrightPlate[] = {{"impulse", 2.0}, {"mix", 25.0}, {"width", 130.0}};
+constexpr KFactoryPreset::Value kSend[] = {{"mix", 100.0}};
+constexpr KFactoryPreset kPresets[] = {
+    {"Vocal room", kVocalRoom}, {"Big hall", kBigHall}, {"Bright plate", kBrightPlate}, {"Effect send", kSend}};
+}  // namespace
+
 constinit const KPluginDescription kConvolutionReverbDescription{
     .key = "KConvolutionReverbPlugin",
     .factory = &KConvolutionReverbPlugin::Create,
     .moduleKey = "ConvolutionReverb",
     .category = "Reverb & Delay",
-    .name = "Convolution reverb",
+    .name = "ConvolutionReverb",
     .vst3SubCategories = "Fx|Reverb",
     .vst2Id = "TvCr",
     .identity = "KConvolutionReverbPlugin",
     .help = &KConvolutionReverbHelp,
+    .presets = kPresets,
 };
 
 KConvolutionReverbPlugin::Space* KConvolutionReverbPlugin::NoFile() noexcept {

@@ -16,16 +16,24 @@ KLoudnessMeterPlugin::KLoudnessMeterPlugin() : KAudioPlugin(kParameters, kShape)
 
 KAudioPlugin* KLoudnessMeterPlugin::Create(KModule*, const KPluginRecord*) { return new KLoudnessMeterPlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kBroadcast[] = {{"target", -23.0}};
+constexpr KFactoryPreset::Value kStreaming[] = {{"target", -14.0}};
+constexpr KFactoryPreset::Value kPodcast[] = {{"target", -16.0}, {"history", 0.0}};
+constexpr KFactoryPreset kPresets[] = {{"Broadcast", kBroadcast}, {"Streaming", kStreaming}, {"Podcast", kPodcast}};
+}  // namespace
+
 constinit const KPluginDescription kLoudnessMeterDescription{
     .key = "KLoudnessMeterPlugin",
     .factory = &KLoudnessMeterPlugin::Create,
     .moduleKey = "LoudnessMeter",
     .category = "Special",
-    .name = "Loudness meter",
+    .name = "LoudnessMeter",
     .vst3SubCategories = "Fx|Analyzer",
     .vst2Id = "TvLm",
     .identity = "KLoudnessMeterPlugin",
     .help = &KLoudnessMeterHelp,
+    .presets = kPresets,
 };
 
 bool KLoudnessMeterPlugin::SetSampleRate(double sampleRate) {

@@ -21,16 +21,25 @@ KMidSidePlugin::KMidSidePlugin() : KAudioPlugin(kParameters, kShape) {}
 
 KAudioPlugin* KMidSidePlugin::Create(KModule*, const KPluginRecord*) { return new KMidSidePlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kWider[] = {{"sidegain", 3.0}, {"midgain", -1.0}};
+constexpr KFactoryPreset::Value kSideOnly[] = {{"listen", 2.0}};
+constexpr KFactoryPreset::Value kEncodeValues[] = {{"mode", 1.0}};
+constexpr KFactoryPreset::Value kDecodeValues[] = {{"mode", 2.0}};
+constexpr KFactoryPreset kPresets[] = {{"Wider", kWider}, {"Side alone", kSideOnly}, {"Encode", kEncodeValues}, {"Decode", kDecodeValues}};
+}  // namespace
+
 constinit const KPluginDescription kMidSideDescription{
     .key = "KMidSidePlugin",
     .factory = &KMidSidePlugin::Create,
     .moduleKey = "MidSide",
     .category = "Stereo",
-    .name = "Mid/side",
+    .name = "MidSide",
     .vst3SubCategories = "Fx|Spatial",
     .vst2Id = "TvMs",
     .identity = "KMidSidePlugin",
     .help = &KMidSideHelp,
+    .presets = kPresets,
 };
 
 // In: left and right to mid = (L+R)/2 and side = (L−R)/2, unless the input is coded already.

@@ -15,16 +15,24 @@ KSpectrumAnalyserPlugin::KSpectrumAnalyserPlugin() : KAudioPlugin(kParameters, k
 
 KAudioPlugin* KSpectrumAnalyserPlugin::Create(KModule*, const KPluginRecord*) { return new KSpectrumAnalyserPlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kMixing[] = {{"slope", 4.5}, {"release", 1.0}};
+constexpr KFactoryPreset::Value kFineDetail[] = {{"resolution", 3.0}, {"release", 2.0}, {"floor", -120.0}};
+constexpr KFactoryPreset::Value kDrums[] = {{"resolution", 0.0}, {"release", 0.1}};
+constexpr KFactoryPreset kPresets[] = {{"Mixing", kMixing}, {"Fine detail", kFineDetail}, {"Drums", kDrums}};
+}  // namespace
+
 constinit const KPluginDescription kSpectrumAnalyserDescription{
     .key = "KSpectrumAnalyserPlugin",
     .factory = &KSpectrumAnalyserPlugin::Create,
     .moduleKey = "SpectrumAnalyser",
     .category = "Special",
-    .name = "Spectrum analyser",
+    .name = "SpectrumAnalyser",
     .vst3SubCategories = "Fx|Analyzer",
     .vst2Id = "TvSa",
     .identity = "KSpectrumAnalyserPlugin",
     .help = &KSpectrumAnalyserHelp,
+    .presets = kPresets,
 };
 
 void KSpectrumAnalyserPlugin::ResetState() { analyser_.Reset(); }

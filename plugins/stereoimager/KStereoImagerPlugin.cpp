@@ -22,16 +22,24 @@ KStereoImagerPlugin::KStereoImagerPlugin() : KAudioPlugin(kParameters, kShape) {
 
 KAudioPlugin* KStereoImagerPlugin::Create(KModule*, const KPluginRecord*) { return new KStereoImagerPlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kMonoBass[] = {{"width", 100.0}, {"lowwidth", 0.0}, {"crossover", 120.0}};
+constexpr KFactoryPreset::Value kWideMix[] = {{"width", 150.0}, {"lowwidth", 60.0}};
+constexpr KFactoryPreset::Value kNarrow[] = {{"width", 60.0}, {"lowwidth", 60.0}};
+constexpr KFactoryPreset kPresets[] = {{"Mono bass", kMonoBass}, {"Wide mix", kWideMix}, {"Narrow", kNarrow}};
+}  // namespace
+
 constinit const KPluginDescription kStereoImagerDescription{
     .key = "KStereoImagerPlugin",
     .factory = &KStereoImagerPlugin::Create,
     .moduleKey = "StereoImager",
     .category = "Stereo",
-    .name = "Stereo imager",
+    .name = "StereoImager",
     .vst3SubCategories = "Fx|Spatial",
     .vst2Id = "TvSi",
     .identity = "KStereoImagerPlugin",
     .help = &KStereoImagerHelp,
+    .presets = kPresets,
 };
 
 void KStereoImagerPlugin::ProcessUpdate() {

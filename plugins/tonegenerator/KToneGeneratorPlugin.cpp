@@ -30,16 +30,24 @@ KToneGeneratorPlugin::KToneGeneratorPlugin() : KAudioPlugin(kParameters, kShape)
 
 KAudioPlugin* KToneGeneratorPlugin::Create(KModule*, const KPluginRecord*) { return new KToneGeneratorPlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kLineUp[] = {{"play", 1.0}, {"output", 1.0}};
+constexpr KFactoryPreset::Value kBassCheck[] = {{"play", 1.0}, {"frequency", 50.0}, {"level", -20.0}};
+constexpr KFactoryPreset::Value kNoiseValues[] = {{"play", 1.0}, {"waveform", 4.0}, {"level", -24.0}, {"output", 1.0}};
+constexpr KFactoryPreset kPresets[] = {{"Line-up 1 kHz", kLineUp}, {"Bass check 50 Hz", kBassCheck}, {"White noise", kNoiseValues}};
+}  // namespace
+
 constinit const KPluginDescription kToneGeneratorDescription{
     .key = "KToneGeneratorPlugin",
     .factory = &KToneGeneratorPlugin::Create,
     .moduleKey = "ToneGenerator",
     .category = "Special",
-    .name = "Tone generator",
+    .name = "ToneGenerator",
     .vst3SubCategories = "Fx|Generator",
     .vst2Id = "TvTg",
     .identity = "KToneGeneratorPlugin",
     .help = &KToneGeneratorHelp,
+    .presets = kPresets,
 };
 
 template <int Wave>

@@ -3,20 +3,14 @@
 #include <algorithm>
 #include <cmath>
 
+#include "dsp/KSectionStage.h"
+
 namespace {
 constexpr double kPi = 3.141592653589793;
 constexpr double kAbsoluteGate = -70.0;
 constexpr double kRelativeGate = -10.0;
 
 double Loudness(double meanSquare) noexcept { return meanSquare > 0.0 ? -0.691 + 10.0 * std::log10(meanSquare) : KLoudnessMeter::kSilence; }
-
-// One stage of a biquad in the meter's own transposed form; `z` holds its two delays.
-inline double Run(const KFilterSection& s, double x, double* z) noexcept {
-  const double y = s.b0 * x + z[0];
-  z[0] = s.b1 * x + s.minusA1 * y + z[1];
-  z[1] = s.b2 * x + s.minusA2 * y;
-  return y;
-}
 }  // namespace
 
 // The analog prototypes behind the weighting (a shelf of about +4 dB above 1.7 kHz and a
@@ -81,7 +75,7 @@ void KLoudnessMeter::Process(const float* const* channels, int32_t channelCount,
       const float* x = channels[c] + at;
       double* z = state_[c];
       for (int32_t i = 0; i < m; ++i) {
-        const double y = Run(highPass_, Run(shelf_, x[i], z), z + 2);
+        const double y = KSectionStage(highPass_, KSectionStage(shelf_, x[i], z), z + 2);
         energy += y * y;
       }
       // A NaN or infinity would stay in the filters for good: they start again from rest.

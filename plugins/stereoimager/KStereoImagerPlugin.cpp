@@ -5,17 +5,11 @@
 #include <utility>
 
 #include "core/KParameter.h"
+#include "dsp/KSectionStage.h"
 
 namespace {
 constexpr KAudioPlugin::Shape kShape{1, 1, false, false, false};
 constexpr double kButterworthQ = 0.7071067811865476;
-
-inline double Stage(const KFilterSection& s, double x, double* z) noexcept {
-  const double y = s.b0 * x + z[0];
-  z[0] = s.b1 * x + s.minusA1 * y + z[1];
-  z[1] = s.b2 * x + s.minusA2 * y;
-  return y;
-}
 }  // namespace
 
 KStereoImagerPlugin::KStereoImagerPlugin() : KAudioPlugin(kParameters, kShape) {}
@@ -72,8 +66,8 @@ void KStereoImagerPlugin::Process(const float* const* inputs, float* const* outp
   for (int32_t i = 0; i < sampleCount; ++i) {
     if (i < gliding) high += stepHigh, low += stepLow;
     const double mid = 0.5 * (inL[i] + static_cast<double>(inR[i])), side = 0.5 * (inL[i] - static_cast<double>(inR[i]));
-    const double lows = Stage(lowPass_, Stage(lowPass_, side, z[0]), z[1]);
-    const double highs = Stage(highPass_, Stage(highPass_, side, z[2]), z[3]);
+    const double lows = KSectionStage(lowPass_, KSectionStage(lowPass_, side, z[0]), z[1]);
+    const double highs = KSectionStage(highPass_, KSectionStage(highPass_, side, z[2]), z[3]);
     const double shaped = high * highs + low * lows;
     outL[i] = static_cast<float>(mid + shaped);
     outR[i] = static_cast<float>(mid - shaped);

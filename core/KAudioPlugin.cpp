@@ -47,6 +47,7 @@ bool KAudioPlugin::SetSampleRate(double sampleRate) {
 }
 
 void KAudioPlugin::Reset() {
+  resetModulator_.store(true, std::memory_order_release);
   RequestJump();
   ResetState();
   MarkUpdatePending();
@@ -149,6 +150,7 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
   if (KChannelMode::SwapsOutputs(mode))
     for (int32_t c = 0; c + 1 < outputCount; c += 2) std::swap(out[c], out[c + 1]);
 
+  Modulate(length);
   int32_t cap = subBlockCap_;
   int32_t next = std::max(1, InterpolationPrepare(length, cap, fineSubBlockCap_));
   // Without event splitting every message of the chunk is handed over before its audio.
@@ -175,6 +177,17 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
     }
   }
   InterpolationFinish();
+}
+
+void KAudioPlugin::Modulate(int32_t length) noexcept {
+  bool changed;
+  KModulator* modulator = modulator_.Acquire(changed);
+  // A new modulator starts from the set values: offsets of parameters it does not move go.
+  if (changed)
+    for (int32_t i = 0; i < ParameterCount(); ++i) GetParameter(i).Value().SetModulation(0.0);
+  if (!modulator) return;
+  if (resetModulator_.exchange(false, std::memory_order_acq_rel)) modulator->Reset();
+  modulator->Modulate(*this, length);
 }
 
 void KAudioPlugin::ProcessAudio(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept {

@@ -10,9 +10,12 @@
 #include "core/KAudioPluginBase.h"
 #include "core/KControllerMap.h"
 #include "core/KGlobalSettings.h"
+#include "core/KHandOver.h"
 #include "core/KLevelMeter.h"
 #include "core/KMIDIProcessor.h"
 #include "core/KMIDIQueue.h"
+#include "core/KModulator.h"
+#include "core/KMultiParameters.h"
 #include "core/KTransport.h"
 #include "core/KUndoHistory.h"
 #include "kernel/KExport.h"
@@ -138,7 +141,8 @@ public:
   //     <ProgramChange .../>                      program-change settings
   //     <Parameters key="working value" .../>     shortest text that reads back exactly
   //     <PluginSettings .../>                     the plug-in's own (StorePluginSettings)
-  //     <MultiParameters/> <LFOs/> <Arpeggiator/> kept as found, see StoreMultiParameters
+  //     <MultiParameters/> <LFOs/>                kept as found, and acting: see StoreMultiParameters
+  //     <Arpeggiator/>                            kept as found
   //     <ParamLock key="1" .../>
   //     <Controllers flags...><NoteControllers/><Controller Number= Channel= Parameter=/>...</Controllers>
   //     <ActivePreset Name="..." Current="1"/>
@@ -160,13 +164,25 @@ public:
   // kRemoveDefaults), with the element of its section.
   // On the root: the global settings, Version (only stored) and the channel mode first.
   void StoreGlobal(Element& section, uint32_t flags);
-  // Modulators and the arpeggiator belong to subsystems this product does not have yet. What a
-  // document brings under "MultiParameters", "LFOs" and "Arpeggiator" (and "NoteControllers"
-  // in "Controllers") is kept as found and written back unchanged, so that a state from a
-  // richer version survives a round trip through this one.
+  // What a document brings under "MultiParameters", "LFOs" and "Arpeggiator" (and
+  // "NoteControllers" in "Controllers") is kept as found and written back unchanged, so that a
+  // state from a richer version survives a round trip through this one. Loading, the first two
+  // also act: multiparameters become controls (KMultiParameters) and the LFOs a modulator made
+  // by the registered maker (KModulator), handed to the audio thread at its next block.
   void StoreMultiParameters(Element& section, uint32_t flags);
   void StoreLFO(Element& section, uint32_t flags);
   void StoreArp(Element& section, uint32_t flags);
+
+  // ---- modulators (user-interface thread)
+  const Element& LFOs() const noexcept { return lfos_; }
+  // A new "LFOs" section, acting from the next block.
+  void SetLFOs(Element section);
+  const Element& MultiParameterSection() const noexcept { return multiParameters_; }
+  void SetMultiParameterSection(Element section);
+  int32_t MultiParameterCount() const noexcept { return multi_.Count(); }
+  const KMultiParameters::Control& MultiParameter(int32_t index) const noexcept { return multi_.Get(index); }
+  // Moves a multiparameter's targets along their curves, sample-accurately from the next block.
+  void SetMultiParameter(int32_t index, double value, int32_t glideSamples = 0);
   // One "1" attribute per locked parameter key.
   void StoreParamLock(Element& section, uint32_t flags);
   void StoreControllers(Element& section, uint32_t flags);
@@ -252,6 +268,8 @@ private:
   void FollowActivePreset(const KPresetStore& store);
   void TellHostSettingsChanged() noexcept;
   void PassThrough(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
+  // Audio thread, before each piece of a host block: the modulator's ramps for it.
+  void Modulate(int32_t length) noexcept;
 
   // Samples of the channel mode's input copies, which live on the stack of the processing call.
   static constexpr int32_t kScratchSamples = 2 * kMaxChunk;
@@ -289,7 +307,10 @@ private:
   KArray<bool> locked_;
   KControllerMap controllers_;  // read by the audio thread
   Element multiParameters_;
+  KMultiParameters multi_;
   Element lfos_;
+  KHandOver<KModulator> modulator_;
+  std::atomic<bool> resetModulator_{false};
   Element arpeggiator_;
   Element noteControllers_;
   ActivePreset activePreset_;

@@ -20,11 +20,12 @@ double RampValue(const ParameterRamp& ramp) noexcept {
   return p0.value + (p1.value - p0.value) * elapsed / length;
 }
 
-void Fill(ParameterRamp& ramp, int32_t parameter, std::span<const ParameterRamp::Point> points, bool fine) noexcept {
+void Fill(ParameterRamp& ramp, int32_t parameter, std::span<const ParameterRamp::Point> points, bool fine, bool modulation = false) noexcept {
   ramp.parameter = parameter;
   for (size_t i = 0; i < points.size(); ++i) ramp.points[i] = points[i];
   ramp.pointCount = static_cast<int8_t>(points.size());
   ramp.fine = fine ? 1 : 0;
+  ramp.modulation = modulation ? 1 : 0;
 }
 }  // namespace
 
@@ -56,10 +57,12 @@ KAudioPluginBase::Parameter* KAudioPluginBase::FindParameter(const KString& key)
 void KAudioPluginBase::Apply(int32_t parameter, double normalized) noexcept {
   parameters_[parameter]->SetNormalized(normalized > 1.0 ? 1.0 : (normalized < 0.0 ? 0.0 : normalized));
 }
-void KAudioPluginBase::ApplyCurrent(ParameterRamp& ramp) noexcept { Apply(ramp.parameter, RampValue(ramp)); }
-void KAudioPluginBase::ApplyLast(ParameterRamp& ramp) noexcept {
-  Apply(ramp.parameter, ramp.points[ramp.pointCount - 1].value);
+void KAudioPluginBase::Apply(const ParameterRamp& ramp, double value) noexcept {
+  if (!ramp.modulation) Apply(ramp.parameter, value);
+  else parameters_[ramp.parameter]->Value().SetModulation(value > 1.0 ? 1.0 : (value < -1.0 ? -1.0 : value));
 }
+void KAudioPluginBase::ApplyCurrent(ParameterRamp& ramp) noexcept { Apply(ramp, RampValue(ramp)); }
+void KAudioPluginBase::ApplyLast(ParameterRamp& ramp) noexcept { Apply(ramp, ramp.points[ramp.pointCount - 1].value); }
 
 int32_t KAudioPluginBase::NextBreak(const ParameterRamp& ramp) const noexcept {
   if (ramp.fine) return ToGrid();
@@ -85,23 +88,25 @@ void KAudioPluginBase::Retire(ParameterRamp* ramp) noexcept {
   (ramp->posted ? postedReturns_ : spare_).PushBack(ramp);
 }
 
-void KAudioPluginBase::RetireRampsOf(int32_t parameter) noexcept {
+void KAudioPluginBase::RetireRampsOf(int32_t parameter, bool modulation) noexcept {
   for (ParameterRamp* ramp = active_.Head(); ramp;) {
     ParameterRamp* next = ramp->next;
-    if (ramp->parameter == parameter) Retire(ramp);
+    if (ramp->parameter == parameter && (ramp->modulation != 0) == modulation) Retire(ramp);
     ramp = next;
   }
 }
 
-bool KAudioPluginBase::AddRamp(int32_t parameter, std::span<const RampPoint> points, bool fine) noexcept {
+bool KAudioPluginBase::AddRamp(int32_t parameter, std::span<const RampPoint> points, bool fine, bool modulation) noexcept {
   if (parameter < 0 || parameter >= ParameterCount() || points.empty()) return false;
   ParameterRamp* ramp = points.size() >= 2 && points.size() <= ParameterRamp::kMaxPoints ? spare_.PopFront() : nullptr;
-  RetireRampsOf(parameter);
+  RetireRampsOf(parameter, modulation);
   if (!ramp) {
-    Apply(parameter, points.back().value);
+    ParameterRamp last;
+    Fill(last, parameter, points.last(1), false, modulation);
+    ApplyLast(last);
     return false;
   }
-  Fill(*ramp, parameter, points, fine);
+  Fill(*ramp, parameter, points, fine, modulation);
   active_.PushBack(ramp);
   rampsAdded_ = true;
   return true;

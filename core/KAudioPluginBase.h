@@ -70,7 +70,9 @@ public:
   // ParameterRamp::kBlockEnd). Replaces any ramp of the same parameter. Answers false when the
   // points are unusable (fewer than 2, more than 64, bad index) or the pool is empty, in which
   // case the last point's value is applied at once so that the final value is never lost.
-  bool AddRamp(int32_t parameter, std::span<const RampPoint> points, bool fine) noexcept;
+  // With `modulation` the ramp moves the parameter's modulation offset (KModulator) instead of
+  // its value, and replaces only a modulation ramp: automation and modulation run side by side.
+  bool AddRamp(int32_t parameter, std::span<const RampPoint> points, bool fine, bool modulation = false) noexcept;
   int32_t InterpolationPrepare(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept;
   int32_t InterpolationProcess(int32_t processedLength, int32_t remainingLength) noexcept;
   void InterpolationFinish() noexcept;
@@ -106,8 +108,9 @@ private:
   void ApplyCurrent(ParameterRamp& ramp) noexcept;
   void ApplyLast(ParameterRamp& ramp) noexcept;
   void Apply(int32_t parameter, double normalized) noexcept;
+  void Apply(const ParameterRamp& ramp, double value) noexcept;
   void Retire(ParameterRamp* ramp) noexcept;
-  void RetireRampsOf(int32_t parameter) noexcept;
+  void RetireRampsOf(int32_t parameter, bool modulation = false) noexcept;
   void ApplyOverflowValues() noexcept;
   int32_t NextBreak(const ParameterRamp& ramp) const noexcept;
   // Brings a ramp to the present position and applies its value; answers whether it retired.

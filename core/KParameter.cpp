@@ -10,6 +10,10 @@ void KParameterValue::SetNormalized(double normalized) noexcept {
   if (normalized_.exchange(normalized, std::memory_order_acq_rel) != normalized) owner_.MarkUpdatePending();
 }
 
+void KParameterValue::SetModulation(double offset) noexcept {
+  if (modulation_.exchange(offset, std::memory_order_relaxed) != offset) owner_.MarkUpdatePending();
+}
+
 KAudioPluginBase::Parameter::Parameter(KAudioPluginBase& owner, int32_t index, const KParameterInfo& info)
     : owner_(owner), index_(index), info_(info), value_(owner, *info.kind, info.kind->ToNormalized(info.defaultValue)) {}
 

@@ -22,6 +22,7 @@ struct ParameterRamp {
   int8_t pointCount = 0;
   uint8_t fine = 0;  // moves on the plug-in's fine grid (KAudioPluginBase), cut into fine sub-blocks
   uint8_t posted = 0;  // came through the hand-over from another thread (returns to that pool)
+  uint8_t modulation = 0;  // moves the parameter's modulation offset (-1..1), not its value
 };
 
 // Doubly linked list of ramp records. Never allocates: records move between lists.

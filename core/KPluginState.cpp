@@ -130,7 +130,7 @@ void KAudioPlugin::StoreParameters(Element& section, uint32_t flags, Scope scope
     // The working value's default is compared, not the normalised one: stepped kinds map many
     // normalised values to one working value, and a text must mean the same value either way.
     const double fallback = parameter.Kind().ToWorking(parameter.DefaultNormalized());
-    double working = parameter.Working();
+    double working = parameter.UnmodulatedWorking();
     s.ExactNumber(parameter.Key(), working, fallback);
     if (s.Storing()) continue;
     parameter.SetNormalized(working == fallback ? parameter.DefaultNormalized() : NormalizedFor(parameter.Kind(), working));
@@ -139,8 +139,27 @@ void KAudioPlugin::StoreParameters(Element& section, uint32_t flags, Scope scope
 
 void KAudioPlugin::StoreMultiParameters(Element& section, uint32_t flags) {
   KeepAsFound(multiParameters_, section, flags);
+  if (!(flags & kStore)) multi_.Read(multiParameters_, *this);
 }
-void KAudioPlugin::StoreLFO(Element& section, uint32_t flags) { KeepAsFound(lfos_, section, flags); }
+void KAudioPlugin::StoreLFO(Element& section, uint32_t flags) {
+  KeepAsFound(lfos_, section, flags);
+  if (!(flags & kStore)) SetLFOs(lfos_);
+}
+
+void KAudioPlugin::SetLFOs(Element section) {
+  lfos_ = std::move(section);
+  const KModulatorMaker maker = KGetModulatorMaker();
+  modulator_.Publish(maker ? maker(*this, lfos_) : nullptr);
+}
+
+void KAudioPlugin::SetMultiParameterSection(Element section) {
+  multiParameters_ = std::move(section);
+  multi_.Read(multiParameters_, *this);
+}
+
+void KAudioPlugin::SetMultiParameter(int32_t index, double value, int32_t glideSamples) {
+  multi_.Move(index, value, glideSamples, *this, multiParameters_);
+}
 void KAudioPlugin::StoreArp(Element& section, uint32_t flags) { KeepAsFound(arpeggiator_, section, flags); }
 
 void KAudioPlugin::StoreParamLock(Element& section, uint32_t flags) {

@@ -77,6 +77,12 @@ void KStateSection::Number(const KString& name, double& value, double fallback) 
       ReadFinite);
 }
 
+double KStateSection::ReadNumber(const Element& element, const KString& name, double fallback) {
+  const KString* text = element.FindAttribute(name);
+  double value;
+  return text && ReadFinite(*text, value) ? value : fallback;
+}
+
 void KStateSection::ExactNumber(const KString& name, double& value, double fallback) {
   Value(
       name, value, fallback,

@@ -57,6 +57,10 @@ public:
     if (Storing() && !IsEmpty(fresh)) element_.AddChild(std::move(fresh));
   }
 
+  // Outside a section routine: the attribute as a finite number, else `fallback` (absent, or
+  // not a number as a whole).
+  static double ReadNumber(const Element& element, const KString& name, double fallback);
+
   static bool IsEmpty(const Element& element) noexcept {
     return element.Attributes().IsEmpty() && element.ChildCount() == 0 && element.GetText().IsEmpty();
   }

@@ -9,6 +9,22 @@
   PLUGIN(kCompressorDescription)  \
   PLUGIN(kEqualizerDescription)   \
   PLUGIN(kSampleWarmerDescription) \
+  PLUGIN(kLimiterDescription) \
+  PLUGIN(kGateDescription) \
+  PLUGIN(kBitCrusherDescription) \
+  PLUGIN(kTransientShaperDescription) \
+  PLUGIN(kMultibandCompressorDescription) \
+  PLUGIN(kDynamicEqualizerDescription) \
+  PLUGIN(kWaveshaperDescription) \
+  PLUGIN(kEffectPipelineDescription) \
+  PLUGIN(kDelayDescription) \
+  PLUGIN(kReverbDescription) \
+  PLUGIN(kChorusDescription) \
+  PLUGIN(kFlangerDescription) \
+  PLUGIN(kPhaserDescription) \
+  PLUGIN(kTremoloDescription) \
+  PLUGIN(kAutoPanDescription) \
+  PLUGIN(kAutoFilterDescription) \
   PLUGIN(kConvolutionReverbDescription) \
   PLUGIN(kLoudnessMeterDescription) \
   PLUGIN(kSpectrumAnalyserDescription) \
@@ -24,6 +40,7 @@ TORVANE_CATALOGUE(TORVANE_DECLARE)
 const KCatalogue& KProductCatalogue() {
   // Copied on first use, after every description has been initialised.
   static const KPluginDescription plugins[] = {TORVANE_CATALOGUE(TORVANE_LIST)};
-  static const KCatalogue catalogue{plugins, {}};
+  static constexpr const char* kPipelineHosts[] = {"KEffectPipeline"};
+  static const KCatalogue catalogue{plugins, kPipelineHosts};
   return catalogue;
 }

@@ -23,11 +23,31 @@ TORVANE_API std::string KPluginEditorSnapshotPNG(KAudioPlugin& plugin, double sc
 // overview for an empty key; empty when none is written.
 KString KPluginEditorHelp(KAudioPlugin& plugin, const KString& key);
 
+struct KLFOControls;
+// A graph of one cycle of an LFO-driven plug-in's wave, for its editor description.
+KEditorDescription::GraphFactory KLFOGraph(const KLFOControls& controls);
+
 // Each plug-in's own editor description.
 KEditorDescription KUtilityEditor();
 KEditorDescription KCompressorEditor();
 KEditorDescription KEqualizerEditor();
 KEditorDescription KSampleWarmerEditor();
+KEditorDescription KLimiterEditor();
+KEditorDescription KGateEditor();
+KEditorDescription KBitCrusherEditor();
+KEditorDescription KTransientShaperEditor();
+KEditorDescription KMultibandCompressorEditor();
+KEditorDescription KDynamicEqualizerEditor();
+KEditorDescription KWaveshaperEditor();
+KEditorDescription KEffectPipelineEditor();
+KEditorDescription KDelayEditor();
+KEditorDescription KReverbEditor();
+KEditorDescription KChorusEditor();
+KEditorDescription KFlangerEditor();
+KEditorDescription KPhaserEditor();
+KEditorDescription KTremoloEditor();
+KEditorDescription KAutoPanEditor();
+KEditorDescription KAutoFilterEditor();
 KEditorDescription KConvolutionReverbEditor();
 KEditorDescription KLoudnessMeterEditor();
 KEditorDescription KSpectrumAnalyserEditor();

@@ -52,3 +52,13 @@ std::optional<std::string> KCliArguments::Last(std::string_view name) const {
     if (o->name == name) return o->value;
   return std::nullopt;
 }
+
+std::vector<std::span<char* const>> KSplitChain(std::span<char* const> words) {
+  std::vector<std::span<char* const>> parts;
+  for (size_t begin = 0, end; begin <= words.size(); begin = end + 1) {
+    end = begin;
+    while (end < words.size() && std::string_view(words[end]) != "+") ++end;
+    parts.push_back(words.subspan(begin, end - begin));
+  }
+  return parts;
+}

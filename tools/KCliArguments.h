@@ -34,5 +34,8 @@ private:
   std::vector<Option> options_;
 };
 
+// The words of a chain, "A [options] + B [options] ...", cut at each "+".
+std::vector<std::span<char* const>> KSplitChain(std::span<char* const> words);
+
 // Throws the KException that main reports as "torvane: <message>".
 [[noreturn]] void KCliFail(const std::string& message);

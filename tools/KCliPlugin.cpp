@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "core/Element.h"
+#include "core/KPipelineFile.h"
 #include "core/KXMLReader.h"
 #include "core/KXMLWriter.h"
 #include "kernel/KEntryPoints.h"
@@ -153,6 +154,14 @@ void KCliPlugin::LoadPreset(const std::string& fileOrName) {
     state = KXMLReader::Read(text.str());
   } catch (const KException& failure) {
     unreadable(failure);
+  }
+  if (state.GetName() == KString::Static(KPipelineFile::kRoot)) {
+    // An effect pipeline file: what a pipeline host loads as its whole chain.
+    const KStringList& hosts = KRegistries::Instance().PipelineHosts();
+    if (hosts.IndexOf(plugin_->Identifier()) < 0)
+      KCliFail("The file '" + fileOrName + "' is an effect pipeline; load it into " +
+               (hosts.Count() > 0 ? hosts[0].ToUtf8() : std::string("a pipeline host")) + ", not " + identifier + ".");
+    state = KPipelineFile::StateDocument(state);
   }
   const std::string owner = state.GetAttribute(KString::Static("Plugin")).ToUtf8();
   if (!owner.empty() && owner != identifier)

@@ -52,7 +52,11 @@ struct KTransportState final : ITransport {
 };
 
 struct KView final : IViewContainer {
+  int32_t type = kViewContainerNull;
+  void* window = nullptr;
   std::vector<std::pair<int32_t, int32_t>> sizes;
+  int32_t GetType() override { return type; }
+  void* GetPtr() override { return window; }
   Result SetViewSize(int32_t width, int32_t height) override { return sizes.emplace_back(width, height), kSuccess; }
 };
 

@@ -42,6 +42,11 @@ constexpr KCommand kCommands[] = {
      "  to standard error), save the settings given under NAME, print a preset's state document,\n"
      "  or delete it.\n",
      KRunPresets},
+    {"pipeline",
+     "usage: torvane pipeline PLUGIN [--set KEY=VALUE]... [--preset FILE|NAME] [--bypass] [+ PLUGIN ...]...\n"
+     "  Prints an effect pipeline file (.tvpipe) that runs the effect modules given, in series,\n"
+     "  each with its settings. 'render KEffectPipeline --preset FILE' plays it.\n",
+     KRunPipeline},
     {"help", kHelpUsage, KRunHelp},
     {"snapshot", kSnapshotUsage, KRunSnapshot},
 };

@@ -17,6 +17,7 @@ int KRunInfo(std::span<char* const> words);
 int KRunRender(std::span<char* const> words);
 int KRunState(std::span<char* const> words);
 int KRunPresets(std::span<char* const> words);
+int KRunPipeline(std::span<char* const> words);
 extern const char kHelpUsage[];
 int KRunHelp(std::span<char* const> words);
 extern const char kSnapshotUsage[];

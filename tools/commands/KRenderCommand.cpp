@@ -189,10 +189,8 @@ std::string OutputInFolder(const std::string& folder, const std::string& input, 
 int KRunRender(std::span<char* const> words) {
   // "A [options] + B [options] ... [INPUT...] OUTPUT": "+" separates the plug-ins of a chain.
   std::vector<KCliArguments> segments;
-  for (size_t begin = 0, end; begin <= words.size(); begin = end + 1) {
-    end = begin;
-    while (end < words.size() && std::string_view(words[end]) != "+") ++end;
-    segments.push_back(Segment(words.subspan(begin, end - begin)));
+  for (std::span<char* const> part : KSplitChain(words)) {
+    segments.push_back(Segment(part));
     if (segments.back().Positional().empty()) KCliFail("'render' takes PLUGIN [+ PLUGIN...] [INPUT...] OUTPUT: a plug-in name is missing.");
   }
   const RenderSettings settings = ReadSettings(segments);

@@ -25,6 +25,12 @@
   PLUGIN(kTremoloDescription) \
   PLUGIN(kAutoPanDescription) \
   PLUGIN(kAutoFilterDescription) \
+  PLUGIN(kConvolutionReverbDescription) \
+  PLUGIN(kLoudnessMeterDescription) \
+  PLUGIN(kSpectrumAnalyserDescription) \
+  PLUGIN(kMidSideDescription) \
+  PLUGIN(kStereoImagerDescription) \
+  PLUGIN(kToneGeneratorDescription) \
   /* new plug-ins above this line */
 
 #define TORVANE_DECLARE(description) extern const KPluginDescription description;

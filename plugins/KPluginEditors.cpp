@@ -38,6 +38,12 @@ constexpr EditorEntry kEditors[] = {
     {"KTremoloPlugin", &KTremoloEditor},
     {"KAutoPanPlugin", &KAutoPanEditor},
     {"KAutoFilterPlugin", &KAutoFilterEditor},
+    {"KConvolutionReverbPlugin", &KConvolutionReverbEditor},
+    {"KLoudnessMeterPlugin", &KLoudnessMeterEditor},
+    {"KSpectrumAnalyserPlugin", &KSpectrumAnalyserEditor},
+    {"KMidSidePlugin", &KMidSideEditor},
+    {"KStereoImagerPlugin", &KStereoImagerEditor},
+    {"KToneGeneratorPlugin", &KToneGeneratorEditor},
 };
 
 // The host layer makes editors through the factory, which sees no plug-in: this maker is it.

@@ -11,7 +11,7 @@ SUDO=""
 [ "$(id -u)" -eq 0 ] || SUDO="sudo"
 export DEBIAN_FRONTEND=noninteractive
 packages=(ca-certificates g++ cmake ninja-build pkg-config
-  libgtest-dev libgmock-dev libbenchmark-dev libsndfile1-dev
+  libgtest-dev libgmock-dev libbenchmark-dev libsndfile1-dev libkissfft-dev libsamplerate0-dev
   clang libclang-rt-14-dev
   libpng-dev libwebp-dev libfreetype-dev fonts-dejavu-core fonts-dejavu-extra
   libepoxy-dev libegl-dev libegl1-mesa-dev libgl1-mesa-dri libcairo2-dev
@@ -20,7 +20,7 @@ packages=(ca-certificates g++ cmake ninja-build pkg-config
 for option in "$@"; do
   case "$option" in
     --hosts) packages+=(ardour) ;;
-    --peers) packages+=(zam-plugins lsp-plugins-lv2) ;;
+    --peers) packages+=(zam-plugins lsp-plugins-lv2 libzita-convolver-dev libfftw3-dev) ;;
     *) echo "unknown option $option" >&2; exit 2 ;;
   esac
 done

@@ -70,38 +70,6 @@ void KUtilityPlugin::ProcessUpdate() {
 
 void KUtilityPlugin::ResetState() { jumpToTarget_ = true; }
 
-// Gliding, each matrix entry takes its step before the sample; then the rest of the block at rest.
 void KUtilityPlugin::Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) {
-  const int32_t gliding = std::min(matrix_.left, sampleCount);
-  const double* step = matrix_.step;
-  double a = matrix_.value[0], b = matrix_.value[1], c = matrix_.value[2], d = matrix_.value[3];
-  if (ChannelsPerBus() == 1) {
-    const float* in = inputs[0];
-    float* out = outputs[0];
-    for (int32_t i = 0; i < gliding; ++i) out[i] = static_cast<float>(in[i] * (a += step[0]));
-    matrix_.value[0] = a;
-    matrix_.Passed(gliding);
-    a = matrix_.value[0];
-    for (int32_t i = gliding; i < sampleCount; ++i) out[i] = static_cast<float>(in[i] * a);
-    return;
-  }
-  const float* inL = inputs[0];
-  const float* inR = inputs[1];
-  float* outL = outputs[0];
-  float* outR = outputs[1];
-  for (int32_t i = 0; i < gliding; ++i) {
-    a += step[0], b += step[1], c += step[2], d += step[3];
-    const double l = inL[i], r = inR[i];
-    outL[i] = static_cast<float>(a * l + b * r);
-    outR[i] = static_cast<float>(c * l + d * r);
-  }
-  const double reached[4] = {a, b, c, d};
-  std::copy_n(reached, 4, matrix_.value);
-  matrix_.Passed(gliding);
-  a = matrix_.value[0], b = matrix_.value[1], c = matrix_.value[2], d = matrix_.value[3];
-  for (int32_t i = gliding; i < sampleCount; ++i) {
-    const double l = inL[i], r = inR[i];
-    outL[i] = static_cast<float>(a * l + b * r);
-    outR[i] = static_cast<float>(c * l + d * r);
-  }
+  matrix_.Process(inputs, outputs, ChannelsPerBus(), sampleCount);
 }

@@ -4,7 +4,7 @@
 
 #include "core/KAudioPlugin.h"
 #include "core/KParameterInfo.h"
-#include "dsp/KGlide.h"
+#include "dsp/KStereoMatrix.h"
 #include "kernel/KPluginDescription.h"
 
 // A channel utility: gain, balance, stereo width, polarity, channel swap, mono and mute.
@@ -56,8 +56,7 @@ private:
   // The matrix the present settings ask for.
   void TargetMatrix(double (&m)[4]) const;
 
-  // Output = matrix x input: left = m[0]·L + m[1]·R, right = m[2]·L + m[3]·R.
-  KGlide<4> matrix_;
+  KStereoMatrix matrix_;
   bool jumpToTarget_ = true;
 };
 

@@ -1,0 +1,146 @@
+#include <benchmark/benchmark.h>
+
+#include <cmath>
+#include <cstdint>
+#include <random>
+#include <thread>
+#include <vector>
+
+#include "bench/SampleCounters.h"
+#include "dsp/KConvolver.h"
+
+#ifdef TORVANE_BENCH_ZITA
+#include <zita-convolver.h>
+#endif
+#ifdef TORVANE_BENCH_FFTW
+#include <fftw3.h>
+#include <kiss_fftr.h>
+#endif
+
+namespace {
+
+constexpr int32_t kBlock = 64;
+constexpr int32_t kRate = 48000;
+
+// A room of `seconds`: noise under an exponential decay of 60 dB over its length, one per channel.
+std::vector<float> Room(double seconds, uint32_t seed) {
+  std::mt19937 random(seed);
+  std::uniform_real_distribution<float> noise(-1.0f, 1.0f);
+  std::vector<float> taps(static_cast<size_t>(seconds * kRate));
+  const double decay = std::log(1000.0) / static_cast<double>(taps.size());
+  for (size_t k = 0; k < taps.size(); ++k) taps[k] = static_cast<float>(0.1 * std::exp(-decay * static_cast<double>(k))) * noise(random);
+  return taps;
+}
+
+// Input that never repeats within a response's length: a fresh block of noise each time.
+struct Signal {
+  explicit Signal(int32_t channels) : blocks(static_cast<size_t>(channels), std::vector<float>(kBlock * 64)), out(blocks) {
+    std::mt19937 random(7);
+    std::uniform_real_distribution<float> noise(-0.5f, 0.5f);
+    for (auto& channel : blocks)
+      for (float& v : channel) v = noise(random);
+  }
+  const float* In(int32_t c, int64_t block) const { return blocks[static_cast<size_t>(c)].data() + (block % 64) * kBlock; }
+  std::vector<std::vector<float>> blocks, out;
+};
+
+// The engine beside a plain direct-form loop (in double, as the head runs) on a short response,
+// where the direct form is at its best.
+void BM_ConvolverVersusDirect(benchmark::State& state) {
+  const auto taps = static_cast<int32_t>(state.range(0));
+  const std::vector<float> h = Room(taps / double(kRate), 1);
+  KConvolver convolver;
+  convolver.Load(h);
+  Signal signal(1);
+  std::vector<float> history(static_cast<size_t>(taps + kBlock), 0.0f);
+  KTimePair(
+      state, kBlock, [&](int64_t block) { convolver.Process(signal.In(0, block), signal.out[0].data(), kBlock); },
+      [&](int64_t block) {
+        std::copy(history.begin() + kBlock, history.end(), history.begin());
+        std::copy_n(signal.In(0, block), kBlock, history.end() - kBlock);
+        for (int32_t i = 0; i < kBlock; ++i) {
+          const float* x = history.data() + taps + i;  // the newest sample this output sees
+          double acc = 0.0;
+          for (int32_t k = 0; k < taps; ++k) acc += static_cast<double>(h[static_cast<size_t>(k)]) * x[-k];
+          signal.out[0][static_cast<size_t>(i)] = static_cast<float>(acc);
+        }
+      });
+}
+BENCHMARK(BM_ConvolverVersusDirect)->Arg(64)->Arg(256)->UseManualTime();
+
+// A two-second stereo response at 64-sample blocks, two channels each with its own response.
+void BM_ConvolverStereoTwoSeconds(benchmark::State& state) {
+  const std::vector<float> left = Room(2.0, 2), right = Room(2.0, 3);
+  KConvolver convolvers[2];
+  convolvers[0].Load(left);
+  convolvers[1].Load(right);
+  Signal signal(2);
+  int64_t block = 0;
+  for (auto _ : state) {
+    for (int32_t c = 0; c < 2; ++c) convolvers[c].Process(signal.In(c, block), signal.out[static_cast<size_t>(c)].data(), kBlock);
+    ++block;
+    benchmark::ClobberMemory();
+  }
+  KCountPerSampleChannel(state, 2 * kBlock);
+}
+BENCHMARK(BM_ConvolverStereoTwoSeconds);
+
+#ifdef TORVANE_BENCH_ZITA
+// The same two-second stereo convolution by zita-convolver (GPL; only this benchmark links it),
+// set up as its hosts do: 64-sample quantum and partitions from 64 to 8192. Its larger levels run
+// in threads of their own; process(true) waits for them, so the wall time of a block counts all
+// of its work. It delays its output by one quantum, where ours adds none.
+void BM_ConvolverVersusZita(benchmark::State& state) {
+  std::vector<float> left = Room(2.0, 2), right = Room(2.0, 3);
+  KConvolver convolvers[2];
+  convolvers[0].Load(left);
+  convolvers[1].Load(right);
+  Convproc zita;
+  zita.configure(2, 2, static_cast<uint32_t>(left.size()), kBlock, Convproc::MINPART, Convproc::MAXPART, 0.0f);
+  zita.impdata_create(0, 0, 1, left.data(), 0, static_cast<int32_t>(left.size()));
+  zita.impdata_create(1, 1, 1, right.data(), 0, static_cast<int32_t>(right.size()));
+  zita.start_process(0, 0);
+  Signal signal(2);
+  KTimePair(
+      state, 2 * kBlock,
+      [&](int64_t block) {
+        for (int32_t c = 0; c < 2; ++c) convolvers[c].Process(signal.In(c, block), signal.out[static_cast<size_t>(c)].data(), kBlock);
+      },
+      [&](int64_t block) {
+        for (uint32_t c = 0; c < 2; ++c) std::copy_n(signal.In(static_cast<int32_t>(c), block), kBlock, zita.inpdata(c));
+        zita.process(true);
+        for (uint32_t c = 0; c < 2; ++c) std::copy_n(zita.outdata(c), kBlock, signal.out[c].data());
+      });
+  // Its threads stop at their own pace; cleaning up (or planning FFTW transforms) before that
+  // corrupts its heap.
+  zita.stop_process();
+  while (!zita.check_stop()) std::this_thread::sleep_for(std::chrono::milliseconds(1));
+  zita.cleanup();
+}
+BENCHMARK(BM_ConvolverVersusZita)->UseManualTime();
+#endif
+
+#ifdef TORVANE_BENCH_FFTW
+// The FFT behind the engine (kissfft, BSD licence) against FFTW (GPL, which rules it out of the
+// kernel) on the real transforms the engine's levels run: twice 64 and twice 4096 samples.
+void BM_KissFFTVersusFFTW(benchmark::State& state) {
+  const auto size = static_cast<int32_t>(state.range(0));
+  std::vector<float> time(static_cast<size_t>(size));
+  std::mt19937 random(9);
+  std::uniform_real_distribution<float> noise(-1.0f, 1.0f);
+  for (float& v : time) v = noise(random);
+  std::vector<kiss_fft_cpx> kissOut(static_cast<size_t>(size / 2 + 1));
+  kiss_fftr_cfg kiss = kiss_fftr_alloc(size, 0, nullptr, nullptr);
+  fftwf_complex* fftwOut = fftwf_alloc_complex(static_cast<size_t>(size / 2 + 1));
+  fftwf_plan plan = fftwf_plan_dft_r2c_1d(size, time.data(), fftwOut, FFTW_MEASURE);
+  for (float& v : time) v = noise(random);  // planning may overwrite the input
+  KTimePair(
+      state, size, [&](int64_t) { kiss_fftr(kiss, time.data(), kissOut.data()); }, [&](int64_t) { fftwf_execute(plan); });
+  fftwf_destroy_plan(plan);
+  fftwf_free(fftwOut);
+  kiss_fftr_free(kiss);
+}
+BENCHMARK(BM_KissFFTVersusFFTW)->Arg(128)->Arg(8192)->UseManualTime();
+#endif
+
+}  // namespace

@@ -1,0 +1,10 @@
+#include "plugins/KPluginEditors.h"
+
+namespace {
+constexpr KEditorSection kSections[] = {
+    {"Tone", "waveform frequency level", 3},
+    {"Output", "output play", 1},
+};
+}  // namespace
+
+KEditorDescription KToneGeneratorEditor() { return KEditorDescription::Of(kSections); }

@@ -114,7 +114,7 @@ struct KBundle {
   template <class Function>
   Function Entry(const char* name) { return reinterpret_cast<Function>(KPlatform::FindSymbol(library, name)); }
   explicit KBundle(const std::string& name)
-      : library(KPlatform::OpenLibrary(TORVANE_AAX_DIR "/" + name + ".aaxplugin/Contents/" TORVANE_AAX_ARCH "/" + name + ".so")) {
+      : library(KPlatform::OpenLibrary(TORVANE_AAX_DIR "/" + name + ".aaxplugin/Contents/" TORVANE_AAX_ARCH "/" + name + TORVANE_AAX_BINARY)) {
     EXPECT_NE(library, nullptr) << KPlatform::LibraryError();
     uint64_t version = 0;
     EXPECT_EQ(Entry<ACFEntry>("ACFStartup")(nullptr), kACFOk);

@@ -86,7 +86,7 @@ struct KInstance {
 struct KModuleFile {
   void* library;
   MainFunction main = nullptr, legacyMain = nullptr;
-  explicit KModuleFile(const std::string& name) : library(KPlatform::OpenLibrary(TORVANE_VST2_DIR "/" + name + ".so")) {
+  explicit KModuleFile(const std::string& name) : library(KPlatform::OpenLibrary(TORVANE_VST2_DIR "/" + name + TORVANE_VST2_BINARY)) {
     main = reinterpret_cast<MainFunction>(KPlatform::FindSymbol(library, "VSTPluginMain"));
     legacyMain = reinterpret_cast<MainFunction>(KPlatform::FindSymbol(library, "main"));
     EXPECT_TRUE(library && main && legacyMain) << KPlatform::LibraryError();

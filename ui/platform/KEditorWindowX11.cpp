@@ -4,13 +4,12 @@
 #include <X11/Xutil.h>
 #include <X11/keysym.h>
 
-#include <algorithm>
-#include <chrono>
 #include <cmath>
 
 #include "kernel/KException.h"
 #include "ui/KDrawerToKBitmap.h"
 #include "ui/editor/KEditor.h"
+#include "ui/platform/KEditorPaint.h"
 
 namespace {
 
@@ -130,20 +129,10 @@ void KEditorWindowX11::HandleEvent(const XEvent& event) {
 }
 
 int64_t KEditorWindowX11::PaintDirty() {
-  if (!editor_.Tree().NeedsPaint()) return 0;
-  const bool full = editor_.Tree().DirtyArea() == editor_.Tree().Root().Bounds();
-  const auto start = std::chrono::steady_clock::now();
-  const KRect area = editor_.Paint(*drawer_);
-  if (full) lastFullPaintMs_ = std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start).count();
-  if (area.IsEmpty()) return 0;
-  // The logical area in pixels, widened by one for anti-aliased edges.
-  const double s = editor_.Scale();
-  const int32_t left = std::max(0, static_cast<int32_t>(std::floor(area.left * s)) - 1);
-  const int32_t top = std::max(0, static_cast<int32_t>(std::floor(area.top * s)) - 1);
-  const int32_t right = std::min(backBuffer_.Width() - 1, static_cast<int32_t>(std::ceil((area.right + 1) * s)));
-  const int32_t bottom = std::min(backBuffer_.Height() - 1, static_cast<int32_t>(std::ceil((area.bottom + 1) * s)));
-  Present(left, top, right, bottom);
-  return int64_t{right - left + 1} * (bottom - top + 1);
+  const KPaintedPixels painted = KPaintEditorDirty(editor_, *drawer_, backBuffer_, lastFullPaintMs_);
+  if (painted.IsEmpty()) return 0;
+  Present(painted.left, painted.top, painted.right, painted.bottom);
+  return painted.Count();
 }
 
 void KEditorWindowX11::Present(int32_t left, int32_t top, int32_t right, int32_t bottom) {

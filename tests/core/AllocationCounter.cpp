@@ -3,6 +3,9 @@
 #include <cstddef>
 #include <cstdlib>
 #include <new>
+#if defined(_WIN32)
+#include <malloc.h>
+#endif
 
 // Linked with -Wl,--wrap for the malloc family: calls from our objects arrive at __wrap_*,
 // which reach the C library (or a sanitizer's allocator) through __real_*.
@@ -39,10 +42,20 @@ void* operator new(size_t size, std::align_val_t alignment) {
   KCountAllocation();
   const auto align = static_cast<size_t>(alignment);
   const size_t rounded = (size + align - 1) / align * align;  // aligned_alloc wants a multiple
+#if defined(_WIN32)
+  // The Windows C library has no aligned_alloc: aligned blocks have their own pair of calls.
+  if (void* block = _aligned_malloc(rounded == 0 ? align : rounded, align)) return block;
+#else
   if (void* block = std::aligned_alloc(align, rounded == 0 ? align : rounded)) return block;
+#endif
   throw std::bad_alloc();
 }
 void operator delete(void* block) noexcept { std::free(block); }
 void operator delete(void* block, size_t) noexcept { std::free(block); }
+#if defined(_WIN32)
+void operator delete(void* block, std::align_val_t) noexcept { _aligned_free(block); }
+void operator delete(void* block, size_t, std::align_val_t) noexcept { _aligned_free(block); }
+#else
 void operator delete(void* block, std::align_val_t) noexcept { std::free(block); }
 void operator delete(void* block, size_t, std::align_val_t) noexcept { std::free(block); }
+#endif

@@ -3,7 +3,7 @@
 # packages, as static libraries, into a prefix outside the source tree (the toolchain file
 # cmake/mingw-w64-x86_64.cmake finds them there):
 #   bash scripts/windows-deps.sh [prefix]        (default ~/.cache/torvane-win/prefix)
-# Each library is built once per pinned version (a stamp in the prefix remembers it). The audio
+# Each library is built once per pinned version and recipe (a stamp in the prefix remembers it). The audio
 # file library is built without its external codecs: WAV, AIFF, CAF, W64 and AU, no FLAC or Ogg.
 # Needs scripts/install-deps.sh --windows; adds Debian's source lists when they are missing.
 set -euo pipefail
@@ -112,7 +112,7 @@ build_libwebp() {
     -DWEBP_BUILD_IMG2WEBP=OFF -DWEBP_BUILD_VWEBP=OFF -DWEBP_BUILD_WEBPINFO=OFF -DWEBP_BUILD_WEBPMUX=OFF -DWEBP_BUILD_EXTRAS=OFF
 }
 build_freetype() {
-  build_cmake "$1" -DFT_DISABLE_ZLIB=ON -DFT_DISABLE_BZIP2=ON -DFT_DISABLE_PNG=ON -DFT_DISABLE_HARFBUZZ=ON -DFT_DISABLE_BROTLI=ON
+  build_cmake "$1" -DFT_REQUIRE_ZLIB=ON -DFT_DISABLE_BZIP2=ON -DFT_DISABLE_PNG=ON -DFT_DISABLE_HARFBUZZ=ON -DFT_DISABLE_BROTLI=ON
 }
 build_libepoxy() {
   rm -rf "$1/_win"
@@ -129,10 +129,12 @@ build_googletest() { build_cmake "$1" -DBUILD_GMOCK=ON -Dgtest_disable_pthreads=
 for pin in "${pins[@]}"; do
   read -r package version <<<"$pin"
   stamp="$prefix/.built-$package"
-  if [ "$(cat "$stamp" 2>/dev/null)" = "$version" ]; then continue; fi
+  # The pinned version and the recipe that built it: a changed recipe builds again.
+  recipe="$version $(declare -f "build_$package" | md5sum | cut -c1-12)"
+  if [ "$(cat "$stamp" 2>/dev/null)" = "$recipe" ]; then continue; fi
   echo "=== $package $version"
   source=$(unpack "$package" "$version")
   "build_$package" "$source"
-  echo "$version" >"$stamp"
+  echo "$recipe" >"$stamp"
 done
 echo "Windows libraries in $prefix"

@@ -2,6 +2,7 @@
 #include <cmath>
 #include <complex>
 #include <memory>
+#include <numbers>
 #include <vector>
 
 #include "core/KParameter.h"
@@ -34,7 +35,7 @@ public:
 
   double Decibels(double hz) {
     Refresh();
-    const std::complex<double> z = std::polar(1.0, -2 * M_PI * hz / kGraphRate);  // z^-1
+    const std::complex<double> z = std::polar(1.0, -2 * std::numbers::pi * hz / kGraphRate);  // z^-1
     double db = 0;
     for (const KFilterSection& s : sections_) {
       const std::complex<double> num = s.b0 + s.b1 * z + s.b2 * z * z;

@@ -1,12 +1,12 @@
 #!/usr/bin/env bash
 # A Windows binary of ours must run on a bare Windows: it may import system DLLs only (no MinGW
-# runtime, no third-party DLL), and the kernel must export its entry points.
+# runtime, no third-party DLL) besides our own kernel, and the kernel must export its entry points.
 #   WindowsImports.sh <objdump> <binary> [<export>...]
 set -euo pipefail
 objdump=$1 binary=$2
 shift 2
 report=$("$objdump" -p "$binary")
-system='^(kernel32|user32|gdi32|advapi32|shell32|ole32|oleaut32|winmm|opengl32|comdlg32|comctl32|ws2_32|wsock32|msvcrt|shlwapi|imm32|version|api-ms-win-[a-z0-9-]+)\.dll$'
+system='^(torvane|kernel32|user32|gdi32|advapi32|shell32|ole32|oleaut32|winmm|opengl32|comdlg32|comctl32|ws2_32|wsock32|msvcrt|shlwapi|imm32|version|api-ms-win-[a-z0-9-]+)\.dll$'
 status=0
 while read -r dll; do
   if ! tr '[:upper:]' '[:lower:]' <<<"$dll" | grep -Eq "$system"; then

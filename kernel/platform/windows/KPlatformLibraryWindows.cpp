@@ -7,6 +7,18 @@ namespace {
 // The failure LibraryError reports, per thread as the system keeps it; 0 when there was none.
 thread_local DWORD tLastFailure = 0;
 
+// The absolute path with backslashes: the loader resolves a library's dependencies from its
+// folder only for such a path, and compares loaded modules by it.
+std::wstring FullPath(const std::string& path) {
+  const std::wstring wide = KPlatform::Wide(path);
+  const DWORD length = ::GetFullPathNameW(wide.c_str(), 0, nullptr, nullptr);
+  if (length == 0) return wide;
+  std::wstring full(length, L'\0');
+  const DWORD written = ::GetFullPathNameW(wide.c_str(), length, full.data(), nullptr);
+  full.resize(written < length ? written : 0);
+  return full.empty() ? wide : full;
+}
+
 template <typename T>
 T Remember(T result) noexcept {
   if (!result) tLastFailure = ::GetLastError();
@@ -18,7 +30,7 @@ T Remember(T result) noexcept {
 // finds the kernel that lies beside it.
 void* KPlatform::OpenLibrary(const std::string& path) noexcept {
   try {
-    return Remember(static_cast<void*>(::LoadLibraryExW(Wide(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH)));
+    return Remember(static_cast<void*>(::LoadLibraryExW(FullPath(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH)));
   } catch (...) {
     tLastFailure = ERROR_NOT_ENOUGH_MEMORY;
     return nullptr;
@@ -36,7 +48,7 @@ void KPlatform::CloseLibrary(void* library) noexcept {
 
 bool KPlatform::IsLibraryLoaded(const std::string& path) noexcept {
   try {
-    return ::GetModuleHandleW(Wide(path).c_str()) != nullptr;
+    return ::GetModuleHandleW(FullPath(path).c_str()) != nullptr;
   } catch (...) {
     return false;
   }

@@ -8,12 +8,18 @@
 #endif
 
 // Linked with -Wl,--wrap for the malloc family: calls from our objects arrive at __wrap_*,
-// which reach the C library (or a sanitizer's allocator) through __real_*.
+// which reach the C library (or a sanitizer's allocator) through __real_*. Not on Windows: MinGW
+// keeps thread_local variables in blocks it allocates with malloc on first use, which would
+// come back here; there only operator new is counted.
+#if defined(_WIN32)
+#define __real_malloc std::malloc
+#else
 extern "C" {
 void* __real_malloc(size_t size);
 void* __real_calloc(size_t count, size_t size);
 void* __real_realloc(void* block, size_t size);
 }
+#endif
 
 namespace {
 thread_local KAllocationCounter* tInnermost = nullptr;
@@ -26,11 +32,13 @@ void KCountAllocation() noexcept {
 KAllocationCounter::KAllocationCounter() noexcept : outer_(tInnermost) { tInnermost = this; }
 KAllocationCounter::~KAllocationCounter() { tInnermost = outer_; }
 
+#if !defined(_WIN32)
 extern "C" {
 void* __wrap_malloc(size_t size) { KCountAllocation(); return __real_malloc(size); }
 void* __wrap_calloc(size_t count, size_t size) { KCountAllocation(); return __real_calloc(count, size); }
 void* __wrap_realloc(void* block, size_t size) { KCountAllocation(); return __real_realloc(block, size); }
 }
+#endif
 
 // The array and nothrow forms of the standard library forward to these two.
 void* operator new(size_t size) {

@@ -52,7 +52,11 @@ struct KTransportState final : ITransport {
 };
 
 struct KView final : IViewContainer {
+  int32_t type = kViewContainerNull;
+  void* window = nullptr;
   std::vector<std::pair<int32_t, int32_t>> sizes;
+  int32_t GetType() override { return type; }
+  void* GetPtr() override { return window; }
   Result SetViewSize(int32_t width, int32_t height) override { return sizes.emplace_back(width, height), kSuccess; }
 };
 
@@ -114,7 +118,7 @@ struct KBundle {
   template <class Function>
   Function Entry(const char* name) { return reinterpret_cast<Function>(KPlatform::FindSymbol(library, name)); }
   explicit KBundle(const std::string& name)
-      : library(KPlatform::OpenLibrary(TORVANE_AAX_DIR "/" + name + ".aaxplugin/Contents/" TORVANE_AAX_ARCH "/" + name + TORVANE_AAX_BINARY)) {
+      : library(KPlatform::OpenLibrary(TORVANE_AAX_DIR "/" + name + ".aaxplugin/Contents/" TORVANE_AAX_ARCH "/" + name + ".so")) {
     EXPECT_NE(library, nullptr) << KPlatform::LibraryError();
     uint64_t version = 0;
     EXPECT_EQ(Entry<ACFEntry>("ACFStartup")(nullptr), kACFOk);

@@ -98,10 +98,9 @@ bool HasDesktop() noexcept {
   return station && ::GetUserObjectInformationW(station, UOI_FLAGS, &flags, sizeof(flags), nullptr) && (flags.dwFlags & WSF_VISIBLE);
 }
 
-void WriteToErrorStream(const char* data, size_t length) noexcept {
-  DWORD written = 0;
-  ::WriteFile(::GetStdHandle(STD_ERROR_HANDLE), data, static_cast<DWORD>(length), &written, nullptr);
-}
+// Through the C runtime's descriptor 2, so that a redirection of it (as tests capture it) holds;
+// its text mode turns each line end into the system's.
+void WriteToErrorStream(const char* data, size_t length) noexcept { ::_write(2, data, static_cast<unsigned>(length)); }
 }  // namespace
 
 bool KPlatform::IsErrorStreamTerminal() noexcept {
@@ -132,7 +131,7 @@ void KPlatform::ShowMessageBox(const char16_t* text, size_t length) noexcept {
     }
     std::string line;
     KUtf8::Encode(text, static_cast<int32_t>(length), line);
-    line += "\r\n";
+    line.push_back('\n');
     WriteToErrorStream(line.data(), line.size());
   } catch (...) {
     // Out of memory while reporting: nothing better to do than stay silent.

@@ -16,6 +16,7 @@
 #include "core/KTransport.h"
 #include "core/KUndoHistory.h"
 #include "kernel/KExport.h"
+#include "kernel/KFactoryPreset.h"
 #include "kernel/KString.h"
 #include "kernel/KStringList.h"
 
@@ -189,6 +190,10 @@ public:
   // assignments. The instance's global settings and parameter locks stay. One undo step.
   void LoadPreset(const KString& name);
   KStringList ListPresets() const;
+  // Loads one of the plug-in's own sounds the same way: the parameters it names take its values,
+  // every other one its default. A KException, before anything changes, for a key the plug-in
+  // does not have.
+  void LoadFactoryPreset(const KFactoryPreset& preset);
   void RenamePreset(const KString& from, const KString& to);
   void DeletePreset(const KString& name);
   // The preset the settings came from (empty: none), and whether they are still its settings:

@@ -1,7 +1,10 @@
 // The plug-in's presets and its undo history: what the editor offers around the state.
+#include <string>
+
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
 #include "core/KPresetStore.h"
+#include "core/KStateSection.h"
 #include "core/KAudioPluginHost.h"
 #include "kernel/KException.h"
 #include "kernel/KGuard.h"
@@ -42,6 +45,28 @@ void KAudioPlugin::LoadPreset(const KString& name) {
   RequestJump();
   activePreset_ = {name, true};
   FollowActivePreset(store);
+  TellHostSettingsChanged();
+}
+
+void KAudioPlugin::LoadFactoryPreset(const KFactoryPreset& preset) {
+  // The sound as a preset document holds it, so that it loads exactly as a saved one would.
+  Element sound(KString::Static(kStateRoot));
+  Element parameters(KString::Static("Parameters"));
+  KStateSection values(parameters, kStore);
+  for (const KFactoryPreset::Value& value : preset.values) {
+    const KString key = KString::Static(value.key);
+    const Parameter* parameter = FindParameter(key);
+    if (!parameter) throw KException(KString::FromUtf8(std::string("The preset \"") + preset.name + "\" names no parameter \"" + value.key + "\"."));
+    double working = value.working;
+    values.ExactNumber(key, working, parameter->Kind().ToWorking(parameter->DefaultNormalized()));
+  }
+  sound.AddChild(std::move(parameters));
+  undo_.UndoStoreSettings();
+  StoreSections(sound, 0, Scope::kPresetSound);
+  RequestJump();
+  activePreset_ = {KString::FromUtf8(preset.name), true};
+  globals_.preset = activePreset_.name;
+  globals_.presetIndex = -1;  // not one of the user's presets
   TellHostSettingsChanged();
 }
 

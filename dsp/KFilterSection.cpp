@@ -1,6 +1,8 @@
 #include "dsp/KFilterSection.h"
 
+#include <algorithm>
 #include <cmath>
+#include <complex>
 
 #include "kernel/KException.h"
 
@@ -197,4 +199,11 @@ void KFilterSection::Design(int32_t code, double gainDb, double frequencyHz, dou
   b1 = r.b1 / r.a0;
   minusA2 = -r.a2 / r.a0;
   b2 = r.b2 / r.a0;
+}
+
+double KFilterSection::Decibels(double hz) const noexcept {
+  const std::complex<double> z = std::polar(1.0, -6.283185307179586 * hz / sampleRate);  // z^-1
+  const std::complex<double> numerator = b0 + b1 * z + b2 * z * z;
+  const std::complex<double> denominator = 1.0 - minusA1 * z - minusA2 * z * z;
+  return 20.0 * std::log10(std::max(std::abs(numerator / denominator), 1e-9));
 }

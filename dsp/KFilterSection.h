@@ -49,6 +49,9 @@ struct KFilterSection {
   // but the five coefficients has been overwritten. Frequencies above 0.499·sample rate are
   // the caller's to refuse.
   void Design(int32_t code, double gainDb, double frequencyHz, double sampleRateHz, double q);
+  // The magnitude of the response at `hz` in dB (at the rate it was designed for), at least
+  // −180 dB: for the editors' graphs.
+  double Decibels(double hz) const noexcept;
 };
 
 static_assert(offsetof(KFilterSection, minusA1) == offsetof(KFilterSection, b0) + sizeof(double) &&

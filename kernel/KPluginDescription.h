@@ -1,5 +1,8 @@
 #pragma once
 
+#include <span>
+
+#include "kernel/KFactoryPreset.h"
 #include "kernel/KPluginRegistry.h"
 
 struct KPluginHelp;
@@ -20,6 +23,7 @@ struct KPluginDescription {
   const char* vst2Id = nullptr;             // four printable ASCII characters, unique in the catalogue
   const char* identity = nullptr;           // the key at first release; stays when the key is renamed
   const KPluginHelp& (*help)() = nullptr;   // what the plug-in and each parameter are for (plugins/KPluginHelp.h)
+  std::span<const KFactoryPreset> presets = {};  // the sounds it ships with, in the order offered
   const char* vendor = kVendor;
   const char* version = TORVANE_VERSION;
 };

@@ -9,6 +9,13 @@
   PLUGIN(kCompressorDescription)  \
   PLUGIN(kEqualizerDescription)   \
   PLUGIN(kSampleWarmerDescription) \
+  PLUGIN(kLimiterDescription) \
+  PLUGIN(kGateDescription) \
+  PLUGIN(kBitCrusherDescription) \
+  PLUGIN(kTransientShaperDescription) \
+  PLUGIN(kMultibandCompressorDescription) \
+  PLUGIN(kDynamicEqualizerDescription) \
+  PLUGIN(kWaveshaperDescription) \
   /* new plug-ins above this line */
 
 #define TORVANE_DECLARE(description) extern const KPluginDescription description;

@@ -22,6 +22,13 @@ constexpr EditorEntry kEditors[] = {
     {"KCompressorPlugin", &KCompressorEditor},
     {"KEqualizerPlugin", &KEqualizerEditor},
     {"KSampleWarmer", &KSampleWarmerEditor},
+    {"KLimiterPlugin", &KLimiterEditor},
+    {"KGatePlugin", &KGateEditor},
+    {"KBitCrusherPlugin", &KBitCrusherEditor},
+    {"KTransientShaperPlugin", &KTransientShaperEditor},
+    {"KMultibandCompressorPlugin", &KMultibandCompressorEditor},
+    {"KDynamicEqualizerPlugin", &KDynamicEqualizerEditor},
+    {"KWaveshaperPlugin", &KWaveshaperEditor},
 };
 
 // The host layer makes editors through the factory, which sees no plug-in: this maker is it.

@@ -110,9 +110,22 @@ protected:
   ~ITransport() = default;
 };
 
-// The frame the host gives an effect's GUI.
+// What kind of native window a view container holds. The published kinds name no Linux window;
+// an X11 window id is our own kind, after them.
+enum ViewContainerType : int32_t {
+  kViewContainerNull = 0,
+  kViewContainerNSView = 1,
+  kViewContainerUIView = 2,
+  kViewContainerHWND = 3,
+  kViewContainerX11Window = 4,
+};
+
+// The frame the host gives an effect's GUI: its native window, and its size.
 class IViewContainer {
 public:
+  virtual int32_t GetType() = 0;
+  // The native window (an X11 window id cast to a pointer for kViewContainerX11Window).
+  virtual void* GetPtr() = 0;
   virtual Result SetViewSize(int32_t width, int32_t height) = 0;
 
 protected:

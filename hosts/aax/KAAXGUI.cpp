@@ -1,5 +1,7 @@
 #include "hosts/aax/KAAXGUI.h"
 
+#include <cstdint>
+
 #include "hosts/aax/KAudioPluginAAXAdapter.h"
 #include "hosts/common/KHostGuard.h"
 
@@ -7,8 +9,14 @@ using namespace KAAX;
 
 KAAXGUI::KAAXGUI(KAudioPluginAAXAdapter& effect) noexcept : effect_(&effect) { effect.AttachGUI(this); }
 
-KAAXGUI::~KAAXGUI() {
+KAAXGUI::~KAAXGUI() { DetachEffect(); }
+
+// The editor reaches the plug-in: it goes before the effect does.
+void KAAXGUI::DetachEffect() noexcept {
+  view_.reset();
+  host_.reset();
   if (effect_) effect_->AttachGUI(nullptr);
+  effect_ = nullptr;
 }
 
 Result KAAXGUI::Create(IViewContainer* container) {
@@ -19,11 +27,32 @@ Result KAAXGUI::Create(IViewContainer* container) {
   });
 }
 
-// The empty view of the class comment: nothing to build yet but the record that it exists.
+// The editor, framed at its size, in the container's window when it holds one this platform
+// knows (a container without a window still gets the size, for a host that shows it later).
 Result KAAXGUI::CreateViewContents() {
   return KHostGuarded("KAAXGUI::CreateViewContents", kErrorNullObject, [&] {
     if (!container_ || !effect_) return kErrorNotInitialized;
-    hasContents_ = true;
+    if (!view_) {
+      host_ = std::make_unique<KInterfaceEditorHost>(*effect_);
+      view_ = std::make_unique<KHostEditor>(effect_->GetPlugin(), host_.get());
+    }
+    if (container_->GetType() == kViewContainerX11Window && !view_->IsOpen())
+      view_->Open(static_cast<unsigned long>(reinterpret_cast<uintptr_t>(container_->GetPtr())));
+    return Resize(view_->PixelWidth(), view_->PixelHeight()) ? kSuccess : kErrorNotInitialized;
+  });
+}
+
+Result KAAXGUI::DeleteViewContents() {
+  return KHostGuarded("KAAXGUI::DeleteViewContents", kErrorNullObject, [&] {
+    view_.reset();
+    host_.reset();
+    return kSuccess;
+  });
+}
+
+Result KAAXGUI::TimerWakeup() {
+  return KHostGuarded("KAAXGUI::TimerWakeup", kSuccess, [&] {
+    if (view_) view_->Idle();
     return kSuccess;
   });
 }

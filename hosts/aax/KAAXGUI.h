@@ -1,20 +1,23 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 
 #include "hosts/aax/KAAXBase.h"
 #include "hosts/aax/KAAXLiveObject.h"
+#include "hosts/common/KHostEditor.h"
 #include "kernel/KExport.h"
 
 class KAudioPluginAAXAdapter;
 
 // The GUI of an AAX effect: the host makes it for one effect-parameters object, gives it a
-// view container (Create), then asks it for its contents (CreateViewContents).
+// view container (Create), then asks it for its contents (CreateViewContents): the plug-in's
+// editor, embedded into the container's X11 window and framed at the editor's size. The host's
+// periodic TimerWakeup runs the editor's timers and window; DeleteViewContents gives the window
+// back. Edits reach the host as the adapter's touch, set and release requests, and the editor's
+// new sizes go to the container.
 //
-// The view is empty for now: the editors that fill it are still being built. It has no size
-// (0 x 0) and draws nothing, so a host shows the effect with its own generic controls; the
-// frame and the editor's resize path through the view container are in place for the editor
-// to come. Every method is guarded as the adapter's are ("KAAXGUI::<Method>").
+// Every method is guarded as the adapter's are ("KAAXGUI::<Method>").
 class TORVANE_API KAAXGUI {
 public:
   explicit KAAXGUI(KAudioPluginAAXAdapter& effect) noexcept;
@@ -24,7 +27,9 @@ public:
 
   virtual KAAX::Result Create(KAAX::IViewContainer* container);
   virtual KAAX::Result CreateViewContents();
-  // The view's size as the host should frame it.
+  virtual KAAX::Result DeleteViewContents();
+  virtual KAAX::Result TimerWakeup();
+  // The view's size as the host should frame it (0 x 0 before its contents exist).
   virtual KAAX::Result GetViewSize(int32_t* width, int32_t* height) const;
   // The host's last reference: the GUI deletes itself (in the library that made it).
   virtual void Release() noexcept { delete this; }
@@ -32,13 +37,16 @@ public:
   // The editor's new size to the host's frame; false without a container or when refused.
   bool Resize(int32_t width, int32_t height) noexcept;
   // The effect went away first (its host closed it): the GUI no longer reaches it.
-  void DetachEffect() noexcept { effect_ = nullptr; }
-  bool HasContents() const noexcept { return hasContents_; }
+  void DetachEffect() noexcept;
+  bool HasContents() const noexcept { return view_ != nullptr; }
+  // The editor, while the contents exist.
+  KHostEditor* View() noexcept { return view_.get(); }
 
 private:
   KAudioPluginAAXAdapter* effect_;
   KAAX::IViewContainer* container_ = nullptr;
-  bool hasContents_ = false;
+  std::unique_ptr<KInterfaceEditorHost> host_;
+  std::unique_ptr<KHostEditor> view_;
   int32_t width_ = 0;
   int32_t height_ = 0;
   KAAXLiveObject live_;

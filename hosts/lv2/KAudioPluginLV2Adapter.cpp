@@ -23,7 +23,8 @@ KAudioPluginLV2Adapter::KAudioPluginLV2Adapter(std::unique_ptr<KAudioPlugin> plu
       layout_(*plugin_),
       mapped_(map != nullptr),
       ports_(new void*[static_cast<size_t>(layout_.Count())]()),
-      seen_(new float[static_cast<size_t>(plugin_->ParameterCount())]) {
+      seen_(new float[static_cast<size_t>(plugin_->ParameterCount())]),
+      time_(map) {
   if (map) {
     urids_.midiEvent = map->map(map->handle, LV2_MIDI__MidiEvent);
     urids_.sequence = map->map(map->handle, LV2_ATOM__Sequence);
@@ -51,10 +52,10 @@ void KAudioPluginLV2Adapter::Run(uint32_t samples) noexcept {
   KHostGuarded("KAudioPluginLV2Adapter::run", 0, [&] {
     KAudioPlugin& plugin = *plugin_;
     const auto n = static_cast<int32_t>(samples);
-    // LV2 reports the transport only through time atoms, which no port here takes.
-    KAcceptTransport(nullptr, IsOffline(), plugin.Transport());
+    // The atom input carries the time positions too: read before the transport is taken.
     ApplyControls();
     ReadMIDI();
+    KAcceptTransport(time_.Current(), IsOffline(), plugin.Transport());
     const float* inputs[KAudioPlugin::kMaxChannels] = {};
     float* outputs[KAudioPlugin::kMaxChannels] = {};
     const std::vector<KPort>& ports = layout_.Ports();
@@ -71,6 +72,7 @@ void KAudioPluginLV2Adapter::Run(uint32_t samples) noexcept {
     midiOut_.EndBlock();
     WriteOutputs();
     WriteMIDI();
+    time_.Advance(n, plugin.SampleRate());
     return 0;
   });
 }
@@ -97,6 +99,8 @@ void KAudioPluginLV2Adapter::ReadMIDI() noexcept {
   if (!sequence || !mapped_) return;
   for (const LV2_Atom_Event* event = lv2_atom_sequence_begin(&sequence->body); !lv2_atom_sequence_is_end(&sequence->body, sequence->atom.size, event);
        event = lv2_atom_sequence_next(event)) {
+    // A position applies from the block's start, wherever the host put it.
+    if (time_.Read(event->body)) continue;
     if (event->body.type != urids_.midiEvent || event->body.size == 0 || event->body.size > 3) continue;
     KMIDIBytes bytes = {0, 0, 0, 0};
     std::memcpy(bytes.data(), &event->body + 1, event->body.size);

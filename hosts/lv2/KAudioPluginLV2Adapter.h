@@ -13,11 +13,13 @@
 #include "hosts/common/KHostMIDIList.h"
 #include "hosts/common/KHostState.h"
 #include "hosts/lv2/KLV2Ports.h"
+#include "hosts/lv2/KLV2Time.h"
 
 // A plug-in of the kernel as one LV2 instance. Ports follow KPortLayout. Control inputs carry
 // working units; a control whose value differs from the one seen at the previous run reaches the
 // plug-in as one point at the block start, as a VST 3 host's single point does. The state is
-// the plug-in's UTF-8 state text under one property. Any block length runs: the processing
+// the plug-in's UTF-8 state text under one property. The transport comes from time:Position
+// objects in the atom input, where the plug-in has one (KLV2::KTimeReader). Any block length runs: the processing
 // cycle takes long blocks in pieces, so neither the options nor the buffer-size feature is asked
 // for, and an unconnected side-chain reads as silence.
 //
@@ -76,4 +78,5 @@ private:
   std::unique_ptr<float[]> seen_;
   KHostMIDIList midiOut_;
   KHostState state_;
+  KLV2::KTimeReader time_;  // the host's positions from the atom input
 };

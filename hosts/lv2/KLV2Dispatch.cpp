@@ -84,19 +84,23 @@ constexpr LV2_State_Interface kState = {Save, Restore};
 const void* ExtensionData(const char* uri) { return std::strcmp(uri, LV2_STATE__interface) == 0 ? &kState : nullptr; }
 
 const LV2_Descriptor* Find(const char* bundleName) {
-  for (const KPluginDescription& plugin : KProductCatalogue().plugins) {
-    if (KPluginIds::BundleName(plugin.key) != bundleName) continue;
-    const std::string uri = KPluginIds::LV2URI(plugin.identity);
-    std::lock_guard<std::mutex> lock(gEntriesLock);
-    for (const KEntry& entry : gEntries)
-      if (entry.uri == uri) return &entry.descriptor;
-    KEntry& entry = gEntries.emplace_back(KEntry{{}, uri, plugin.key});
-    entry.descriptor = {entry.uri.c_str(), Instantiate, ConnectPort, Activate, Run, Deactivate, Cleanup, ExtensionData};
-    return &entry.descriptor;
-  }
-  return nullptr;
+  const KPluginDescription* plugin = BundlePlugin(bundleName);
+  if (!plugin) return nullptr;
+  const std::string uri = KPluginIds::LV2URI(plugin->identity);
+  std::lock_guard<std::mutex> lock(gEntriesLock);
+  for (const KEntry& entry : gEntries)
+    if (entry.uri == uri) return &entry.descriptor;
+  KEntry& entry = gEntries.emplace_back(KEntry{{}, uri, plugin->key});
+  entry.descriptor = {entry.uri.c_str(), Instantiate, ConnectPort, Activate, Run, Deactivate, Cleanup, ExtensionData};
+  return &entry.descriptor;
 }
 }  // namespace
+
+const KPluginDescription* BundlePlugin(const char* bundleName) {
+  for (const KPluginDescription& plugin : KProductCatalogue().plugins)
+    if (KPluginIds::BundleName(plugin.key) == bundleName) return &plugin;
+  return nullptr;
+}
 
 }  // namespace KLV2
 

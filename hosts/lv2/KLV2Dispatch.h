@@ -10,7 +10,11 @@
 // kernel/KPluginIdentifiers.h. Descriptors live as long as the kernel.
 extern "C" TORVANE_API const LV2_Descriptor* KLV2DispatchDescriptor(const char* bundleName);
 
+struct KPluginDescription;
+
 namespace KLV2 {
 inline constexpr const char* kDispatchName = "KLV2DispatchDescriptor";
+// The catalogue's plug-in of the bundle named `bundleName`, or null (in the kernel only).
+const KPluginDescription* BundlePlugin(const char* bundleName);
 using DispatchFunction = const LV2_Descriptor* (*)(const char* bundleName);
 }  // namespace KLV2

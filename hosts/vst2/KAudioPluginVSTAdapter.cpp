@@ -8,6 +8,7 @@
 #include "core/KParameter.h"
 #include "hosts/common/KHostEcho.h"
 #include "hosts/common/KHostGuard.h"
+#include "hosts/vst2/KVST2Editor.h"
 #include "hosts/vst2/KVST2Text.h"
 #include "hosts/vst2/KVST2Transport.h"
 #include "kernel/KCatalogue.h"
@@ -46,10 +47,17 @@ KAudioPluginVSTAdapter::KAudioPluginVSTAdapter(HostCallback host, std::unique_pt
   canProcessReplacing(true);
   programsAreChunks(true);
   isSynth(plugin_->GetShape().acceptsMIDI && pluginInputs_ == 0);
+  editor_ = std::make_unique<KEditor>(*this);
+  setEditor(editor_.get());
   suspend();
 }
 
-KAudioPluginVSTAdapter::~KAudioPluginVSTAdapter() { plugin_->SetInterface(nullptr); }
+// The editor goes first: its window and controls reach the plug-in.
+KAudioPluginVSTAdapter::~KAudioPluginVSTAdapter() {
+  setEditor(nullptr);
+  editor_.reset();
+  plugin_->SetInterface(nullptr);
+}
 
 // ---- what the host calls
 
@@ -294,5 +302,6 @@ void KAudioPluginVSTAdapter::NotifyPresetChanged() {
   KHostGuarded("KAudioPluginVSTAdapter::NotifyPresetChanged", false, [&] { return updateDisplay(); });
 }
 
-// No editor yet, so no window to resize.
-bool KAudioPluginVSTAdapter::ResizeEditor(int32_t, int32_t) { return false; }
+bool KAudioPluginVSTAdapter::ResizeEditor(int32_t width, int32_t height) {
+  return KHostGuarded("KAudioPluginVSTAdapter::ResizeEditor", false, [&] { return editor_->Resize(width, height); });
+}

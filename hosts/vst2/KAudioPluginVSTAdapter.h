@@ -19,7 +19,7 @@ struct KPluginDescription;
 // (KVST2Interface, KVST2Effect), time information and events have their own files, and what
 // every host format shares (the method guard, transport rules, echo recognition, channel
 // mapping, MIDI lists, the state text) lives in hosts/common.
-// No editor yet: effFlagsHasEditor stays clear and the editor's opcodes answer 0.
+// The editor is KEditor (KVST2Editor), in the host's X11 window.
 //
 // Every method the host calls is guarded: a KException gives the neutral answer, anything else
 // is traced as "SYSTEM EXCEPTION! KAudioPluginVSTAdapter::<method>" and gives it too.
@@ -28,6 +28,8 @@ class KAudioPluginVSTAdapter final : public KVST2::KEffect, public KAudioPluginI
 public:
   // Hosts of a VST version up to this one are VST 1 hosts.
   static constexpr int32_t kLastVST1Version = 99;
+
+  class KEditor;
 
   KAudioPluginVSTAdapter(KVST2::HostCallback host, std::unique_ptr<KAudioPlugin> plugin, int32_t uniqueId);
   ~KAudioPluginVSTAdapter() override;
@@ -70,12 +72,14 @@ public:
 
   int32_t HostVersion() const noexcept { return hostVersion_; }
   const KString& HostProduct() const noexcept { return hostProduct_; }
+  KEditor& Editor() noexcept { return *editor_; }
 
 private:
   bool PinProperties(int32_t index, bool input, KVST2::VstPinProperties* properties);
   const KPluginDescription& Description() const;
 
   std::unique_ptr<KAudioPlugin> plugin_;
+  std::unique_ptr<KEditor> editor_;
   int32_t hostVersion_ = 1;
   KString hostProduct_;
   // The plug-in's channels as built, and the host's, which an arrangement may make fewer.

@@ -80,7 +80,13 @@ intptr_t KEffect::Dispatch(int32_t opcode, int32_t index, intptr_t value, void* 
     case effGetVstVersion: return kVstVersion;
     case effStartProcess: return startProcess();
     case effStopProcess: return stopProcess();
-    default: return 0;  // the editor's opcodes among them: no editor is offered
+    case effEditGetRect: return editor_ && editor_->getRect(static_cast<ERect**>(ptr)) ? 1 : 0;
+    case effEditOpen: return editor_ && editor_->open(ptr) ? 1 : 0;
+    case effEditClose: if (editor_) editor_->close(); return 0;
+    case effEditIdle: if (editor_) editor_->idle(); return 0;
+    case effEditKeyDown: return editor_ ? editor_->onKeyDown(index, static_cast<int32_t>(value), static_cast<int32_t>(opt)) : 0;
+    case effEditKeyUp: return editor_ ? editor_->onKeyUp(index, static_cast<int32_t>(value), static_cast<int32_t>(opt)) : 0;
+    default: return 0;
   }
 }
 

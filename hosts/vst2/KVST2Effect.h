@@ -6,6 +6,21 @@
 
 namespace KVST2 {
 
+// The editor of an instance, as the dispatcher reaches it with the editor's opcodes.
+class KEffectEditor {
+public:
+  virtual ~KEffectEditor() = default;
+  // The editor's rectangle, kept by the editor until the next call.
+  virtual bool getRect(ERect** rect) = 0;
+  // `window` is the host's window to embed into (an X11 window id on Linux).
+  virtual bool open(void* window) = 0;
+  virtual void close() = 0;
+  virtual void idle() = 0;
+  // Answer 1 when the editor took the key, so that the host does not act on it too.
+  virtual int32_t onKeyDown(int32_t character, int32_t virtualKey, int32_t modifiers) = 0;
+  virtual int32_t onKeyUp(int32_t character, int32_t virtualKey, int32_t modifiers) = 0;
+};
+
 // The plug-in side of one VST 2 instance: owns the AEffect record the host holds, turns the
 // host's opcodes into virtual methods with the format's usual answers as defaults, and wraps
 // the calls back to the host. A null host callback answers every call with its default
@@ -84,6 +99,11 @@ public:
   void canProcessReplacing(bool state) noexcept { SetFlag(effFlagsCanReplacing, state); }
   void programsAreChunks(bool state) noexcept { SetFlag(effFlagsProgramChunks, state); }
   void isSynth(bool state) noexcept { SetFlag(effFlagsIsSynth, state); }
+  // The editor the editor's opcodes reach (not owned; null: none, and the host is told so).
+  void setEditor(KEffectEditor* editor) noexcept {
+    editor_ = editor;
+    SetFlag(effFlagsHasEditor, editor != nullptr);
+  }
 
   float SampleRate() const noexcept { return sampleRate_; }
   int32_t BlockSize() const noexcept { return blockSize_; }
@@ -98,6 +118,7 @@ private:
 
   AEffect effect_;
   HostCallback host_;
+  KEffectEditor* editor_ = nullptr;
   float sampleRate_ = 44100.0f;
   int32_t blockSize_ = 1024;
 };

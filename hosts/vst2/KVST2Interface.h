@@ -133,6 +133,32 @@ enum HostOpcode : int32_t {
   audioMasterEndEdit = 44,
 };
 
+// Keys the host passes on to the editor (effEditKeyDown / effEditKeyUp: `index` the character,
+// `value` the virtual key, `opt` the modifiers).
+enum VstVirtualKey : int32_t {
+  VKEY_BACK = 1,
+  VKEY_TAB = 2,
+  VKEY_RETURN = 4,
+  VKEY_ESCAPE = 6,
+  VKEY_SPACE = 7,
+  VKEY_END = 9,
+  VKEY_HOME = 10,
+  VKEY_LEFT = 11,
+  VKEY_UP = 12,
+  VKEY_RIGHT = 13,
+  VKEY_DOWN = 14,
+  VKEY_ENTER = 19,
+  VKEY_DELETE = 22,
+  VKEY_F1 = 40,
+};
+// MODIFIER_COMMAND is the control key outside macOS, MODIFIER_CONTROL the control key on macOS.
+enum VstModifierKey : int32_t {
+  MODIFIER_SHIFT = 1 << 0,
+  MODIFIER_ALTERNATE = 1 << 1,
+  MODIFIER_COMMAND = 1 << 2,
+  MODIFIER_CONTROL = 1 << 3,
+};
+
 // Texts the host's buffers hold, terminator included.
 inline constexpr int32_t kVstMaxProgNameLen = 24;
 inline constexpr int32_t kVstMaxParamStrLen = 8;

@@ -13,7 +13,7 @@ namespace {
 // The host's window type the editor's window lives in, and the parent as its window class wants it.
 #if defined(_WIN32)
 constexpr const char* kNativeWindowType = kPlatformTypeHWND;
-void* NativeParent(void* parent) noexcept { return parent; }
+uintptr_t NativeParent(void* parent) noexcept { return reinterpret_cast<uintptr_t>(parent); }
 #else
 constexpr const char* kNativeWindowType = kPlatformTypeX11EmbedWindowID;
 unsigned long NativeParent(void* parent) noexcept { return reinterpret_cast<unsigned long>(parent); }

@@ -72,6 +72,13 @@ KCompressorPlugin::KCompressorPlugin()
 
 KAudioPlugin* KCompressorPlugin::Create(KModule*, const KPluginRecord*) { return new KCompressorPlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kGentleBus[] = {{"threshold", 0.5}, {"ratio", 1.5}, {"attack", 0.03}, {"release", 0.3}, {"kneemode", 2.0}, {"kneesize", 0.5}};
+constexpr KFactoryPreset::Value kVocalLeveler[] = {{"threshold", 0.25}, {"ratio", 4.0}, {"attack", 0.005}, {"release", 0.12}, {"rmslength", 0.01}, {"outputgain", 4.0}};
+constexpr KFactoryPreset::Value kDrumPunch[] = {{"threshold", 0.3}, {"ratio", 6.0}, {"attack", 0.02}, {"release", 0.06}, {"kneemode", 1.0}};
+constexpr KFactoryPreset kPresets[] = {{"Gentle bus", kGentleBus}, {"Vocal leveler", kVocalLeveler}, {"Drum punch", kDrumPunch}};
+}  // namespace
+
 constinit const KPluginDescription kCompressorDescription{
     .key = "KCompressorPlugin",
     .factory = &KCompressorPlugin::Create,
@@ -82,6 +89,7 @@ constinit const KPluginDescription kCompressorDescription{
     .vst2Id = "TvCo",
     .identity = "KCompressorPlugin",
     .help = &KCompressorHelp,
+    .presets = kPresets,
 };
 
 std::span<const KCompressorPlugin::Point> KCompressorPlugin::DefaultCustomShape() noexcept { return kDefaultShape; }

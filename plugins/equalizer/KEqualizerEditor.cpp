@@ -1,8 +1,6 @@
 #include <algorithm>
 #include <cmath>
-#include <complex>
 #include <memory>
-#include <numbers>
 #include <vector>
 
 #include "core/KParameter.h"
@@ -35,13 +33,8 @@ public:
 
   double Decibels(double hz) {
     Refresh();
-    const std::complex<double> z = std::polar(1.0, -2 * std::numbers::pi * hz / kGraphRate);  // z^-1
     double db = 0;
-    for (const KFilterSection& s : sections_) {
-      const std::complex<double> num = s.b0 + s.b1 * z + s.b2 * z * z;
-      const std::complex<double> den = 1.0 - s.minusA1 * z - s.minusA2 * z * z;
-      db += 20 * std::log10(std::max(std::abs(num / den), 1e-9));
-    }
+    for (const KFilterSection& s : sections_) db += s.Decibels(hz);
     return db + plugin_.GetParameter(KEqualizerPlugin::kOutputGain).Working();
   }
 

@@ -100,6 +100,15 @@ KEqualizerPlugin::KEqualizerPlugin() : KAudioPlugin(kParameters, kShape) {}
 
 KAudioPlugin* KEqualizerPlugin::Create(KModule*, const KPluginRecord*) { return new KEqualizerPlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kLowCut[] = {{"band1type", KFilterSection::kHighPass}, {"band1freq", 80.0}};
+constexpr KFactoryPreset::Value kVocalPresence[] = {{"band1type", KFilterSection::kHighPass}, {"band1freq", 100.0}, {"band3gain", -2.0}, {"band3freq", 300.0},
+                                                    {"band6gain", 3.0}, {"band6freq", 4000.0}, {"band6q", 1.2}};
+constexpr KFactoryPreset::Value kSmile[] = {{"band1type", KFilterSection::kLowShelf}, {"band1freq", 100.0}, {"band1gain", 4.0},
+                                            {"band8type", KFilterSection::kHighShelf}, {"band8freq", 8000.0}, {"band8gain", 4.0}};
+constexpr KFactoryPreset kPresets[] = {{"Low cut", kLowCut}, {"Vocal presence", kVocalPresence}, {"Smile", kSmile}};
+}  // namespace
+
 constinit const KPluginDescription kEqualizerDescription{
     .key = "KEqualizerPlugin",
     .factory = &KEqualizerPlugin::Create,
@@ -110,6 +119,7 @@ constinit const KPluginDescription kEqualizerDescription{
     .vst2Id = "TvEq",
     .identity = "KEqualizerPlugin",
     .help = &KEqualizerHelp,
+    .presets = kPresets,
 };
 
 void KEqualizerPlugin::Design(KSectionRunner::Row (&targets)[kBandCount], KFilterSection (&designs)[kBandCount]) const noexcept {

@@ -22,6 +22,13 @@ KUtilityPlugin::KUtilityPlugin() : KAudioPlugin(kParameters, kShape) {}
 
 KAudioPlugin* KUtilityPlugin::Create(KModule*, const KPluginRecord*) { return new KUtilityPlugin; }
 
+namespace {
+constexpr KFactoryPreset::Value kMonoCheck[] = {{"mono", 1.0}};
+constexpr KFactoryPreset::Value kWide[] = {{"width", 150.0}, {"gain", -1.5}};
+constexpr KFactoryPreset::Value kPolarityFlip[] = {{"invertleft", 1.0}, {"invertright", 1.0}};
+constexpr KFactoryPreset kPresets[] = {{"Mono check", kMonoCheck}, {"Wide", kWide}, {"Polarity flip", kPolarityFlip}};
+}  // namespace
+
 constinit const KPluginDescription kUtilityDescription{
     .key = "KUtilityPlugin",
     .factory = &KUtilityPlugin::Create,
@@ -32,6 +39,7 @@ constinit const KPluginDescription kUtilityDescription{
     .vst2Id = "TvUt",
     .identity = "KUtilityPlugin",
     .help = &KUtilityHelp,
+    .presets = kPresets,
 };
 
 void KUtilityPlugin::TargetMatrix(double (&m)[4]) const {

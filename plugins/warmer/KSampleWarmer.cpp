@@ -48,6 +48,13 @@ KSampleWarmer::KSampleWarmer() : KAudioPlugin(kParameters, kPluginShape) { Confi
 
 KAudioPlugin* KSampleWarmer::Create(KModule*, const KPluginRecord*) { return new KSampleWarmer; }
 
+namespace {
+constexpr KFactoryPreset::Value kSubtleWarmth[] = {{"drive", 3.0}, {"mix", 50.0}};
+constexpr KFactoryPreset::Value kCrunch[] = {{"drive", 18.0}, {"shape", KSampleWarmer::kSoftClip}, {"outputgain", -6.0}};
+constexpr KFactoryPreset::Value kDarkSaturation[] = {{"drive", 12.0}, {"shape", KSampleWarmer::kTanh}, {"tone", -40.0}, {"outputgain", -3.0}};
+constexpr KFactoryPreset kPresets[] = {{"Subtle warmth", kSubtleWarmth}, {"Crunch", kCrunch}, {"Dark saturation", kDarkSaturation}};
+}  // namespace
+
 constinit const KPluginDescription kSampleWarmerDescription{
     .key = "KSampleWarmer",
     .factory = &KSampleWarmer::Create,
@@ -58,6 +65,7 @@ constinit const KPluginDescription kSampleWarmerDescription{
     .vst2Id = "TvSW",
     .identity = "KSampleWarmer",
     .help = &KSampleWarmerHelp,
+    .presets = kPresets,
 };
 
 bool KSampleWarmer::SetSampleRate(double sampleRate) {

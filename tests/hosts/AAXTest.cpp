@@ -134,16 +134,22 @@ TEST(AAXBundles, CompressorNamesTextsValuesChunksGUIBypassAndUnload) {
   EXPECT_DOUBLE_EQ(read, 0.25);
   EXPECT_NE(GetChunk(*target, KFourCC("Torv")).Data(), state);
 
-  // The GUI: made, framed, its (empty) contents, destroyed; the effect may go first.
+  // The GUI: made, framed at the editor's size (a container without a window gets no window of
+  // its own), destroyed. The window itself is the editor tests' (under a display).
   KView view;
   KAAXGUI* gui = bundle.Information().createGUI(source);
   ASSERT_NE(gui, nullptr);
   int32_t width = -1, height = -1;
   EXPECT_EQ(gui->CreateViewContents(), kErrorNotInitialized);  // not framed yet
+  EXPECT_EQ(gui->GetViewSize(&width, &height), kSuccess);
+  EXPECT_EQ(std::pair(width, height), std::pair(0, 0));
   EXPECT_EQ(gui->Create(&view), kSuccess);
   EXPECT_EQ(gui->CreateViewContents(), kSuccess);
   EXPECT_EQ(gui->GetViewSize(&width, &height), kSuccess);
-  EXPECT_EQ(std::pair(width, height), std::pair(0, 0));
+  EXPECT_GT(width, 100);
+  EXPECT_GT(height, 100);
+  EXPECT_EQ(view.sizes, (std::vector<std::pair<int32_t, int32_t>>{{width, height}}));
+  EXPECT_EQ(gui->TimerWakeup(), kSuccess);
   gui->Release();
   EXPECT_EQ(bundle.Information().createGUI(nullptr), nullptr);
 

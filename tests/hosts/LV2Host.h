@@ -68,7 +68,10 @@ struct KInstance {
   LV2_Handle handle = nullptr;
 
   KInstance(const std::string& key, const LV2_Feature* const* features)
-      : descriptor(KLV2DispatchDescriptor(KPluginIds::BundleName(key.c_str()).c_str())), described(KHostCreatePlugin(key.c_str(), "")) {
+      : KInstance(KLV2DispatchDescriptor(KPluginIds::BundleName(key.c_str()).c_str()), key, features) {}
+  // Through a descriptor a bundle's loader gave.
+  KInstance(const LV2_Descriptor* made, const std::string& key, const LV2_Feature* const* features)
+      : descriptor(made), described(KHostCreatePlugin(key.c_str(), "")) {
     described->SetChannelsPerBus(2);
     EXPECT_TRUE(descriptor) << key;
     handle = descriptor ? descriptor->instantiate(descriptor, 48000.0, "", features) : nullptr;

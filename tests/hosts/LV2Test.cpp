@@ -1,7 +1,9 @@
 // The LV2 adapter through the kernel's descriptors in this process (allocations counted), and
 // the built bundles' loaders as a host loads them.
+#include <lv2/atom/forge.h>
 #include <lv2/atom/util.h>
 #include <lv2/midi/midi.h>
+#include <lv2/time/time.h>
 
 #include <filesystem>
 
@@ -192,23 +194,41 @@ TEST(LV2Bundles, EachLoaderAnswersThePluginItsBundleIsNamedAfter) {
 
 // A plug-in that takes and sends MIDI: notes from the input sequence land at their frames; what
 // the plug-in sends comes out as an atom sequence of MIDI events.
-TEST(LV2Adapter, MIDIThroughAtomSequencesBothWays) {
+namespace {
+// An adapter around a recording plug-in that takes and sends MIDI, every port connected: audio
+// and controls to buffers of their own, the atom ports to `in` and `out`.
+struct KMIDIRig {
   KURIDMap map;
-  auto* plugin = new KRecordingPlugin(2, KAudioPlugin::Shape{1, 1, true, true, true});
-  plugin->SetChannelsPerBus(2);
-  plugin->SetSampleRate(48000.0);
-  KAudioPluginLV2Adapter adapter{std::unique_ptr<KAudioPlugin>(plugin), &map.map};
-  const KLV2::KPortLayout& layout = adapter.Layout();
-  ASSERT_EQ(std::pair(layout.CountOf(KPort::Kind::kMIDIIn), layout.CountOf(KPort::Kind::kMIDIOut)), std::pair(1, 1));
-  std::vector<std::vector<float>> audio(6, std::vector<float>(256, 0.25f));
-  std::vector<float> controls(static_cast<size_t>(layout.Count()), 0.0f);
-  alignas(8) uint8_t in[256] = {}, out[256] = {};
-  for (int32_t p = 0, a = 0; p < layout.Count(); ++p) {
-    const KPort::Kind kind = layout.Ports()[p].kind;
-    const bool isAudio = kind == KPort::Kind::kAudioIn || kind == KPort::Kind::kAudioOut;
-    void* data = isAudio ? static_cast<void*>(audio[static_cast<size_t>(a++)].data()) : &controls[static_cast<size_t>(p)];
-    adapter.ConnectPort(static_cast<uint32_t>(p), kind == KPort::Kind::kMIDIIn ? in : kind == KPort::Kind::kMIDIOut ? out : data);
+  KRecordingPlugin* plugin = new KRecordingPlugin(2, KAudioPlugin::Shape{1, 1, true, true, true});
+  std::unique_ptr<KAudioPluginLV2Adapter> adapter;
+  std::vector<std::vector<float>> audio = std::vector<std::vector<float>>(6, std::vector<float>(256, 0.25f));
+  std::vector<float> controls;
+  alignas(8) uint8_t in[512] = {}, out[256] = {};
+  KMIDIRig() {
+    plugin->SetChannelsPerBus(2);
+    plugin->SetSampleRate(48000.0);
+    adapter = std::make_unique<KAudioPluginLV2Adapter>(std::unique_ptr<KAudioPlugin>(plugin), &map.map);
+    const KLV2::KPortLayout& layout = adapter->Layout();
+    controls.assign(static_cast<size_t>(layout.Count()), 0.0f);
+    for (int32_t p = 0, a = 0; p < layout.Count(); ++p) {
+      const KPort::Kind kind = layout.Ports()[p].kind;
+      const bool isAudio = kind == KPort::Kind::kAudioIn || kind == KPort::Kind::kAudioOut;
+      void* data = isAudio ? static_cast<void*>(audio[static_cast<size_t>(a++)].data()) : &controls[static_cast<size_t>(p)];
+      adapter->ConnectPort(static_cast<uint32_t>(p), kind == KPort::Kind::kMIDIIn ? in : kind == KPort::Kind::kMIDIOut ? out : data);
+    }
   }
+  LV2_URID Id(const char* uri) { return map.map.map(map.map.handle, uri); }
+};
+}  // namespace
+
+TEST(LV2Adapter, MIDIThroughAtomSequencesBothWays) {
+  KMIDIRig rig;
+  KURIDMap& map = rig.map;
+  KRecordingPlugin* plugin = rig.plugin;
+  KAudioPluginLV2Adapter& adapter = *rig.adapter;
+  uint8_t* in = rig.in;
+  uint8_t* out = rig.out;
+  ASSERT_EQ(std::pair(adapter.Layout().CountOf(KPort::Kind::kMIDIIn), adapter.Layout().CountOf(KPort::Kind::kMIDIOut)), std::pair(1, 1));
   auto* sequence = reinterpret_cast<LV2_Atom_Sequence*>(in);
   sequence->atom = {sizeof(LV2_Atom_Sequence_Body), map.map.map(map.map.handle, LV2_ATOM__Sequence)};
   for (const auto& [frame, note] : {std::pair(10, 60), std::pair(30, 64)}) {
@@ -216,9 +236,9 @@ TEST(LV2Adapter, MIDIThroughAtomSequencesBothWays) {
       LV2_Atom_Event header;
       uint8_t bytes[3];
     } event{{{frame}, {3, map.map.map(map.map.handle, LV2_MIDI__MidiEvent)}}, {0x90, static_cast<uint8_t>(note), 100}};
-    ASSERT_TRUE(lv2_atom_sequence_append_event(sequence, sizeof in, &event.header));
+    ASSERT_TRUE(lv2_atom_sequence_append_event(sequence, sizeof rig.in, &event.header));
   }
-  reinterpret_cast<LV2_Atom_Sequence*>(out)->atom.size = sizeof out - sizeof(LV2_Atom);  // the host's capacity
+  reinterpret_cast<LV2_Atom_Sequence*>(out)->atom.size = sizeof rig.out - sizeof(LV2_Atom);  // the host's capacity
   const uint8_t sent[4] = {0xB0, 7, 99, 0};
   adapter.SendMIDIEvent(5, sent);
   adapter.Run(64);
@@ -231,4 +251,74 @@ TEST(LV2Adapter, MIDIThroughAtomSequencesBothWays) {
   ASSERT_FALSE(lv2_atom_sequence_is_end(&produced->body, produced->atom.size, first));
   EXPECT_EQ(std::tuple(first->time.frames, first->body.size, *reinterpret_cast<const uint8_t*>(first + 1)), std::tuple(int64_t{5}, 3u, uint8_t{0xB0}));
   EXPECT_TRUE(lv2_atom_sequence_is_end(&produced->body, produced->atom.size, lv2_atom_sequence_next(first)));
+}
+
+// The host's time:Position objects in the atom input reach the plug-in's transport through the
+// shared rules, are carried forward between positions at the reported speed, and leave the MIDI
+// beside them alone.
+TEST(LV2Adapter, TimePositionsFromTheAtomInputBecomeTheTransport) {
+  KMIDIRig rig;
+  const KTransport& transport = rig.plugin->Transport();
+  LV2_Atom_Forge forge;
+  lv2_atom_forge_init(&forge, &rig.map.map);
+  // One block's input: a position (fields as given, -1 left out) and a note at frame 10.
+  const auto block = [&](double speed, double barBeat, bool withNote) {
+    lv2_atom_forge_set_buffer(&forge, rig.in, sizeof rig.in);
+    LV2_Atom_Forge_Frame sequence, object;
+    lv2_atom_forge_sequence_head(&forge, &sequence, 0);
+    if (speed >= 0) {
+      lv2_atom_forge_frame_time(&forge, 0);
+      lv2_atom_forge_object(&forge, &object, 0, rig.Id(LV2_TIME__Position));
+      lv2_atom_forge_key(&forge, rig.Id(LV2_TIME__frame)), lv2_atom_forge_long(&forge, 96000);
+      lv2_atom_forge_key(&forge, rig.Id(LV2_TIME__speed)), lv2_atom_forge_float(&forge, static_cast<float>(speed));
+      lv2_atom_forge_key(&forge, rig.Id(LV2_TIME__beatsPerMinute)), lv2_atom_forge_float(&forge, 120.0f);
+      lv2_atom_forge_key(&forge, rig.Id(LV2_TIME__bar)), lv2_atom_forge_long(&forge, 3);
+      lv2_atom_forge_key(&forge, rig.Id(LV2_TIME__barBeat)), lv2_atom_forge_double(&forge, barBeat);
+      lv2_atom_forge_key(&forge, rig.Id(LV2_TIME__beatsPerBar)), lv2_atom_forge_float(&forge, 6.0f);
+      lv2_atom_forge_key(&forge, rig.Id(LV2_TIME__beatUnit)), lv2_atom_forge_int(&forge, 8);
+      lv2_atom_forge_pop(&forge, &object);
+    }
+    if (withNote) {
+      const uint8_t note[3] = {0x90, 60, 100};
+      lv2_atom_forge_frame_time(&forge, 10);
+      lv2_atom_forge_atom(&forge, 3, rig.Id(LV2_MIDI__MidiEvent));
+      lv2_atom_forge_write(&forge, note, 3);
+    }
+    lv2_atom_forge_pop(&forge, &sequence);
+    reinterpret_cast<LV2_Atom_Sequence*>(rig.out)->atom.size = sizeof rig.out - sizeof(LV2_Atom);
+    rig.adapter->Run(64);
+  };
+  constexpr double kQuartersPerBlock = 64 * 120.0 / 60.0 / 48000.0 * 0.5;  // beats of an eighth
+
+  block(-1, 0, false);  // before any position: nothing known
+  EXPECT_EQ(std::tuple(transport.tempo, transport.samplePosition, transport.IsPlaying()), std::tuple(-1.0, KTransport::kUnknownSamplePosition, false));
+
+  // Bar 3 of 6/8, one and a half eighths in: the bar starts at 9 quarter notes.
+  block(1.0, 1.5, true);
+  EXPECT_EQ(std::tuple(transport.tempo, transport.samplePosition, transport.numerator, transport.denominator, transport.IsPlaying()),
+            std::tuple(120.0, int64_t{96000}, 6, 8, true));
+  EXPECT_DOUBLE_EQ(transport.barStart, 9.0);
+  EXPECT_DOUBLE_EQ(transport.songPosition, 9.75);
+  int32_t notes = 0;
+  for (const KRecordingPlugin::Entry& e : rig.plugin->Log()) notes += e.kind == KRecordingPlugin::Entry::kNote && e.note == 60 && e.length == 10;
+  EXPECT_EQ(notes, 1);
+
+  // No position in the next block: carried on by the block before it.
+  block(-1, 0, false);
+  EXPECT_EQ(transport.samplePosition, 96064);
+  EXPECT_NEAR(transport.songPosition, 9.75 + kQuartersPerBlock, 1e-12);
+  EXPECT_DOUBLE_EQ(transport.barStart, 9.0);
+
+  // A block that ends past the bar line: the next one starts in bar 4 (12 quarter notes).
+  block(1.0, 5.999, false);
+  block(-1, 0, false);
+  EXPECT_DOUBLE_EQ(transport.barStart, 12.0);
+  EXPECT_NEAR(transport.songPosition, 9.0 + 5.999 * 0.5 + kQuartersPerBlock, 1e-9);
+
+  // Stopped: not playing, and the position stays where the host put it.
+  block(0.0, 2.0, false);
+  block(-1, 0, false);
+  EXPECT_FALSE(transport.IsPlaying());
+  EXPECT_EQ(transport.samplePosition, 96000);
+  EXPECT_DOUBLE_EQ(transport.songPosition, 10.0);
 }

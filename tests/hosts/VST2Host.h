@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <functional>
 #include <string>
 #include <tuple>
 #include <vector>
@@ -24,6 +25,9 @@ struct KHost {
   std::vector<std::tuple<char, int32_t, float>> edits;  // 'b'egin, 'a'utomate with its value, 'e'nd
   std::vector<VstMidiEvent> midi;                       // what the plug-in sent
   int32_t ioChanges = 0, displayUpdates = 0;
+  std::vector<std::pair<int32_t, int32_t>> windowSizes;  // what sizeWindow asked for
+  bool acceptWindowSize = false;
+  std::function<void()> whileSizing;                      // run inside sizeWindow
 
   static inline KHost* current = nullptr;
   KHost() { current = this; }
@@ -41,6 +45,10 @@ struct KHost {
       case audioMasterEndEdit: return host.edits.emplace_back('e', index, 0.0f), 1;
       case audioMasterIOChanged: return ++host.ioChanges, 1;
       case audioMasterUpdateDisplay: return ++host.displayUpdates, 1;
+      case audioMasterSizeWindow:
+        host.windowSizes.emplace_back(index, static_cast<int32_t>(value));
+        if (host.whileSizing) host.whileSizing();
+        return host.acceptWindowSize ? 1 : 0;
       case audioMasterProcessEvents: {
         const auto* events = static_cast<const VstEvents*>(ptr);
         for (int32_t i = 0; i < events->numEvents; ++i) host.midi.push_back(*reinterpret_cast<const VstMidiEvent*>(events->events[i]));

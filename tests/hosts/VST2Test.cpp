@@ -50,7 +50,7 @@ TEST(VST2Modules, EveryCataloguePluginHasAModuleThatDescribesAndMakesIt) {
     const AEffect& e = *instance.effect;
     const int32_t inputs = std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(key))->InputChannelCount();
     EXPECT_EQ(std::tuple(e.numPrograms, e.numParams, e.numInputs, e.numOutputs, e.flags, e.ioRatio, e.version, e.initialDelay),
-              std::tuple(1, ParameterCount(key), inputs, 2, effFlagsCanReplacing | effFlagsProgramChunks, 1.0f, 1, 0))
+              std::tuple(1, ParameterCount(key), inputs, 2, effFlagsCanReplacing | effFlagsProgramChunks | effFlagsHasEditor, 1.0f, 1, 0))
         << name;
     EXPECT_TRUE(ids.insert(e.uniqueID).second && e.uniqueID == FourCharacters(description.vst2Id) &&
                 e.uniqueID == legacy.effect->uniqueID)

@@ -15,8 +15,7 @@
 #include "ui/controls/KLevelMeterControl.h"
 #include "ui/controls/KValueControl.h"
 // Last: X11's macros (None, Bool, Status) would break the headers above.
-#include <X11/Xlib.h>
-#include <X11/Xutil.h>
+#include "tests/hosts/X11EditorWindow.h"
 
 using namespace KVST3Test;
 
@@ -46,69 +45,13 @@ struct KFrame final : KHostObject<IPlugFrame, IRunLoop> {
   }
 };
 
-bool Shell(const std::string& command) { return std::system(command.c_str()) == 0; }
-
-struct EditorWindowFixture : ::testing::Test {
-  Display* display = XOpenDisplay(nullptr);
-  Window parent = 0;
+struct VST3EditorWindow : KX11Test::EditorWindowFixture {
   KHost host;
   KFrame frame;
-
-  void SetUp() override {
-    if (!display) GTEST_SKIP() << "no X display (the test runs under xvfb-run)";
-    if (!Shell("command -v xdotool > /dev/null")) GTEST_SKIP() << "xdotool is missing";
-    parent = XCreateSimpleWindow(display, DefaultRootWindow(display), 0, 0, 1800, 1200, 0, 0, 0x202020);
-    XMapWindow(display, parent);
-    XSync(display, False);
-  }
-  void TearDown() override {
-    if (!display) return;
-    if (parent) XDestroyWindow(display, parent);
-    XCloseDisplay(display);
-  }
-  // The view's window: the one child of the host's window.
-  Window Child() {
-    XSync(display, False);
-    Window root = 0, up = 0, *children = nullptr;
-    unsigned int count = 0;
-    XQueryTree(display, parent, &root, &up, &children, &count);
-    const Window child = count == 1 ? children[0] : 0;
-    if (children) XFree(children);
-    return child;
-  }
-  int32_t ChildCount() {
-    Window root = 0, up = 0, *children = nullptr;
-    unsigned int count = 0;
-    XQueryTree(display, parent, &root, &up, &children, &count);
-    if (children) XFree(children);
-    return static_cast<int32_t>(count);
-  }
-  KBitmap Screenshot(Window window, int32_t width, int32_t height) {
-    XImage* image = XGetImage(display, window, 0, 0, static_cast<unsigned>(width), static_cast<unsigned>(height), AllPlanes, ZPixmap);
-    KBitmap picture(width, height);
-    for (int32_t y = 0; y < height; ++y)
-      for (int32_t x = 0; x < width; ++x) picture.Row(y)[x] = 0xFF000000u | static_cast<uint32_t>(XGetPixel(image, x, y));
-    XDestroyImage(image);
-    return picture;
-  }
-  // Pixels further apart than the drawers' tolerance in any channel.
-  // Within `area` (pixels; the whole picture when empty).
-  static int64_t Differences(const KBitmap& a, const KBitmap& b, KRect area = {}) {
-    if (a.Width() != b.Width() || a.Height() != b.Height()) return -1;
-    if (area.IsEmpty()) area = a.Bounds();
-    int64_t beyond = 0;
-    for (int32_t y = area.top; y <= area.bottom; ++y)
-      for (int32_t x = area.left; x <= area.right; ++x)
-        for (int shift = 0; shift < 24; shift += 8)
-          if (std::abs(int((a.Pixel(x, y) >> shift) & 0xFF) - int((b.Pixel(x, y) >> shift) & 0xFF)) > 2) {
-            ++beyond;
-            break;
-          }
-    return beyond;
-  }
 };
+using KX11Test::Shell;
 
-TEST_F(EditorWindowFixture, TheViewLivesInTheHostsWindowAndAnswersMouseKeysAndScale) {
+TEST_F(VST3EditorWindow, TheViewLivesInTheHostsWindowAndAnswersMouseKeysAndScale) {
   KBundle bundle("Utility");
   KInstance instance(bundle.Create());
   instance.Start(host);
@@ -139,21 +82,14 @@ TEST_F(EditorWindowFixture, TheViewLivesInTheHostsWindowAndAnswersMouseKeysAndSc
   ASSERT_NE(knob, nullptr);
   const KPoint at = KCentreOf(*knob);
   const double start = instance.controller->GetParamNormalized(static_cast<ParamID>(width));
-  const std::string w = std::to_string(child);
-  ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y) + " mousedown 1"));
-  for (int dy = 10; dy <= 40; dy += 10)
-    ASSERT_TRUE(Shell("xdotool mousemove --window " + w + " " + std::to_string(at.x) + " " + std::to_string(at.y + dy)));
-  ASSERT_TRUE(Shell("xdotool mouseup 1"));
+  ASSERT_TRUE(KX11Test::DragDown(child, at));
   frame.Pump();
   const double dragged = instance.controller->GetParamNormalized(static_cast<ParamID>(width));
-  EXPECT_NEAR(dragged, start - 40 / KValueControl::kDragTravel, 1e-9);
+  EXPECT_NEAR(dragged, start - KX11Test::kDragTravel, 1e-9);
   std::string kinds;
   for (const auto& [kind, id, value] : host.edits)
     if (id == static_cast<ParamID>(width)) kinds += kind;
-  EXPECT_GE(kinds.size(), 3u);
-  EXPECT_EQ(kinds.front(), 'b');
-  EXPECT_EQ(kinds.back(), 'e');
-  EXPECT_EQ(kinds.substr(1, kinds.size() - 2), std::string(kinds.size() - 2, 'p'));
+  EXPECT_TRUE(KX11Test::IsOneGesture(kinds, 'b', 'p', 'e')) << kinds;
 
   // F1 over the knob: the help card in the middle of the window (white paper).
   ASSERT_TRUE(Shell("xdotool key F1"));

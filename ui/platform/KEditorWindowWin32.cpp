@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cwchar>
 
 #include "kernel/KException.h"
 #include "ui/KDrawerToKBitmap.h"
@@ -62,11 +63,11 @@ ATOM RegisterEditorClass() noexcept {
 }
 }  // namespace
 
-KEditorWindowWin32::KEditorWindowWin32(void* parent, KEditor& editor) : editor_(editor) {
+KEditorWindowWin32::KEditorWindowWin32(uintptr_t parent, KEditor& editor) : editor_(editor) {
   static const ATOM registered = RegisterEditorClass();
   if (registered) {
     window_ = ::CreateWindowExW(0, kClassName, L"", WS_CHILD | WS_VISIBLE | WS_CLIPSIBLINGS, 0, 0, editor_.PixelWidth(),
-                                editor_.PixelHeight(), static_cast<HWND>(parent), nullptr, ::GetModuleHandleW(nullptr), this);
+                                editor_.PixelHeight(), reinterpret_cast<HWND>(parent), nullptr, ::GetModuleHandleW(nullptr), this);
   }
   if (!window_) throw KException("The editor cannot open its window.");
   MakeBackBuffer();
@@ -91,6 +92,24 @@ void KEditorWindowWin32::Resize() {
   ::SetWindowPos(window_, nullptr, 0, 0, editor_.PixelWidth(), editor_.PixelHeight(), SWP_NOMOVE | SWP_NOZORDER | SWP_NOACTIVATE);
   MakeBackBuffer();
   PaintDirty();
+}
+
+void KEditorWindowWin32::GrowAncestors(int32_t width, int32_t height, int32_t largestFrame) {
+  RECT below{};
+  ::GetWindowRect(window_, &below);
+  for (HWND parent = ::GetParent(window_); parent; parent = ::GetParent(parent)) {
+    wchar_t type[16] = {};
+    if (::GetClassNameW(parent, type, 16) && std::wcscmp(type, L"MDIClient") == 0) break;
+    RECT size{};
+    if (!::GetWindowRect(parent, &size)) break;
+    const int32_t frameX = std::max<int32_t>(0, (size.right - size.left) - (below.right - below.left));
+    const int32_t frameY = std::max<int32_t>(0, (size.bottom - size.top) - (below.bottom - below.top));
+    if (frameX > largestFrame || frameY > largestFrame) break;
+    width += frameX;
+    height += frameY;
+    ::SetWindowPos(parent, nullptr, 0, 0, width, height, SWP_NOMOVE | SWP_NOZORDER | SWP_NOACTIVATE);
+    below = size;
+  }
 }
 
 void KEditorWindowWin32::ProcessEvents() { PaintDirty(); }

@@ -16,7 +16,7 @@ class KEditorWindowWin32 {
 public:
   // A child window of `parent` (an HWND) the editor's pixel size. Throws KException when the
   // system refuses the window.
-  KEditorWindowWin32(void* parent, KEditor& editor);
+  KEditorWindowWin32(uintptr_t parent, KEditor& editor);
   ~KEditorWindowWin32();
   KEditorWindowWin32(const KEditorWindowWin32&) = delete;
   KEditorWindowWin32& operator=(const KEditorWindowWin32&) = delete;
@@ -29,6 +29,9 @@ public:
   void Tick();
   // Follows the editor's pixel size (after a scale change or a host's resize).
   void Resize();
+  // For hosts that refuse a resize: grows each window above the editor's to width × height plus
+  // its own frame, climbing until an "MDIClient" window or a frame wider than `largestFrame`.
+  void GrowAncestors(int32_t width, int32_t height, int32_t largestFrame);
   // Paints what is dirty and puts it on the window; answers the pixels put.
   int64_t PaintDirty();
   double LastFullPaintMs() const noexcept { return lastFullPaintMs_; }

@@ -75,6 +75,28 @@ void KEditorWindowX11::Resize() {
   PaintDirty();
 }
 
+void KEditorWindowX11::GrowAncestors(int32_t width, int32_t height, int32_t largestFrame) {
+  ::Window below = window_;
+  XWindowAttributes belowSize{};
+  XGetWindowAttributes(display_, below, &belowSize);
+  for (;;) {
+    ::Window root = 0, parent = 0, *children = nullptr;
+    unsigned int count = 0;
+    if (!XQueryTree(display_, below, &root, &parent, &children, &count)) break;
+    if (children) XFree(children);
+    XWindowAttributes size{};
+    if (parent == 0 || parent == root || !XGetWindowAttributes(display_, parent, &size)) break;
+    const int32_t frameX = std::max(0, size.width - belowSize.width), frameY = std::max(0, size.height - belowSize.height);
+    if (frameX > largestFrame || frameY > largestFrame) break;
+    width += frameX;
+    height += frameY;
+    XResizeWindow(display_, parent, static_cast<unsigned>(width), static_cast<unsigned>(height));
+    below = parent;
+    belowSize = size;
+  }
+  XFlush(display_);
+}
+
 void KEditorWindowX11::ProcessEvents() {
   while (XPending(display_) > 0) {
     XEvent event;

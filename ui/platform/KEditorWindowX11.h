@@ -32,6 +32,10 @@ public:
   void Resize();
   // Paints what is dirty and puts it on the window; answers the pixels put.
   int64_t PaintDirty();
+  // For hosts that refuse a new size: climbing from the parent, each window above this one takes
+  // width × height plus the frame it has around the window below it; the climb stops at the
+  // root or at a window whose frame exceeds `largestFrame` in either direction.
+  void GrowAncestors(int32_t width, int32_t height, int32_t largestFrame);
   // The milliseconds the last full repaint took.
   double LastFullPaintMs() const noexcept { return lastFullPaintMs_; }
 

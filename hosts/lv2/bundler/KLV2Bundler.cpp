@@ -3,9 +3,10 @@
 //   <dir>/<Name>.lv2/<Name>.ttl      its ports, ranges, units and features
 //   <dir>/<Name>.lv2/<Name>.so       the loader, named after the bundle (no plug-in code)
 //   <dir>/<Name>.lv2/libtorvane.so   a copy of the kernel
+//   <dir>/<Name>.lv2/<font>          a copy of each font file, for the UI
 // and lists the bundle names in <list> (outside <dir>: hosts take every entry there for a bundle).
 //
-//   torvane_lv2_bundler <kernel library> <loader> <dir> <list>
+//   torvane_lv2_bundler <kernel library> <loader> <dir> <list> [<font>...]
 
 #include <cstdio>
 #include <filesystem>
@@ -40,8 +41,8 @@ void CopyIfChanged(const fs::path& from, const fs::path& to) {
 }  // namespace
 
 int main(int argc, char** argv) {
-  if (argc != 5) {
-    std::fprintf(stderr, "usage: %s <kernel library> <loader> <dir> <list>\n", argv[0]);
+  if (argc < 5) {
+    std::fprintf(stderr, "usage: %s <kernel library> <loader> <dir> <list> [<font>...]\n", argv[0]);
     return 2;
   }
   const fs::path kernel = argv[1], loader = argv[2], dir = argv[3], names = argv[4];
@@ -60,6 +61,7 @@ int main(int argc, char** argv) {
       WriteIfChanged(bundle / (name + ".ttl"), KLV2::KPluginTurtle(*plugin, uri, entry.name));
       CopyIfChanged(loader, bundle / (name + ".so"));
       CopyIfChanged(kernel, bundle / kernel.filename());
+      for (int font = 5; font < argc; ++font) CopyIfChanged(argv[font], bundle / fs::path(argv[font]).filename());
       list << name << "\n";
     }
     list.close();

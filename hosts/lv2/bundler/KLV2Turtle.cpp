@@ -7,6 +7,7 @@
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
 #include "hosts/lv2/KLV2Ports.h"
+#include "hosts/lv2/KLV2UI.h"
 
 namespace KLV2 {
 namespace {
@@ -19,6 +20,8 @@ constexpr const char* kPrefixes =
     "@prefix rdf: <http://www.w3.org/1999/02/22-rdf-syntax-ns#> .\n"
     "@prefix rdfs: <http://www.w3.org/2000/01/rdf-schema#> .\n"
     "@prefix state: <http://lv2plug.in/ns/ext/state#> .\n"
+    "@prefix time: <http://lv2plug.in/ns/ext/time#> .\n"
+    "@prefix ui: <http://lv2plug.in/ns/extensions/ui#> .\n"
     "@prefix units: <http://lv2plug.in/ns/extensions/units#> .\n"
     "@prefix urid: <http://lv2plug.in/ns/ext/urid#> .\n\n";
 
@@ -84,7 +87,8 @@ void ControlPort(std::string& out, const KAudioPluginBase::Parameter& parameter)
 }  // namespace
 
 std::string KManifestTurtle(const std::string& uri, const std::string& name) {
-  return std::string(kPrefixes) + "<" + uri + ">\n  a lv2:Plugin ;\n  lv2:binary <" + name + ".so> ;\n  rdfs:seeAlso <" + name + ".ttl> .\n";
+  return std::string(kPrefixes) + "<" + uri + ">\n  a lv2:Plugin ;\n  lv2:binary <" + name + ".so> ;\n  rdfs:seeAlso <" + name + ".ttl> .\n\n<" +
+         UIURI(uri) + ">\n  a ui:X11UI ;\n  ui:binary <" + name + ".so> ;\n  rdfs:seeAlso <" + name + ".ttl> .\n";
 }
 
 std::string KPluginTurtle(const KAudioPlugin& plugin, const std::string& uri, const std::string& name) {
@@ -92,7 +96,8 @@ std::string KPluginTurtle(const KAudioPlugin& plugin, const std::string& uri, co
   const bool needsMap = shape.acceptsMIDI || shape.producesMIDI;
   std::string out = std::string(kPrefixes) + "<" + uri + ">\n  a lv2:Plugin ;\n  doap:name " + Quoted(name) +
                     " ;\n  lv2:optionalFeature lv2:hardRTCapable" + (needsMap ? "" : " , urid:map") +
-                    (needsMap ? " ;\n  lv2:requiredFeature urid:map" : "") + " ;\n  lv2:extensionData state:interface";
+                    (needsMap ? " ;\n  lv2:requiredFeature urid:map" : "") + " ;\n  lv2:extensionData state:interface ;\n  ui:ui <" +
+                    UIURI(uri) + ">";
   const KPortLayout layout(plugin);
   using Kind = KPort::Kind;
   for (int32_t index = 0; index < layout.Count(); ++index) {
@@ -118,6 +123,8 @@ std::string KPluginTurtle(const KAudioPlugin& plugin, const std::string& uri, co
                "    lv2:maximum 192000.0";
         break;
       case Kind::kMIDIIn:
+        out += " ;\n    atom:bufferType atom:Sequence ;\n    atom:supports midi:MidiEvent , time:Position";
+        break;
       case Kind::kMIDIOut:
         out += " ;\n    atom:bufferType atom:Sequence ;\n    atom:supports midi:MidiEvent";
         break;
@@ -126,7 +133,11 @@ std::string KPluginTurtle(const KAudioPlugin& plugin, const std::string& uri, co
     }
     out += "\n  ]";
   }
-  return out + " .\n";
+  // The editor works on the instance itself: a host that cannot give it (another process) shows
+  // its generic controls instead.
+  return out + " .\n\n<" + UIURI(uri) + ">\n  a ui:X11UI ;\n  ui:binary <" + name +
+         ".so> ;\n  lv2:requiredFeature ui:parent , ui:idleInterface , <http://lv2plug.in/ns/ext/instance-access> ;\n"
+         "  lv2:optionalFeature ui:resize , ui:touch ;\n  lv2:extensionData ui:idleInterface .\n";
 }
 
 }  // namespace KLV2

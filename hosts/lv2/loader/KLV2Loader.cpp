@@ -1,13 +1,14 @@
-// The file a host loads for one plug-in: holds no plug-in code. It opens the kernel library
-// beside it in the bundle (its own copy, never one found on the system's search path) and asks
-// it for the descriptor of the plug-in the bundle is named after: the loader's file name
-// without ".so".
+// The file a host loads for one plug-in and for its UI: holds no plug-in code. It opens the
+// kernel library beside it in the bundle (its own copy, never one found on the system's search
+// path) and asks it for the descriptors of the plug-in the bundle is named after: the loader's
+// file name without ".so". The UI shares the plug-in's kernel, which its instance-access needs.
 
 #include <cstdio>
 #include <mutex>
 #include <string>
 
 #include "hosts/lv2/KLV2Dispatch.h"
+#include "hosts/lv2/KLV2UI.h"
 #include "kernel/platform/KPlatformLibrary.h"
 
 namespace {
@@ -24,6 +25,11 @@ public:
     std::lock_guard<std::mutex> lock(mutex_);
     if (!opened_) Open();
     return descriptor_;
+  }
+  const LV2UI_Descriptor* UIDescriptor() noexcept {
+    std::lock_guard<std::mutex> lock(mutex_);
+    if (!opened_) Open();
+    return uiDescriptor_;
   }
 
 private:
@@ -44,6 +50,8 @@ private:
       const std::string name = loader.substr(slash + 1, dot - slash - 1);
       descriptor_ = dispatch(name.c_str());
       if (!descriptor_) std::fprintf(stderr, "Torvane: the kernel %s holds no plug-in named %s\n", path.c_str(), name.c_str());
+      if (auto ui = reinterpret_cast<KLV2::UIDispatchFunction>(KPlatform::FindSymbol(library_, KLV2::kUIDispatchName)))
+        uiDescriptor_ = ui(name.c_str());
     } catch (...) {
       descriptor_ = nullptr;  // out of memory while building a path
     }
@@ -53,6 +61,7 @@ private:
   bool opened_ = false;
   void* library_ = nullptr;
   const LV2_Descriptor* descriptor_ = nullptr;
+  const LV2UI_Descriptor* uiDescriptor_ = nullptr;
 };
 
 KKernel gKernel;
@@ -61,4 +70,9 @@ KKernel gKernel;
 // One plug-in per bundle, at index 0.
 extern "C" __attribute__((visibility("default"))) const LV2_Descriptor* lv2_descriptor(uint32_t index) {
   return index == 0 ? gKernel.Descriptor() : nullptr;
+}
+
+// The plug-in's UI, at index 0.
+extern "C" __attribute__((visibility("default"))) const LV2UI_Descriptor* lv2ui_descriptor(uint32_t index) {
+  return index == 0 ? gKernel.UIDescriptor() : nullptr;
 }

@@ -124,10 +124,11 @@ uint64_t KPlatform::MillisecondClock() noexcept {
 
 void KPlatform::ShowMessageBox(const char16_t* text, size_t length) noexcept {
   try {
+    // A box that cannot be shown (no display behind the desktop) answers 0: the text then goes
+    // to the standard error stream as well.
     if (HasDesktop()) {
       const std::wstring wide(reinterpret_cast<const wchar_t*>(text), length);
-      ::MessageBoxW(nullptr, wide.c_str(), nullptr, MB_OK | MB_ICONEXCLAMATION);
-      return;
+      if (::MessageBoxW(nullptr, wide.c_str(), nullptr, MB_OK | MB_ICONEXCLAMATION) != 0) return;
     }
     std::string line;
     KUtf8::Encode(text, static_cast<int32_t>(length), line);

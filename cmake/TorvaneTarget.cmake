@@ -13,12 +13,16 @@ if(TORVANE_SANITIZE)
 endif()
 
 # One implementation of kernel/platform per operating system.
+# TORVANE_PLATFORM_LIBRARY_SOURCE is the run-time library loading alone, which the loaders and
+# test hosts compile into themselves.
 if(WIN32)
   set(TORVANE_PLATFORM_SOURCES platform/windows/KPlatformWindows.cpp)
-  set(TORVANE_PLATFORM_LIBS user32 winmm)
+  set(TORVANE_PLATFORM_LIBRARY_SOURCE ${PROJECT_SOURCE_DIR}/kernel/platform/windows/KPlatformLibraryWindows.cpp)
+  set(TORVANE_PLATFORM_LIBS user32 winmm shell32 ole32)
 else()
   find_package(Threads REQUIRED)
   set(TORVANE_PLATFORM_SOURCES platform/posix/KPlatformPosix.cpp)
+  set(TORVANE_PLATFORM_LIBRARY_SOURCE ${PROJECT_SOURCE_DIR}/kernel/platform/posix/KPlatformLibraryPosix.cpp)
   set(TORVANE_PLATFORM_LIBS Threads::Threads ${CMAKE_DL_LIBS})
 endif()
 

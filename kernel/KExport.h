@@ -13,3 +13,10 @@
 #else
 #  define TORVANE_API __attribute__((visibility("default")))
 #endif
+
+// The entry points of the per-plug-in loaders, which hold no kernel code of their own.
+#if defined(_WIN32)
+#  define TORVANE_LOADER_EXPORT extern "C" __declspec(dllexport)
+#else
+#  define TORVANE_LOADER_EXPORT extern "C" __attribute__((visibility("default")))
+#endif

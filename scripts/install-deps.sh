@@ -6,6 +6,8 @@
 # With --hosts also a real plug-in host (Ardour) whose scanner the tests load our bundles in;
 # with --peers other makers' plug-ins that the VST 3 timing host and the LV2 comparison set
 # beside ours (bench/README.md, bench/lv2_peers.sh).
+# With --windows the MinGW-w64 cross compiler (posix threads), Wine and what
+# scripts/windows-deps.sh needs to cross-build the third-party libraries from Debian's sources.
 set -euo pipefail
 SUDO=""
 [ "$(id -u)" -eq 0 ] || SUDO="sudo"
@@ -21,6 +23,8 @@ for option in "$@"; do
   case "$option" in
     --hosts) packages+=(ardour) ;;
     --peers) packages+=(zam-plugins lsp-plugins-lv2 libzita-convolver-dev libfftw3-dev) ;;
+    --windows) packages+=(g++-mingw-w64-x86-64-posix gcc-mingw-w64-x86-64-posix binutils-mingw-w64-x86-64
+                 mingw-w64-x86-64-dev wine64 dpkg-dev autoconf automake libtool meson) ;;
     *) echo "unknown option $option" >&2; exit 2 ;;
   esac
 done

@@ -1,10 +1,12 @@
 #!/usr/bin/env bash
 # Installs the dependencies, then builds and runs every test: once as shipped (optimised), once
-# under AddressSanitizer with UndefinedBehaviorSanitizer, and the thread-heavy core suite under
-# ThreadSanitizer.
+# under AddressSanitizer with UndefinedBehaviorSanitizer, the thread-heavy core suite under
+# ThreadSanitizer; with TORVANE_WINDOWS=1 also the 64-bit Windows build under Wine
+# (scripts/windows-test.sh), which cross-builds its libraries from source and so takes long.
 set -euo pipefail
 cd "$(dirname "$0")/.."
-bash scripts/install-deps.sh --hosts
+windows=${TORVANE_WINDOWS:-0}
+if [ "$windows" = 1 ]; then bash scripts/install-deps.sh --hosts --windows; else bash scripts/install-deps.sh --hosts; fi
 jobs=$(nproc)
 
 # run_suite NAME "CTEST ARGS" CMAKE ARGS...
@@ -22,5 +24,6 @@ ASAN_OPTIONS=detect_leaks=1:abort_on_error=1 UBSAN_OPTIONS=print_stacktrace=1 \
   run_suite asan "" -DCMAKE_BUILD_TYPE=Debug -DTORVANE_SANITIZE=address,undefined -DTORVANE_BENCHMARKS=OFF
 TSAN_OPTIONS=halt_on_error=1 \
   run_suite tsan "-L core" -DCMAKE_BUILD_TYPE=RelWithDebInfo -DTORVANE_SANITIZE=thread -DTORVANE_BENCHMARKS=OFF
+[ "$windows" != 1 ] || bash scripts/windows-test.sh build/tests
 echo "=== fuzz"
 bash scripts/fuzz.sh 60

@@ -76,7 +76,8 @@ void Describe(const KPluginDescription& description, KAAXPluginInformation& info
 // empty outside a bundle.
 std::string OwnBundleName() {
   static const char anchor = 0;
-  const std::string path = KPlatform::LibraryPathOf(&anchor);
+  std::string path = KPlatform::LibraryPathOf(&anchor);
+  std::replace(path.begin(), path.end(), '\\', '/');  // Windows paths have either separator
   const size_t contents = path.rfind("/Contents/");
   if (contents == std::string::npos) return {};
   const std::string_view bundle = std::string_view(path).substr(0, contents);

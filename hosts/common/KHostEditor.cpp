@@ -3,7 +3,6 @@
 #include "core/KAudioPluginHost.h"
 #include "ui/editor/KEditor.h"
 #include "ui/editor/KEditorFactory.h"
-#include "ui/platform/KEditorWindowX11.h"
 
 namespace {
 // Beyond this a window above the editor's is the host's own, not a frame around it.
@@ -20,7 +19,7 @@ int32_t KHostEditor::PixelHeight() const noexcept { return editor_->PixelHeight(
 
 bool KHostEditor::Open(unsigned long parent) {
   if (window_ || parent == 0) return false;
-  window_ = std::make_unique<KEditorWindowX11>(parent, *editor_);
+  window_ = std::make_unique<KEditorWindow>(parent, *editor_);
   shownWidth_ = editor_->PixelWidth();
   shownHeight_ = editor_->PixelHeight();
   window_->PaintDirty();

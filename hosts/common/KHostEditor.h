@@ -5,11 +5,11 @@
 
 #include "kernel/KExport.h"
 #include "ui/controls/KEditorHost.h"
+#include "ui/platform/KEditorWindow.h"
 
 class KAudioPlugin;
 class KAudioPluginHost;
 class KEditor;
-class KEditorWindowX11;
 
 // The plug-in's editor as the host formats without a run loop of their own show it (VST 2, AAX,
 // the LV2 UI): made once, embedded into a host's X11 window on Open, driven only by the host's
@@ -25,7 +25,7 @@ public:
   KHostEditor& operator=(const KHostEditor&) = delete;
 
   KEditor& Editor() noexcept { return *editor_; }
-  KEditorWindowX11* Window() noexcept { return window_.get(); }
+  KEditorWindow* Window() noexcept { return window_.get(); }
   bool IsOpen() const noexcept { return window_ != nullptr; }
   // The editor's size in pixels at its present scale.
   int32_t PixelWidth() const noexcept;
@@ -42,7 +42,7 @@ public:
 
 private:
   std::unique_ptr<KEditor> editor_;
-  std::unique_ptr<KEditorWindowX11> window_;
+  std::unique_ptr<KEditorWindow> window_;
   int32_t shownWidth_ = 0;
   int32_t shownHeight_ = 0;
 };

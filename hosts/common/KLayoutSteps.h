@@ -11,7 +11,9 @@
 inline void KCopyIfChanged(const std::filesystem::path& from, const std::filesystem::path& to) {
   namespace fs = std::filesystem;
   if (fs::exists(to) && fs::file_size(to) == fs::file_size(from) && fs::last_write_time(to) >= fs::last_write_time(from)) return;
-  fs::copy_file(from, to, fs::copy_options::overwrite_existing);
+  // Removed first: MinGW's standard library refuses to copy over an existing file.
+  fs::remove(to);
+  fs::copy_file(from, to);
 }
 
 // Prints each fault of the catalogue; true when it has none (a faulty one lays out nothing).

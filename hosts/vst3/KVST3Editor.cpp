@@ -6,9 +6,19 @@
 #include "hosts/common/KHostGuard.h"
 #include "ui/editor/KEditor.h"
 #include "ui/editor/KEditorFactory.h"
-#include "ui/platform/KEditorWindowX11.h"
 
 using namespace KVST3;
+
+namespace {
+// The host's window type the editor's window lives in, and the parent as its window class wants it.
+#if defined(_WIN32)
+constexpr const char* kNativeWindowType = kPlatformTypeHWND;
+uintptr_t NativeParent(void* parent) noexcept { return reinterpret_cast<uintptr_t>(parent); }
+#else
+constexpr const char* kNativeWindowType = kPlatformTypeX11EmbedWindowID;
+unsigned long NativeParent(void* parent) noexcept { return reinterpret_cast<unsigned long>(parent); }
+#endif
+}  // namespace
 
 KAudioPluginVST3Adapter::KEditor::KEditor(KAudioPluginVST3Adapter& adapter)
     : adapter_(adapter), editor_(KMakeEditor(*adapter.plugin_, this, KStyle::Load(KStyle::UserSkinPath()))) {
@@ -44,13 +54,13 @@ uint32_t KAudioPluginVST3Adapter::KEditor::Release() {
 }
 
 TResult KAudioPluginVST3Adapter::KEditor::IsPlatformTypeSupported(FIDString type) {
-  return type && std::strcmp(type, kPlatformTypeX11EmbedWindowID) == 0 ? kResultTrue : kResultFalse;
+  return type && std::strcmp(type, kNativeWindowType) == 0 ? kResultTrue : kResultFalse;
 }
 
 TResult KAudioPluginVST3Adapter::KEditor::Attached(void* parent, FIDString type) {
   return KHostGuarded("KAudioPluginVST3Adapter::KEditor::attached", kResultFalse, [&] {
     if (IsPlatformTypeSupported(type) != kResultTrue || !parent || window_) return kResultFalse;
-    window_ = std::make_unique<KEditorWindowX11>(reinterpret_cast<unsigned long>(parent), *editor_);
+    window_ = std::make_unique<KEditorWindow>(NativeParent(parent), *editor_);
     // Linux hosts hand their run loop out through the frame.
     runLoop_.Query(frame_);
     if (runLoop_) {

@@ -7,11 +7,12 @@
 #include "hosts/vst3/KVST3Util.h"
 #include "hosts/vst3/KVST3View.h"
 #include "ui/controls/KEditorHost.h"
+#include "ui/platform/KEditorWindow.h"
 
 class KEditor;
-class KEditorWindowX11;
 
 // The plug-in's editor as a VST 3 view: an X11 child window of the host's ("X11EmbedWindowID"),
+// or on Windows a child of the host's "HWND" fed by the host's message loop. On Linux it is
 // served by the host's run loop (its timer ticks the editor, its event handler reads the
 // window's events), never by a thread of ours. Edits go to the host's component handler as
 // begin / perform / end; a new size is asked of the host's frame. The view keeps the adapter
@@ -27,7 +28,7 @@ public:
   explicit KEditor(KAudioPluginVST3Adapter& adapter);
   ~KEditor();
   ::KEditor& Editor() noexcept { return *editor_; }
-  KEditorWindowX11* Window() noexcept { return window_.get(); }
+  KEditorWindow* Window() noexcept { return window_.get(); }
 
   // ---- FUnknown
   TResult QueryInterface(const char* iid, void** object) override;
@@ -67,7 +68,7 @@ private:
   KAudioPluginVST3Adapter& adapter_;
   std::atomic<uint32_t> references_{1};
   std::unique_ptr<::KEditor> editor_;
-  std::unique_ptr<KEditorWindowX11> window_;
+  std::unique_ptr<KEditorWindow> window_;
   KVST3::IPlugFrame* frame_ = nullptr;  // the host's, not counted: it outlives the attachment
   KVST3::KShared<KVST3::IRunLoop> runLoop_;
   bool settingSize_ = false;  // inside OnSize: the host's own size change

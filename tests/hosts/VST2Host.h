@@ -90,11 +90,18 @@ struct KInstance {
   }
 };
 
+// A module's file: <Name>.dll on Windows, <Name>.so on Linux.
+#if defined(_WIN32)
+inline constexpr const char* kVST2ModuleSuffix = ".dll";
+#else
+inline constexpr const char* kVST2ModuleSuffix = ".so";
+#endif
+
 // A module loaded as a host loads it, and unloaded.
 struct KModuleFile {
   void* library;
   MainFunction main = nullptr, legacyMain = nullptr;
-  explicit KModuleFile(const std::string& name) : library(KPlatform::OpenLibrary(TORVANE_VST2_DIR "/" + name + ".so")) {
+  explicit KModuleFile(const std::string& name) : library(KPlatform::OpenLibrary(TORVANE_VST2_DIR "/" + name + kVST2ModuleSuffix)) {
     main = reinterpret_cast<MainFunction>(KPlatform::FindSymbol(library, "VSTPluginMain"));
     legacyMain = reinterpret_cast<MainFunction>(KPlatform::FindSymbol(library, "main"));
     EXPECT_TRUE(library && main && legacyMain) << KPlatform::LibraryError();

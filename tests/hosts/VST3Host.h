@@ -136,24 +136,49 @@ struct KInstance {  // as a host holds it: the component and its processor and c
   }
 };
 
-// A bundle's files.
+// A bundle's files: its module (named as the bundle on Windows) and the kernel beside it.
 inline std::string BundleBinaries(const std::string& name) { return TORVANE_VST3_DIR "/" + name + ".vst3/Contents/" TORVANE_VST3_ARCH "/"; }
+#if defined(_WIN32)
+inline constexpr const char* kModuleSuffix = ".vst3";
+inline constexpr const char* kKernelFile = "torvane.dll";
+#else
+inline constexpr const char* kModuleSuffix = ".so";
+inline constexpr const char* kKernelFile = "libtorvane.so";
+#endif
+
+// The module's first and last calls, by the names the system's hosts use (null when missing).
+inline bool EnterModule(void* library) {
+#if defined(_WIN32)
+  const auto entry = reinterpret_cast<ModuleExitFunction>(KPlatform::FindSymbol(library, "InitDll"));
+  return entry && entry();
+#else
+  const auto entry = reinterpret_cast<ModuleEntryFunction>(KPlatform::FindSymbol(library, "ModuleEntry"));
+  return entry && entry(library);
+#endif
+}
+inline bool ExitModule(void* library) {
+#if defined(_WIN32)
+  const auto exit = reinterpret_cast<ModuleExitFunction>(KPlatform::FindSymbol(library, "ExitDll"));
+#else
+  const auto exit = reinterpret_cast<ModuleExitFunction>(KPlatform::FindSymbol(library, "ModuleExit"));
+#endif
+  return exit && exit();
+}
 
 // A bundle loaded as a host loads it (module, ModuleEntry with its handle, factory), and unloaded.
 // A bundle that is missing or broken fails the test; the factory is then null.
 struct KBundle {
   void* library; IPluginFactory* factory = nullptr;
-  explicit KBundle(const std::string& name) : library(KPlatform::OpenLibrary(BundleBinaries(name) + name + ".so")) {
-    const auto entry = reinterpret_cast<ModuleEntryFunction>(KPlatform::FindSymbol(library, "ModuleEntry"));
+  explicit KBundle(const std::string& name) : library(KPlatform::OpenLibrary(BundleBinaries(name) + name + kModuleSuffix)) {
     const auto get = reinterpret_cast<GetPluginFactoryFunction>(KPlatform::FindSymbol(library, "GetPluginFactory"));
-    EXPECT_TRUE(library && entry && get && entry(library)) << name << ": " << KPlatform::LibraryError();
-    factory = get && entry ? get() : nullptr;
+    const bool entered = library && EnterModule(library);
+    EXPECT_TRUE(entered && get) << name << ": " << KPlatform::LibraryError();
+    factory = get && entered ? get() : nullptr;
   }
   ~KBundle() {
     if (factory) factory->Release();
     if (!library) return;
-    const auto exit = reinterpret_cast<ModuleExitFunction>(KPlatform::FindSymbol(library, "ModuleExit"));
-    EXPECT_TRUE(exit && exit());
+    EXPECT_TRUE(ExitModule(library));
     KPlatform::CloseLibrary(library);
   }
   FUnknown* Create() {

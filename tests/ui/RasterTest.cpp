@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <numbers>
 #include <vector>
 
 #include "tests/core/TraceCapture.h"
@@ -116,7 +117,7 @@ TEST(Raster, NonZeroWindingCutsHolesOnlyWithReversedContours) {
   EXPECT_EQ(filled.Coverage(15, 15), 1);
   // A pentagram's centre is wound twice: filled by the non-zero rule.
   std::vector<KPointF> star;
-  for (int i = 0; i < 5; ++i) star.push_back({16 + 14 * std::sin(i * 4 * M_PI / 5), 16 - 14 * std::cos(i * 4 * M_PI / 5)});
+  for (int i = 0; i < 5; ++i) star.push_back({16 + 14 * std::sin(i * 4 * std::numbers::pi / 5), 16 - 14 * std::cos(i * 4 * std::numbers::pi / 5)});
   Canvas pentagram(32);
   pentagram.drawer.FillPolygon(star, {}, 0xFFFFFFFFu, 255, kDrawBlend);
   EXPECT_EQ(pentagram.Coverage(15, 16), 1);
@@ -198,7 +199,7 @@ TEST(Raster, BlitsCopyClipRepeatAndFilter) {
   // A quarter turn moves the source's top row onto the right column.
   KBitmap turned(16, 16);
   KDrawerToKBitmap turner(turned);
-  turner.RotatedBlt({7.5, 7.5}, M_PI / 2, source, source.Bounds(), 255, kDrawCopy);
+  turner.RotatedBlt({7.5, 7.5}, std::numbers::pi / 2, source, source.Bounds(), 255, kDrawCopy);
   EXPECT_EQ(turned.Pixel(11 - 0, 4 + 2), source.Pixel(2, 0));
 }
 

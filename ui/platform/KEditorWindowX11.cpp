@@ -4,8 +4,6 @@
 #include <X11/Xutil.h>
 #include <X11/keysym.h>
 
-#include <algorithm>
-#include <chrono>
 #include <cmath>
 
 #include "kernel/KException.h"

@@ -8,14 +8,18 @@
 #include <mutex>
 #include <string>
 
+#include "kernel/KExport.h"
 #include "kernel/platform/KPlatformLibrary.h"
 
-#define KAAX_LOADER_EXPORT extern "C" __attribute__((visibility("default")))
 
 namespace {
 using ACFResult = int32_t;
 constexpr ACFResult kACFFail = static_cast<int32_t>(0x80004005u);
+#if defined(_WIN32)
+constexpr const char* kKernelFile = "torvane.dll";
+#else
 constexpr const char* kKernelFile = "libtorvane.so";
+#endif
 
 // An object of the loader itself: its address names the loader's file.
 const char kAnchor = 0;
@@ -29,7 +33,7 @@ void* Entry(const char* name) noexcept {
   try {
     if (!gKernel) {
       const std::string loader = KPlatform::LibraryPathOf(&kAnchor);
-      const size_t slash = loader.rfind('/');
+      const size_t slash = loader.find_last_of("/\\");
       if (slash == std::string::npos) return nullptr;
       const std::string path = loader.substr(0, slash + 1) + kKernelFile;
       gKernel = KPlatform::OpenLibrary(path);
@@ -48,19 +52,19 @@ ACFResult Forward(const char* name, Arguments... arguments) noexcept {
 }
 }  // namespace
 
-KAAX_LOADER_EXPORT ACFResult ACFStartup(void* host) { return Forward("ACFStartup", host); }
-KAAX_LOADER_EXPORT ACFResult ACFRegisterPlugin(void* host, void** definition) { return Forward("ACFRegisterPlugin", host, definition); }
-KAAX_LOADER_EXPORT ACFResult ACFRegisterComponent(void* host, uint32_t index, void** component) {
+TORVANE_LOADER_EXPORT ACFResult ACFStartup(void* host) { return Forward("ACFStartup", host); }
+TORVANE_LOADER_EXPORT ACFResult ACFRegisterPlugin(void* host, void** definition) { return Forward("ACFRegisterPlugin", host, definition); }
+TORVANE_LOADER_EXPORT ACFResult ACFRegisterComponent(void* host, uint32_t index, void** component) {
   return Forward("ACFRegisterComponent", host, index, component);
 }
-KAAX_LOADER_EXPORT ACFResult ACFGetClassFactory(void* host, const void* classId, const void* interfaceId, void** factory) {
+TORVANE_LOADER_EXPORT ACFResult ACFGetClassFactory(void* host, const void* classId, const void* interfaceId, void** factory) {
   return Forward("ACFGetClassFactory", host, classId, interfaceId, factory);
 }
-KAAX_LOADER_EXPORT ACFResult ACFCanUnloadNow(void* host) { return Forward("ACFCanUnloadNow", host); }
-KAAX_LOADER_EXPORT ACFResult ACFGetSDKVersion(uint64_t* version) { return Forward("ACFGetSDKVersion", version); }
+TORVANE_LOADER_EXPORT ACFResult ACFCanUnloadNow(void* host) { return Forward("ACFCanUnloadNow", host); }
+TORVANE_LOADER_EXPORT ACFResult ACFGetSDKVersion(uint64_t* version) { return Forward("ACFGetSDKVersion", version); }
 
 // The host's last call: the kernel shuts down and is closed once it agrees to be unloaded.
-KAAX_LOADER_EXPORT ACFResult ACFShutdown(void* host) {
+TORVANE_LOADER_EXPORT ACFResult ACFShutdown(void* host) {
   const ACFResult result = Forward("ACFShutdown", host);
   std::lock_guard<std::mutex> lock(gLock);
   if (gKernel) {

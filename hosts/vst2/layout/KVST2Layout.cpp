@@ -33,14 +33,14 @@ int main(int argc, char** argv) {
     std::ofstream list(dir / "modules.txt.new");
     for (const KPluginDescription& plugin : catalogue.plugins) {
       const std::string name = KPluginIds::BundleName(plugin.key);
-      KCopyIfChanged(loader, dir / (name + ".so"));
+      KCopyIfChanged(loader, dir / (name + loader.extension().string()));
       names.insert(name);
       list << name << "\n";
     }
     KCopyIfChanged(kernel, dir / argv[4]);
     std::ifstream previous(dir / "modules.txt");
     for (std::string name; std::getline(previous, name);)
-      if (!names.contains(name)) fs::remove(dir / (name + ".so"));
+      if (!names.contains(name)) fs::remove(dir / (name + loader.extension().string()));
     list.close();
     fs::rename(dir / "modules.txt.new", dir / "modules.txt");
   } catch (const std::exception& failure) {

@@ -7,9 +7,9 @@
 #include <string>
 
 #include "hosts/vst2/KVST2Dispatch.h"
+#include "kernel/KExport.h"
 #include "kernel/platform/KPlatformLibrary.h"
 
-#define KVST2_LOADER_EXPORT extern "C" __attribute__((visibility("default")))
 
 namespace {
 // An object of the loader itself: its address names the loader's file.
@@ -27,7 +27,7 @@ const KKernel& Kernel() noexcept {
     KKernel found;
     try {
       const std::string loader = KPlatform::LibraryPathOf(&kAnchor);
-      const size_t slash = loader.rfind('/'), dot = loader.rfind('.');
+      const size_t slash = loader.find_last_of("/\\"), dot = loader.rfind('.');
       if (slash == std::string::npos || dot == std::string::npos || dot < slash) return found;
       const std::string path = loader.substr(0, slash + 1) + TORVANE_VST2_KERNEL, name = loader.substr(slash + 1, dot - slash - 1);
       void* library = KPlatform::OpenLibrary(path);
@@ -49,11 +49,11 @@ const KKernel& Kernel() noexcept {
 }  // namespace
 
 // Null when the kernel cannot be loaded or does not know this module's plug-in.
-KVST2_LOADER_EXPORT KVST2::AEffect* VSTPluginMain(KVST2::HostCallback host) {
+TORVANE_LOADER_EXPORT KVST2::AEffect* VSTPluginMain(KVST2::HostCallback host) {
   const KKernel& kernel = Kernel();
   return kernel.dispatch ? kernel.dispatch(kernel.plugin.key, "", static_cast<uint32_t>(kernel.plugin.uniqueId), host) : nullptr;
 }
 
 // The entry's older name, which some hosts still look for first.
-KVST2_LOADER_EXPORT KVST2::AEffect* KVST2LegacyMain(KVST2::HostCallback host) __asm__("main");
+TORVANE_LOADER_EXPORT KVST2::AEffect* KVST2LegacyMain(KVST2::HostCallback host) __asm__("main");
 KVST2::AEffect* KVST2LegacyMain(KVST2::HostCallback host) { return VSTPluginMain(host); }

@@ -1,7 +1,8 @@
-// Lays out one bundle per plug-in of the kernel's catalogue, in the Linux layout that VST 3
+// Lays out one bundle per plug-in of the kernel's catalogue, in the layout that VST 3
 // (<extension> ".vst3") and AAX (".aaxplugin") hosts alike look for:
 //   <dir>/<Name><extension>/Contents/<arch>/<Name>.so       the loader, named after the bundle
-//   <dir>/<Name><extension>/Contents/<arch>/libtorvane.so   a copy of the kernel
+//                                                           (<Name><extension> on Windows)
+//   <dir>/<Name><extension>/Contents/<arch>/libtorvane.so   a copy of the kernel (torvane.dll)
 //   <dir>/<Name><extension>/Contents/<arch>/<file>          a copy of each further file (the fonts)
 // and lists the bundle names in <dir>/bundles.txt. Bundles of plug-ins the catalogue no longer
 // holds are removed. A catalogue with faults lays out nothing: each fault is printed and the
@@ -21,6 +22,15 @@
 
 namespace fs = std::filesystem;
 
+// A bundle's binary: "<Name>.so" on Linux, named as the bundle itself on Windows.
+std::string BinarySuffix([[maybe_unused]] const std::string& extension) {
+#if defined(_WIN32)
+  return extension;
+#else
+  return ".so";
+#endif
+}
+
 int main(int argc, char** argv) {
   if (argc < 6) {
     std::fprintf(stderr, "usage: %s <kernel library> <loader> <dir> <extension> <arch> [<file>...]\n", argv[0]);
@@ -37,7 +47,7 @@ int main(int argc, char** argv) {
       const std::string name = KPluginIds::BundleName(plugin.key);
       const fs::path binaries = dir / (name + extension) / "Contents" / arch;
       fs::create_directories(binaries);
-      KCopyIfChanged(loader, binaries / (name + ".so"));
+      KCopyIfChanged(loader, binaries / (name + BinarySuffix(extension)));
       KCopyIfChanged(kernel, binaries / kernel.filename());
       for (int i = 6; i < argc; ++i) KCopyIfChanged(argv[i], binaries / fs::path(argv[i]).filename());
       names.insert(name);

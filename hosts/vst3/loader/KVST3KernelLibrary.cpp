@@ -12,14 +12,14 @@ const char kAnchor = 0;
 
 std::string KernelPath() {
   const std::string loader = KPlatform::LibraryPathOf(&kAnchor);
-  const size_t slash = loader.rfind('/');
+  const size_t slash = loader.find_last_of("/\\");
   return slash == std::string::npos ? std::string() : loader.substr(0, slash + 1) + KKernelLibrary::kFileName;
 }
 
 // The loader's own file name without its extension: the name of its bundle and of its plug-in.
 std::string BundleName() {
   std::string name = KPlatform::LibraryPathOf(&kAnchor);
-  name.erase(0, name.rfind('/') + 1);
+  name.erase(0, name.find_last_of("/\\") + 1);
   const size_t dot = name.rfind('.');
   return dot == std::string::npos ? name : name.substr(0, dot);
 }

@@ -11,7 +11,11 @@ namespace KVST3 {
 // copy of the kernel), opened with its symbols kept to itself.
 class KKernelLibrary {
 public:
+#if defined(_WIN32)
+  static constexpr const char* kFileName = "torvane.dll";
+#else
   static constexpr const char* kFileName = "libtorvane.so";
+#endif
 
   KKernelLibrary() = default;
   KKernelLibrary(const KKernelLibrary&) = delete;

@@ -4,6 +4,7 @@
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
 #include "core/KPresetStore.h"
+#include "core/KXMLReader.h"
 #include "core/KStateSection.h"
 #include "core/KAudioPluginHost.h"
 #include "kernel/KException.h"
@@ -61,6 +62,7 @@ void KAudioPlugin::LoadFactoryPreset(const KFactoryPreset& preset) {
     values.ExactNumber(key, working, parameter->Kind().ToWorking(parameter->DefaultNormalized()));
   }
   sound.AddChild(std::move(parameters));
+  if (preset.settings) sound.AddChild(KXMLReader::Read(preset.settings));
   undo_.UndoStoreSettings();
   StoreSections(sound, 0, Scope::kPresetSound);
   RequestJump();

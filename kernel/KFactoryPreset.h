@@ -12,4 +12,7 @@ struct KFactoryPreset {
   };
   const char* name;
   std::span<const Value> values;
+  // The plug-in's own settings as XML text, a "PluginSettings" element, for plug-ins whose sound
+  // is more than its parameter values (a chain of modules, say); null for the rest.
+  const char* settings = nullptr;
 };

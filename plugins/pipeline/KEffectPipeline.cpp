@@ -80,6 +80,21 @@ KEffectPipeline::~KEffectPipeline() = default;
 
 KAudioPlugin* KEffectPipeline::Create(KModule*, const KPluginRecord*) { return new KEffectPipeline; }
 
+namespace {
+// Chains to start from: each module at its own defaults, in the order a signal meets them.
+constexpr KFactoryPreset kPresets[] = {
+    {"Vocal chain", {},
+     "<PluginSettings><EffectPipeline><Module Key=\"Gate\"/><Module Key=\"Compressor\"/>"
+     "<Module Key=\"Equalizer\"/></EffectPipeline></PluginSettings>"},
+    {"Master bus", {},
+     "<PluginSettings><EffectPipeline><Module Key=\"Equalizer\"/><Module Key=\"MultibandCompressor\"/>"
+     "<Module Key=\"Limiter\"/></EffectPipeline></PluginSettings>"},
+    {"Lo-fi", {},
+     "<PluginSettings><EffectPipeline><Module Key=\"BitCrusher\"/><Module Key=\"SampleWarmer\"/>"
+     "</EffectPipeline></PluginSettings>"},
+};
+}  // namespace
+
 constinit const KPluginDescription kEffectPipelineDescription{
     .key = "KEffectPipeline",
     .factory = &KEffectPipeline::Create,
@@ -90,6 +105,7 @@ constinit const KPluginDescription kEffectPipelineDescription{
     .vst2Id = "TvEP",
     .identity = "KEffectPipeline",
     .help = &KEffectPipelineHelp,
+    .presets = kPresets,
 };
 
 std::shared_ptr<KAudioPlugin> KEffectPipeline::MakeModule(const KString& key) const {
@@ -198,10 +214,11 @@ void KEffectPipeline::LoadPipeline(const Element& document) {
     made->LoadState(module.state);
     chain->stages.push_back({std::move(made), module.key, module.slot});
   }
-  for (int32_t slot = 0; slot < kSlots; ++slot) {
-    const int32_t position = chain->PositionOfSlot(slot);
-    ShowInSlot(slot, position < 0 ? nullptr : chain->stages[position].module.get(), position >= 0 && modules[position].bypass);
-  }
+  // An empty slot keeps the values its parameters were given: they are the host's, and a state
+  // must load back exactly as it was stored.
+  for (int32_t slot = 0; slot < kSlots; ++slot)
+    if (const int32_t position = chain->PositionOfSlot(slot); position >= 0)
+      ShowInSlot(slot, chain->stages[position].module.get(), modules[position].bypass);
   Publish(std::move(chain));
 }
 

@@ -214,3 +214,16 @@ TEST(KEffectPipeline, ProcessingAllocatesNothingAcrossEdits) {
   }
   EXPECT_EQ(pipeline->KeyAt(0).ToUtf8(), "Equalizer");
 }
+
+// A factory preset is a whole chain: it replaces the modules there were with its own, in order.
+TEST(KEffectPipeline, FactoryPresetsBringTheirChains) {
+  auto pipeline = CompressorThenWarmer();
+  const auto& presets = kEffectPipelineDescription.presets;
+  ASSERT_FALSE(presets.empty());
+  pipeline->LoadFactoryPreset(presets[0]);
+  ASSERT_EQ(pipeline->ModuleCount(), 3);
+  EXPECT_EQ(pipeline->KeyAt(0).ToUtf8(), "Gate");
+  EXPECT_EQ(pipeline->KeyAt(1).ToUtf8(), "Compressor");
+  EXPECT_EQ(pipeline->KeyAt(2).ToUtf8(), "Equalizer");
+  for (int32_t slot = 0; slot < 3; ++slot) EXPECT_EQ(pipeline->GetParameter(P::BypassIndex(slot)).Normalized(), 0.0);
+}

@@ -4,15 +4,18 @@
 # may land in the user's ~/.vst3, ~/.lv2 or ~/.lxvst, not even for the prefix /usr/local (staged through DESTDIR).
 set -euo pipefail
 build=$1
+# Matches read the whole of their input: `grep -q` stops at the first match, and the writer's
+# broken pipe would fail the pipeline.
+has() { grep -e "$1" >/dev/null; }
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 export HOME="$work/home"
 mkdir -p "$HOME"
 cmake --install "$build" --prefix "$work/prefix" >/dev/null
 mv "$work/prefix" "$work/moved"
-"$work/moved/bin/torvane" --version | grep -q '^torvane '
-ldd "$work/moved/bin/torvane" | grep -q "=> $work/moved/bin/../lib/libtorvane.so"
-"$work/moved/bin/torvane" list | grep -q KCompressorPlugin
+"$work/moved/bin/torvane" --version | has '^torvane '
+ldd "$work/moved/bin/torvane" | has "=> $work/moved/bin/../lib/libtorvane.so"
+"$work/moved/bin/torvane" list | has KCompressorPlugin
 ls -d "$work"/moved/lib/vst3/*.vst3 "$work"/moved/lib/lv2/*.lv2/manifest.ttl "$work"/moved/lib/lxvst/Torvane/*.so "$work"/moved/lib/lxvst/Torvane/libtorvane.so.* >/dev/null
 [ ! -e "$HOME/.vst3" ] && [ ! -e "$HOME/.lv2" ] && [ ! -e "$HOME/.lxvst" ]
 DESTDIR="$work/staged" cmake --install "$build" --prefix /usr/local >/dev/null

@@ -194,7 +194,6 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
 
   // ---- the title bar
   KControl& header = body.Emplace<KHeaderBar>(KRect{0, 0, width_ - 1, kHeaderHeight - 1});
-  header.Emplace<KTextLabel>(KRect{kMargin + 4, 0, kMargin + 220, kHeaderHeight - 1}, title, KTextLabel::kTitle);
   int32_t right = width_ - kMargin;
   const auto button = [&](int32_t w, const char* caption, KButton::Action action, KButton::Enabled enabled, const char* help) -> KButton& {
     KButton& b = header.Emplace<KButton>(KRect{right - w + 1, 10, right, kHeaderHeight - 11}, KString::Static(caption),
@@ -207,7 +206,10 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
   sizeButton_->SetCaptionSource([this] { return KFormat("{0} %").Arg(static_cast<int32_t>(std::lround(scale_ * 100))).Text(); });
   button(52, "Redo", [this] { Redo(); }, [this] { return plugin_.CanRedo(); }, "redo");
   button(52, "Undo", [this] { Undo(); }, [this] { return plugin_.CanUndo(); }, "undo");
-  presetButton_ = &button(180, "", [this] { OpenPresetMenu(); }, {}, "presets");
+  // A narrow editor narrows the preset button first, so that the plug-in's name keeps its room.
+  constexpr int32_t kTitleRoom = 180;
+  presetButton_ = &button(std::clamp(right - kMargin - 4 - kTitleRoom - 6, 96, 180), "", [this] { OpenPresetMenu(); }, {}, "presets");
+  header.Emplace<KTextLabel>(KRect{kMargin + 4, 0, std::max(kMargin + 4 + kTitleRoom, right), kHeaderHeight - 1}, title, KTextLabel::kTitle);
   // The button names the active preset, with a star once the settings left it.
   presetButton_->SetCaptionSource([this] {
     if (plugin_.ActivePresetName().IsEmpty()) return KString("Presets");

@@ -166,14 +166,11 @@ bool KEditorWindowWin32::HandleMessage(unsigned message, uintptr_t wParam, intpt
 }
 
 int64_t KEditorWindowWin32::PaintDirty() {
-  const KPaintedPixels painted = KPaintEditorDirty(editor_, *drawer_, backBuffer_, lastFullPaintMs_);
-  if (painted.IsEmpty()) return 0;
-  Present(painted.left, painted.top, painted.right, painted.bottom);
-  return painted.Count();
+  return KPaintEditorDirty(editor_, *drawer_, lastFullPaintMs_, [this](const KRect& pixels) { Present(pixels); });
 }
 
-void KEditorWindowWin32::Present(int32_t left, int32_t top, int32_t right, int32_t bottom) {
-  if (right < left || bottom < top) return;
+void KEditorWindowWin32::Present(const KRect& pixels) {
+  if (pixels.IsEmpty()) return;
   // The back buffer's 0xAARRGGBB words are a top-down 32-bit device-independent bitmap.
   BITMAPINFO info{};
   info.bmiHeader.biSize = sizeof(info.bmiHeader);
@@ -185,7 +182,7 @@ void KEditorWindowWin32::Present(int32_t left, int32_t top, int32_t right, int32
   HDC device = ::GetDC(window_);
   if (!device) return;
   // Only the repainted area reaches the window: the rest is clipped away.
-  ::IntersectClipRect(device, left, top, right + 1, bottom + 1);
+  ::IntersectClipRect(device, pixels.left, pixels.top, pixels.right + 1, pixels.bottom + 1);
   ::SetDIBitsToDevice(device, 0, 0, static_cast<DWORD>(backBuffer_.Width()), static_cast<DWORD>(backBuffer_.Height()), 0, 0, 0,
                       static_cast<UINT>(backBuffer_.Height()), backBuffer_.Pixels(), &info, DIB_RGB_COLORS);
   ::ReleaseDC(window_, device);

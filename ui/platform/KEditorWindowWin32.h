@@ -4,6 +4,7 @@
 #include <memory>
 
 #include "ui/KBitmap.h"
+#include "ui/KGeometry.h"
 
 class KEditor;
 class KDrawerToKBitmap;
@@ -40,7 +41,7 @@ public:
   bool HandleMessage(unsigned message, uintptr_t wParam, intptr_t lParam);
 
 private:
-  void Present(int32_t left, int32_t top, int32_t right, int32_t bottom);
+  void Present(const KRect& pixels);
   void MakeBackBuffer();
 
   KEditor& editor_;

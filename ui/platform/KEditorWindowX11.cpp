@@ -8,6 +8,7 @@
 
 #include "kernel/KException.h"
 #include "ui/editor/KEditor.h"
+#include "ui/platform/KEditorPaint.h"
 #include "ui/platform/KOpenGLWindowContext.h"
 #include "ui/platform/KWindowSurface.h"
 
@@ -160,19 +161,6 @@ int64_t KEditorWindowX11::PaintDirty() {
   KControlTree& tree = editor_.Tree();
   if (!tree.NeedsPaint()) return 0;
   if (!surface_->KeepsPicture()) tree.InvalidateAll();
-  const bool full = tree.DirtyArea() == tree.Root().Bounds();
-  const auto start = std::chrono::steady_clock::now();
   surface_->Begin();
-  const KRect area = editor_.Paint(surface_->Drawer());
-  // The logical area in pixels, widened by one for anti-aliased edges.
-  const double s = editor_.Scale();
-  const KRect pixels =
-      area.IsEmpty() ? area
-                     : KRect{std::max(0, static_cast<int32_t>(std::floor(area.left * s)) - 1),
-                             std::max(0, static_cast<int32_t>(std::floor(area.top * s)) - 1),
-                             std::min(editor_.PixelWidth() - 1, static_cast<int32_t>(std::ceil((area.right + 1) * s))),
-                             std::min(editor_.PixelHeight() - 1, static_cast<int32_t>(std::ceil((area.bottom + 1) * s)))};
-  surface_->Show(pixels);
-  if (full) lastFullPaintMs_ = std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start).count();
-  return pixels.IsEmpty() ? 0 : int64_t{pixels.right - pixels.left + 1} * (pixels.bottom - pixels.top + 1);
+  return KPaintEditorDirty(editor_, surface_->Drawer(), lastFullPaintMs_, [this](const KRect& pixels) { surface_->Show(pixels); });
 }

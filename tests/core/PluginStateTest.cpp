@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cmath>
 #include <functional>
 #include <cstdlib>
 #include <optional>
@@ -54,6 +55,9 @@ protected:
 constexpr KFactoryPreset::Value kBrightValues[] = {{"gain", -6.0}, {"frequency", 4000.0}};
 constexpr KFactoryPreset::Value kDarkValues[] = {{"frequency", 200.0}, {"mode", 2.0}, {"ratio", 4.0}};
 constexpr KFactoryPreset kFactory[] = {{"Bright", kBrightValues}, {"Dark", kDarkValues}};
+
+// A working value to a millionth: curved kinds do not give back every value bit for bit.
+double Rounded(double value) { return std::round(value * 1e6) / 1e6; }
 
 std::vector<std::string> Names(const KStringList& list) {
   std::vector<std::string> names;
@@ -266,14 +270,15 @@ TEST_F(PluginState, FactoryPresetsAreListedFirstAndSelectedByTheirPlace) {
   EXPECT_EQ(std::pair(g.presetIndex, plugin.IsActivePresetFactory()), std::pair(2, false));
 
   plugin.SelectPreset(1);
-  EXPECT_EQ(std::tuple(plugin.Working(kGain), plugin.Working(kFrequency), plugin.Working(kMode)), std::tuple(0.0, 200.0, 2.0));
+  EXPECT_EQ(std::tuple(Rounded(plugin.Working(kGain)), Rounded(plugin.Working(kFrequency)), plugin.Working(kMode)), std::tuple(0.0, 200.0, 2.0));
   EXPECT_EQ(std::tuple(plugin.ActivePresetName().ToUtf8(), plugin.IsActivePresetFactory(), plugin.IsActivePresetCurrent(), g.presetIndex, g.preset.ToUtf8()),
             std::tuple("Dark", true, true, 1, "Dark"));
   plugin.SelectPreset(2);
-  EXPECT_EQ(std::tuple(plugin.Working(kGain), plugin.ActivePresetName().ToUtf8(), plugin.IsActivePresetFactory(), g.presetIndex),
+  EXPECT_EQ(std::tuple(Rounded(plugin.Working(kGain)), plugin.ActivePresetName().ToUtf8(), plugin.IsActivePresetFactory(), g.presetIndex),
             std::tuple(-20.0, "Mine", false, 2));
   plugin.LoadPreset("Bright");
-  EXPECT_EQ(std::tuple(plugin.Working(kGain), plugin.Working(kFrequency), plugin.IsActivePresetFactory(), g.presetIndex), std::tuple(-6.0, 4000.0, true, 0));
+  EXPECT_EQ(std::tuple(Rounded(plugin.Working(kGain)), Rounded(plugin.Working(kFrequency)), plugin.IsActivePresetFactory(), g.presetIndex),
+            std::tuple(-6.0, 4000.0, true, 0));
   for (const int32_t beyond : {-1, 3}) EXPECT_THROW(plugin.SelectPreset(beyond), KException) << beyond;
   EXPECT_EQ(plugin.ActivePresetName().ToUtf8(), "Bright");  // a refused choice changes nothing
 
@@ -313,9 +318,9 @@ TEST_F(PluginState, FactoryPresetsAreReadOnlyAndNeverShadowed) {
   KPresetStore(plugin.Module()).Store("Bright", legacy);
   EXPECT_EQ(Names(plugin.ListPresets()), (std::vector<std::string>{"Bright", "Dark", "Mine", "Bright"}));
   plugin.LoadPreset("Bright");
-  EXPECT_EQ(std::pair(plugin.Working(kGain), plugin.IsActivePresetFactory()), std::pair(-6.0, true));
+  EXPECT_EQ(std::pair(Rounded(plugin.Working(kGain)), plugin.IsActivePresetFactory()), std::pair(-6.0, true));
   plugin.SelectPreset(3);
-  EXPECT_EQ(std::tuple(plugin.Working(kGain), plugin.IsActivePresetFactory(), plugin.GlobalSettings().presetIndex), std::tuple(-30.0, false, 3));
+  EXPECT_EQ(std::tuple(Rounded(plugin.Working(kGain)), plugin.IsActivePresetFactory(), plugin.GlobalSettings().presetIndex), std::tuple(-30.0, false, 3));
   plugin.SelectPreset(0);
   plugin.DeletePreset("Bright");  // the user's: the factory's stays, and stays current
   EXPECT_EQ(Names(plugin.ListPresets()), (std::vector<std::string>{"Bright", "Dark", "Mine"}));

@@ -209,7 +209,7 @@ TEST(PluginEditor, ThePresetMenuOffersTheFactoryPresetsUnderTheirOwnHeading) {
     menu = open();
     ASSERT_NE(menu, nullptr);
     click(*menu, 2);  // the second factory preset
-    EXPECT_EQ(std::tuple(plugin->ActivePresetName().ToUtf8(), plugin->IsActivePresetFactory(), plugin->GetParameter(width).Working()),
+    EXPECT_EQ(std::tuple(plugin->ActivePresetName().ToUtf8(), plugin->IsActivePresetFactory(), std::round(plugin->GetParameter(width).Working() * 1e6) / 1e6),
               std::tuple(std::string(kUtilityDescription.presets[1].name), true, 150.0));
     EXPECT_EQ(host.KindsOf(width), "bve");
     editor->Tree().Tick();

@@ -39,6 +39,17 @@ std::string Number(double value) {
   return number;
 }
 
+// A preset's port value as a plain decimal, never with an exponent: Turtle reads it as
+// xsd:decimal, which hosts hand to a control port as the float it expects (an exponent would
+// make it xsd:double).
+std::string Decimal(double value) {
+  char text[400];
+  const auto end = std::to_chars(text, text + sizeof text, value, std::chars_format::fixed).ptr;
+  std::string number(text, end);
+  if (number.find('.') == std::string::npos) number += ".0";
+  return number;
+}
+
 std::string Quoted(std::string_view text) {
   std::string quoted = "\"";
   for (const char c : text) {
@@ -128,7 +139,7 @@ std::string KPresetsTurtle(KAudioPlugin& plugin, const std::string& uri) {
     out += "<" + KPresetURI(uri, preset.name) + ">\n  a pset:Preset ;\n  lv2:appliesTo <" + uri + "> ;\n  rdfs:label " + Quoted(preset.name);
     for (int32_t p = 0; p < plugin.ParameterCount(); ++p) {
       out += std::string(p == 0 ? " ;\n  lv2:port " : " ,\n    ") + "[ lv2:symbol " + Quoted(layout.Ports()[static_cast<size_t>(first + p)].symbol) +
-             " ; pset:value " + Number(plugin.GetParameter(p).Working()) + " ]";
+             " ; pset:value " + Decimal(plugin.GetParameter(p).Working()) + " ]";
     }
     // Settings beyond the ports reach the plug-in only through its state.
     if (preset.settings) out += std::string(" ;\n  state:state [ <") + KAudioPluginLV2Adapter::kStateKey + "> " + Quoted(plugin.WriteState()) + " ]";

@@ -8,6 +8,7 @@
 #include "plugins/utility/KUtilityPlugin.h"
 #include "tests/core/AllocationCounter.h"
 #include "tests/core/RecordingPlugin.h"
+#include "tests/core/UserDataFolder.h"
 #include "tests/hosts/VST3Host.h"
 
 #include <filesystem>
@@ -217,6 +218,33 @@ TEST(VST3Adapter, TheProgramListAndParameterChooseTheFactoryPresets) {
   units->Release();
   reopened.Stop();
   instance.Stop();
+}
+
+// A preset the user saves joins the list after the factory's: the list, the program's step count
+// and its texts grow together, and the host is told to read the parameters again.
+TEST(VST3Adapter, ASavedPresetJoinsTheProgramListAfterTheFactoryPresets) {
+  const KUserDataFolder data;  // the user's presets go to a fresh folder
+  {
+    auto* plugin = new KUtilityPlugin;
+    plugin->SetIdentifier("KUtilityPlugin");
+    plugin->SetFactoryPresets(kUtilityDescription.presets);
+    KHost host;
+    KInstance instance(Adapt(plugin));
+    instance.Start(host);
+    const int32_t factory = plugin->FactoryPresetCount();
+    plugin->SavePreset("Mine");
+    ParameterInfo info{};
+    ASSERT_EQ(instance.controller->GetParameterInfo(KUtilityPlugin::kParameterCount + 1, info), kResultOk);
+    EXPECT_EQ(info.stepCount, factory);
+    EXPECT_NE(std::find(host.restarts.begin(), host.restarts.end(), kParamValuesChanged | kParamTitlesChanged), host.restarts.end());
+    EXPECT_EQ(std::pair(instance.Text(32766, 1.0), instance.controller->GetParamNormalized(32766)), std::pair(std::u16string(u"Mine"), 1.0));
+    IUnitInfo* units = Query<IUnitInfo>(instance.component);
+    ProgramListInfo list{};
+    ASSERT_EQ(units->GetProgramListInfo(0, list), kResultOk);
+    EXPECT_EQ(list.programCount, factory + 1);
+    units->Release();
+    instance.Stop();
+  }
 }
 
 TEST(VST3Adapter, AnInstrumentHas2080ControllersAnEffect130And10267IsController7OnChannel3) {

@@ -4,14 +4,13 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <cstdlib>
-#include <optional>
 #include <cmath>
 #include <set>
 #include <string>
 
 #include "kernel/KCatalogue.h"
 #include "plugins/KPluginEditors.h"
+#include "tests/core/UserDataFolder.h"
 #include "tests/ui/DrawerTestSupport.h"
 #include "tests/ui/EditorTestSupport.h"
 #include "ui/KHelpTexts.h"
@@ -22,7 +21,6 @@
 #include "ui/editor/KHelpPanel.h"
 #include "plugins/compressor/KCompressorPlugin.h"
 #include "plugins/utility/KUtilityPlugin.h"
-#include "kernel/platform/KPlatform.h"
 
 namespace {
 
@@ -171,10 +169,7 @@ TEST(PluginEditor, CtrlZAndCtrlYUndoAndRedoAndTellTheHostWhatMoved) {
 // user's under theirs, the current one highlighted; a heading is never chosen, the keys step over
 // it, and a factory preset loads and tells the host what moved but offers no renaming or deleting.
 TEST(PluginEditor, ThePresetMenuOffersTheFactoryPresetsUnderTheirOwnHeading) {
-  std::optional<std::string> saved;  // the user's presets go to a fresh folder
-  if (const char* old = std::getenv("XDG_DATA_HOME")) saved = old;
-  const std::string folder = KPlatform::CreateTemporaryFolder();
-  setenv("XDG_DATA_HOME", folder.c_str(), 1);
+  const KUserDataFolder data;  // the user's presets go to a fresh folder
   {
     const std::unique_ptr<KAudioPlugin> plugin = KMakeCataloguePlugin("KUtilityPlugin");
     ASSERT_EQ(plugin->FactoryPresetCount(), 3);
@@ -224,8 +219,6 @@ TEST(PluginEditor, ThePresetMenuOffersTheFactoryPresetsUnderTheirOwnHeading) {
     editor->Tree().Key({kKeyReturn, 0});
     EXPECT_EQ(std::pair(plugin->ActivePresetName().ToUtf8(), plugin->IsActivePresetFactory()), std::pair(std::string("Mine"), false));
   }
-  saved ? setenv("XDG_DATA_HOME", saved->c_str(), 1) : unsetenv("XDG_DATA_HOME");
-  KPlatform::RemoveFolderTree(folder);
 }
 
 TEST(PluginEditor, AHostThatRefusesASizeKeepsTheEditorAsItWas) {

@@ -75,16 +75,24 @@ void BM_ConvolverVersusDirect(benchmark::State& state) {
 BENCHMARK(BM_ConvolverVersusDirect)->Arg(64)->Arg(256)->UseManualTime();
 
 // A two-second stereo response at 64-sample blocks, two channels each with its own response.
-void BM_ConvolverStereoTwoSeconds(benchmark::State& state) {
-  const std::vector<float> left = Room(2.0, 2), right = Room(2.0, 3);
+struct StereoRoom {
+  StereoRoom() {
+    convolvers[0].Load(left);
+    convolvers[1].Load(right);
+  }
+  void Process(int64_t block) {
+    for (int32_t c = 0; c < 2; ++c) convolvers[c].Process(signal.In(c, block), signal.out[static_cast<size_t>(c)].data(), kBlock);
+  }
+  std::vector<float> left = Room(2.0, 2), right = Room(2.0, 3);
   KConvolver convolvers[2];
-  convolvers[0].Load(left);
-  convolvers[1].Load(right);
-  Signal signal(2);
+  Signal signal{2};
+};
+
+void BM_ConvolverStereoTwoSeconds(benchmark::State& state) {
+  StereoRoom room;
   int64_t block = 0;
   for (auto _ : state) {
-    for (int32_t c = 0; c < 2; ++c) convolvers[c].Process(signal.In(c, block), signal.out[static_cast<size_t>(c)].data(), kBlock);
-    ++block;
+    room.Process(block++);
     benchmark::ClobberMemory();
   }
   KCountPerSampleChannel(state, 2 * kBlock);
@@ -104,18 +112,14 @@ double ThreadSeconds() {
 // dearest place ("block_max") against the mean of the places ("block_mean"). A level that does
 // all its work in one block makes that place dear; spread work evens the places out.
 void BM_ConvolverBlockCost(benchmark::State& state) {
-  const std::vector<float> left = Room(2.0, 2), right = Room(2.0, 3);
-  KConvolver convolvers[2];
-  convolvers[0].Load(left);
-  convolvers[1].Load(right);
-  Signal signal(2);
+  StereoRoom room;
   constexpr int32_t kPlaces = KConvolver::kLargestBlock / 2 / kBlock;
   std::vector<std::vector<double>> costs(kPlaces);
   for (auto& place : costs) place.reserve(static_cast<size_t>(state.max_iterations / kPlaces + 1));
   int64_t block = 0;
   for (auto _ : state) {
     const double start = ThreadSeconds();
-    for (int32_t c = 0; c < 2; ++c) convolvers[c].Process(signal.In(c, block), signal.out[static_cast<size_t>(c)].data(), kBlock);
+    room.Process(block);
     benchmark::ClobberMemory();
     costs[static_cast<size_t>(block++ % kPlaces)].push_back(ThreadSeconds() - start);
   }
@@ -148,7 +152,8 @@ size_t Busy(const std::vector<int>& ids, bool gone = false) {
     if (std::find(now.begin(), now.end(), id) == now.end()) return false;
     if (gone) return true;
     std::ifstream stat("/proc/self/task/" + std::to_string(id) + "/stat");
-    const std::string text((std::istreambuf_iterator<char>(stat)), {});
+    std::string text;
+    std::getline(stat, text);
     const size_t name = text.rfind(')');  // the state follows the parenthesised name
     return name == std::string::npos || name + 2 >= text.size() || text[name + 2] != 'S';
   }));
@@ -166,10 +171,9 @@ size_t Busy(const std::vector<int>& ids, bool gone = false) {
 // benchmark's first, one-iteration run is, or the machine is busy. So nothing is processed before
 // every thread it started is asleep on its semaphore, and nothing is freed before they are gone.
 void BM_ConvolverVersusZita(benchmark::State& state) {
-  std::vector<float> left = Room(2.0, 2), right = Room(2.0, 3);
-  KConvolver convolvers[2];
-  convolvers[0].Load(left);
-  convolvers[1].Load(right);
+  StereoRoom room;
+  std::vector<float>& left = room.left;
+  std::vector<float>& right = room.right;
   Convproc zita;
   const std::vector<int> before = Threads();
   if (zita.configure(2, 2, static_cast<uint32_t>(left.size()), kBlock, Convproc::MINPART, Convproc::MAXPART, 0.0f) != 0 ||
@@ -182,12 +186,9 @@ void BM_ConvolverVersusZita(benchmark::State& state) {
   for (int id : Threads())
     if (std::find(before.begin(), before.end(), id) == before.end()) started.push_back(id);
   while (Busy(started) > 0) std::this_thread::sleep_for(std::chrono::milliseconds(1));
-  Signal signal(2);
+  Signal& signal = room.signal;
   KTimePair(
-      state, 2 * kBlock,
-      [&](int64_t block) {
-        for (int32_t c = 0; c < 2; ++c) convolvers[c].Process(signal.In(c, block), signal.out[static_cast<size_t>(c)].data(), kBlock);
-      },
+      state, 2 * kBlock, [&](int64_t block) { room.Process(block); },
       [&](int64_t block) {
         for (uint32_t c = 0; c < 2; ++c) std::copy_n(signal.In(static_cast<int32_t>(c), block), kBlock, zita.inpdata(c));
         zita.process(true);

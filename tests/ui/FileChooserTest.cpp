@@ -13,6 +13,7 @@
 #include "kernel/platform/KPlatform.h"
 #include "plugins/KPluginEditors.h"
 #include "plugins/convolutionreverb/KConvolutionReverbPlugin.h"
+#include "tests/ui/DrawerTestSupport.h"
 #include "tests/ui/EditorTestSupport.h"
 #include "ui/controls/KButtons.h"
 #include "ui/controls/KFileChooser.h"
@@ -110,6 +111,7 @@ TEST_F(ImpulseFileChoice, ListsFoldersAndSoundFilesNavigatesAndLoadsTheChosenFil
   Key(kKeyBackspace);
   EXPECT_EQ(chooser->Folder(), folder_);
   EXPECT_EQ(Names(*chooser), (std::vector<std::string>{"../", "Rooms/", "Plate.FLAC", "hall.wav"}));
+  KPlatform::WriteFileAtomically(KPicturePath("file-chooser.png"), editor_->Render().EncodePNG());
   // A double click opens a folder; ".." comes back.
   const KPoint rooms = KCentreOf(chooser->RowArea(IndexOf(*chooser, "Rooms")));
   Click(rooms, 2000);

@@ -23,8 +23,9 @@ void KCycleGraph::Paint(KDrawer& drawer, const KStyle& style) {
   const KRect p = Plot();
   for (const Mark& mark : axes_.marks) {
     const int32_t y = static_cast<int32_t>(std::lround(ToPixel(0, mark.value).y));
+    // At the right, clear of the marker, which starts its cycles at the left.
     drawer.AlignedTextOut({p.left + 4, y - 14, p.right - 4, y - 1}, KString::Static(mark.text), style.LabelFont(),
-                          style.Get(KStyle::kTextDim), kAlignLeft | kAlignBottom, 255, kDrawBlend);
+                          style.Get(KStyle::kTextDim), kAlignRight | kAlignBottom, 255, kDrawBlend);
   }
   // Where the LFO is now: a line across the plot and a dot on the curve.
   painted_ = Marker();

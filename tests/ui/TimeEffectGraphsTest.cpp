@@ -32,11 +32,19 @@ Graph& FindGraph(KEditor& editor) {
   return *graph;
 }
 
-// A plug-in as a host gets it from the catalogue (which names it, so that its editor is its own).
-template <class P>
-std::unique_ptr<P> Make(const char* key) {
-  return std::unique_ptr<P>(static_cast<P*>(KMakeCataloguePlugin(key).release()));
-}
+// A plug-in as a host gets it from the catalogue (which names it, so that its editor is its
+// own), at 48 kHz, with its editor open and the editor's graph of type Graph.
+template <class P, class Graph>
+struct Opened {
+  explicit Opened(const char* key) : plugin(static_cast<P*>(KMakeCataloguePlugin(key).release())) {
+    EXPECT_TRUE(plugin->SetSampleRate(48000.0));
+    editor = KMakePluginEditor(*plugin, nullptr);
+    graph = &FindGraph<Graph>(*editor);
+  }
+  std::unique_ptr<P> plugin;
+  std::unique_ptr<KEditor> editor;
+  Graph* graph;
+};
 
 // The x of a value on a graph's linear axis from 0 to `right`, as the plot lays it out (with a
 // little room before zero).
@@ -62,14 +70,14 @@ void Play(KAudioPlugin& plugin, size_t samples) { Render(plugin, Channels(2, std
 }  // namespace
 
 TEST(TimeEffectGraphs, DelayTapsStandAtTheDelayTimeAndFallByTheFeedback) {
-  const auto owned_delay = Make<KDelayPlugin>("KDelayPlugin");
-  KDelayPlugin& delay = *owned_delay;
-  const std::unique_ptr<KEditor> editor = KMakePluginEditor(delay, nullptr);
-  KTimeGraph& graph = FindGraph<KTimeGraph>(*editor);
+  Opened<KDelayPlugin, KTimeGraph> opened_delay("KDelayPlugin");
+  KDelayPlugin& delay = *opened_delay.plugin;
+  KEditor& editor = *opened_delay.editor;
+  KTimeGraph& graph = *opened_delay.graph;
   delay.GetParameter(KDelayPlugin::kTime).SetWorking(0.25);
   delay.GetParameter(KDelayPlugin::kFeedback).SetWorking(50.0);
   delay.GetParameter(KDelayPlugin::kMix).SetWorking(50.0);
-  Follow(*editor, graph);
+  Follow(editor, graph);
   // Five repeats of 250 ms need 1.25 s: the axis rounds up to 2 s.
   ASSERT_DOUBLE_EQ(graph.Span(), 2.0);
   const std::vector<KTimeGraph::Tap>& taps = graph.Taps();
@@ -89,7 +97,7 @@ TEST(TimeEffectGraphs, DelayTapsStandAtTheDelayTimeAndFallByTheFeedback) {
   // Synced to a quarter note at the tempo a host without one is taken to play (120 BPM): 500 ms.
   delay.GetParameter(KDelayPlugin::kSync).SetWorking(kNoteValueQuarter + 1);
   delay.GetParameter(KDelayPlugin::kPingPong).SetWorking(1.0);
-  Follow(*editor, graph);
+  Follow(editor, graph);
   ASSERT_DOUBLE_EQ(graph.Span(), 2.5);
   ASSERT_GE(graph.Taps().size(), 3u);
   EXPECT_NEAR(graph.TapTop(graph.Taps()[1]).x, XOf(graph, 0.5, 2.5), 0.01);
@@ -98,25 +106,24 @@ TEST(TimeEffectGraphs, DelayTapsStandAtTheDelayTimeAndFallByTheFeedback) {
 
   // No feedback: one echo; all dry: none at all.
   delay.GetParameter(KDelayPlugin::kFeedback).SetWorking(0.0);
-  Follow(*editor, graph);
+  Follow(editor, graph);
   EXPECT_EQ(graph.Taps().size(), 2u);
   delay.GetParameter(KDelayPlugin::kMix).SetWorking(0.0);
-  Follow(*editor, graph);
+  Follow(editor, graph);
   ASSERT_EQ(graph.Taps().size(), 1u);
   EXPECT_NEAR(graph.Taps()[0].decibels, 0.0, 1e-9);
-  Follow(*editor, graph, false);  // nothing moved: nothing to repaint
+  Follow(editor, graph, false);  // nothing moved: nothing to repaint
 }
 
 TEST(TimeEffectGraphs, ReverbTailStartsAfterThePreDelayAndFallsSixtyDecibelsInTheDecay) {
-  const auto owned_reverb = Make<KReverbPlugin>("KReverbPlugin");
-  KReverbPlugin& reverb = *owned_reverb;
-  ASSERT_TRUE(reverb.SetSampleRate(48000.0));
-  const std::unique_ptr<KEditor> editor = KMakePluginEditor(reverb, nullptr);
-  KTimeGraph& graph = FindGraph<KTimeGraph>(*editor);
+  Opened<KReverbPlugin, KTimeGraph> opened_reverb("KReverbPlugin");
+  KReverbPlugin& reverb = *opened_reverb.plugin;
+  KEditor& editor = *opened_reverb.editor;
+  KTimeGraph& graph = *opened_reverb.graph;
   reverb.GetParameter(KReverbPlugin::kPreDelay).SetWorking(0.1);
   reverb.GetParameter(KReverbPlugin::kDecay).SetWorking(2.0);
   reverb.GetParameter(KReverbPlugin::kDamping).SetWorking(0.0);
-  Follow(*editor, graph);
+  Follow(editor, graph);
   ASSERT_DOUBLE_EQ(graph.Span(), 2.5);
   const std::vector<double>& curve = graph.Curve();
   const double decay = reverb.GetParameter(KReverbPlugin::kDecay).Working();
@@ -133,22 +140,21 @@ TEST(TimeEffectGraphs, ReverbTailStartsAfterThePreDelayAndFallsSixtyDecibelsInTh
   EXPECT_LT(reverb.DecaySeconds(4000.0), 0.8 * decay);
   EXPECT_LT(reverb.DecaySeconds(8000.0), reverb.DecaySeconds(4000.0));
   EXPECT_GT(reverb.DecaySeconds(100.0), 0.95 * decay);
-  Follow(*editor, graph);  // the caption names the shorter decay of the highs
+  Follow(editor, graph);  // the caption names the shorter decay of the highs
 }
 
 TEST(TimeEffectGraphs, ModulationCurvesMoveWithDepthAndTheMarkerFollowsTheLFO) {
-  const auto owned_tremolo = Make<KTremoloPlugin>("KTremoloPlugin");
-  KTremoloPlugin& tremolo = *owned_tremolo;
-  ASSERT_TRUE(tremolo.SetSampleRate(48000.0));
-  const std::unique_ptr<KEditor> editor = KMakePluginEditor(tremolo, nullptr);
-  KCycleGraph& graph = FindGraph<KCycleGraph>(*editor);
+  Opened<KTremoloPlugin, KCycleGraph> opened_tremolo("KTremoloPlugin");
+  KTremoloPlugin& tremolo = *opened_tremolo.plugin;
+  KEditor& editor = *opened_tremolo.editor;
+  KCycleGraph& graph = *opened_tremolo.graph;
   tremolo.GetParameter(KTremoloPlugin::kDepth).SetWorking(50.0);
   tremolo.GetParameter(KTremoloPlugin::kLFO.rate).SetWorking(1.0);
-  Follow(*editor, graph);
+  Follow(editor, graph);
   EXPECT_NEAR(Lowest(graph.Curve()), 50.0, 0.1);
   EXPECT_NEAR(Highest(graph.Curve()), 100.0, 0.1);
   tremolo.GetParameter(KTremoloPlugin::kDepth).SetWorking(100.0);
-  Follow(*editor, graph);
+  Follow(editor, graph);
   EXPECT_NEAR(Lowest(graph.Curve()), 0.0, 0.1);
 
   // A quarter of a one-hertz cycle later the marker stands at a quarter of the first cycle, on
@@ -157,47 +163,46 @@ TEST(TimeEffectGraphs, ModulationCurvesMoveWithDepthAndTheMarkerFollowsTheLFO) {
   EXPECT_NEAR(before.x, XOf(graph, 0.0, KCycleGraph::kCycles), 1e-6);
   Play(tremolo, 12000);
   EXPECT_NEAR(tremolo.LFOPhase(), 0.25, 1e-6);
-  Follow(*editor, graph);
+  Follow(editor, graph);
   EXPECT_NEAR(graph.Marker().x, XOf(graph, 0.25, KCycleGraph::kCycles), 0.01);
   EXPECT_LT(graph.Marker().y, before.y);  // higher on the screen: full level
 
   // The chorus' first voice sweeps from its delay over its depth, in milliseconds.
-  const auto owned_chorus = Make<KChorusPlugin>("KChorusPlugin");
-  KChorusPlugin& chorus = *owned_chorus;
-  const std::unique_ptr<KEditor> chorusEditor = KMakePluginEditor(chorus, nullptr);
-  KCycleGraph& sweep = FindGraph<KCycleGraph>(*chorusEditor);
+  Opened<KChorusPlugin, KCycleGraph> opened_chorus("KChorusPlugin");
+  KChorusPlugin& chorus = *opened_chorus.plugin;
+  KEditor& chorusEditor = *opened_chorus.editor;
+  KCycleGraph& sweep = *opened_chorus.graph;
   chorus.GetParameter(KChorusPlugin::kDelay).SetWorking(0.015);
   chorus.GetParameter(KChorusPlugin::kDepth).SetWorking(0.003);
-  Follow(*chorusEditor, sweep);
+  Follow(chorusEditor, sweep);
   EXPECT_NEAR(Lowest(sweep.Curve()), 15.0, 0.01);
   EXPECT_NEAR(Highest(sweep.Curve()), 18.0, 0.01);
   chorus.GetParameter(KChorusPlugin::kDepth).SetWorking(0.008);
-  Follow(*chorusEditor, sweep);
+  Follow(chorusEditor, sweep);
   EXPECT_NEAR(Highest(sweep.Curve()), 23.0, 0.01);
 
   // The phaser's corner sweeps evenly in octaves between its limits.
-  const auto owned_phaser = Make<KPhaserPlugin>("KPhaserPlugin");
-  KPhaserPlugin& phaser = *owned_phaser;
-  const std::unique_ptr<KEditor> phaserEditor = KMakePluginEditor(phaser, nullptr);
-  KCycleGraph& corner = FindGraph<KCycleGraph>(*phaserEditor);
+  Opened<KPhaserPlugin, KCycleGraph> opened_phaser("KPhaserPlugin");
+  KPhaserPlugin& phaser = *opened_phaser.plugin;
+  KEditor& phaserEditor = *opened_phaser.editor;
+  KCycleGraph& corner = *opened_phaser.graph;
   phaser.GetParameter(KPhaserPlugin::kLow).SetWorking(200.0);
   phaser.GetParameter(KPhaserPlugin::kHigh).SetWorking(3200.0);
-  Follow(*phaserEditor, corner);
+  Follow(phaserEditor, corner);
   EXPECT_NEAR(std::exp2(Lowest(corner.Curve())), 200.0, 0.5);
   EXPECT_NEAR(std::exp2(Highest(corner.Curve())), 3200.0, 5.0);
 }
 
 TEST(TimeEffectGraphs, AutoFilterResponseSweepsWithItsLFO) {
-  const auto owned_filter = Make<KAutoFilterPlugin>("KAutoFilterPlugin");
-  KAutoFilterPlugin& filter = *owned_filter;
-  ASSERT_TRUE(filter.SetSampleRate(48000.0));
-  const std::unique_ptr<KEditor> editor = KMakePluginEditor(filter, nullptr);
-  KCycleGraph& cutoff = FindGraph<KCycleGraph>(*editor);
-  KMeasurementGraph& response = FindGraph<KMeasurementGraph>(*editor);
+  Opened<KAutoFilterPlugin, KCycleGraph> opened_filter("KAutoFilterPlugin");
+  KAutoFilterPlugin& filter = *opened_filter.plugin;
+  KEditor& editor = *opened_filter.editor;
+  KCycleGraph& cutoff = *opened_filter.graph;
+  KMeasurementGraph& response = FindGraph<KMeasurementGraph>(editor);
   filter.GetParameter(KAutoFilterPlugin::kCutoff).SetWorking(800.0);
   filter.GetParameter(KAutoFilterPlugin::kDepth).SetWorking(2.0);
   filter.GetParameter(KAutoFilterPlugin::kLFO.rate).SetWorking(1.0);
-  Follow(*editor, cutoff);
+  Follow(editor, cutoff);
   EXPECT_NEAR(std::exp2(Highest(cutoff.Curve())), 3200.0, 5.0);
   EXPECT_NEAR(std::exp2(Lowest(cutoff.Curve())), 200.0, 0.5);
 
@@ -210,6 +215,6 @@ TEST(TimeEffectGraphs, AutoFilterResponseSweepsWithItsLFO) {
   const double closed = at2k();
   EXPECT_LT(closed, -12.0);
   Play(filter, 12000);
-  Follow(*editor, response);
+  Follow(editor, response);
   EXPECT_GT(at2k(), closed + 12.0);
 }

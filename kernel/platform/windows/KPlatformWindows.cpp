@@ -172,11 +172,19 @@ bool KPlatform::OpenTraceDestination() noexcept {
   return true;
 }
 
-std::string KPlatform::UserDataHome() {
+namespace {
+// A shell folder's path as the system gives it, or empty when it has none.
+std::string KnownFolder(REFKNOWNFOLDERID id) {
   wchar_t* folder = nullptr;
-  const HRESULT result = ::SHGetKnownFolderPath(FOLDERID_RoamingAppData, KF_FLAG_DEFAULT, nullptr, &folder);
-  std::string home = SUCCEEDED(result) && folder ? Narrow(folder, static_cast<int>(std::wcslen(folder))) : std::string();
+  const HRESULT result = ::SHGetKnownFolderPath(id, KF_FLAG_DEFAULT, nullptr, &folder);
+  std::string path = SUCCEEDED(result) && folder ? KPlatform::Narrow(folder, static_cast<int>(std::wcslen(folder))) : std::string();
   ::CoTaskMemFree(folder);
+  return path;
+}
+}  // namespace
+
+std::string KPlatform::UserDataHome() {
+  std::string home = KnownFolder(FOLDERID_RoamingAppData);
   if (home.empty()) throw KException("Could not find the user's data folder: the roaming application data folder is unknown.");
   while (home.size() > 3 && (home.back() == '\\' || home.back() == '/')) home.pop_back();
   return home.back() == '\\' ? home : home + "\\";
@@ -312,10 +320,7 @@ std::string KPlatform::AsFolder(const std::string& path) {
 }
 
 std::string KPlatform::HomeFolder() {
-  wchar_t* folder = nullptr;
-  const HRESULT result = ::SHGetKnownFolderPath(FOLDERID_Profile, KF_FLAG_DEFAULT, nullptr, &folder);
-  std::string home = SUCCEEDED(result) && folder ? Narrow(folder, static_cast<int>(std::wcslen(folder))) : std::string();
-  ::CoTaskMemFree(folder);
+  const std::string home = KnownFolder(FOLDERID_Profile);
   if (home.empty()) throw KException("Could not find the user's home folder.");
   return home.back() == '\\' ? home : home + "\\";
 }

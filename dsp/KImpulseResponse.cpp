@@ -3,6 +3,7 @@
 #include <samplerate.h>
 #include <sndfile.h>
 
+#include <algorithm>
 #include <cmath>
 #include <memory>
 
@@ -56,4 +57,18 @@ KImpulseResponse KResampleImpulseResponse(const KImpulseResponse& response, doub
     out.channels.push_back(std::move(resampled));
   }
   return out;
+}
+
+std::vector<double> KImpulseEnvelope(const KImpulseResponse& response, int32_t slices) {
+  std::vector<double> peaks(static_cast<size_t>(std::max(slices, 0)), 0.0);
+  const int64_t length = response.Length();
+  if (peaks.empty() || length == 0) return std::vector<double>(peaks.size(), -180.0);
+  for (const std::vector<float>& channel : response.channels)
+    for (int64_t i = 0; i < std::min<int64_t>(length, static_cast<int64_t>(channel.size())); ++i) {
+      double& peak = peaks[static_cast<size_t>(i * slices / length)];
+      peak = std::max(peak, static_cast<double>(std::fabs(channel[static_cast<size_t>(i)])));
+    }
+  const double loudest = *std::max_element(peaks.begin(), peaks.end());
+  for (double& peak : peaks) peak = peak > 0.0 && loudest > 0.0 ? std::max(20.0 * std::log10(peak / loudest), -180.0) : -180.0;
+  return peaks;
 }

@@ -22,6 +22,10 @@ struct KImpulseResponse {
 // file, when it cannot be read, holds no samples or is too long.
 KImpulseResponse KReadImpulseResponse(const KString& path, double sampleRate);
 
+// The response's envelope for pictures: the peak over every channel in each of `slices` even
+// slices of its length, in dB below the loudest slice's (0 there; −180 for a silent slice).
+std::vector<double> KImpulseEnvelope(const KImpulseResponse& response, int32_t slices);
+
 // The same response at another rate (band-limited sinc interpolation from libsamplerate), its
 // energy per second kept, so that a reverb sounds equally loud at any rate.
 KImpulseResponse KResampleImpulseResponse(const KImpulseResponse& response, double sampleRate);

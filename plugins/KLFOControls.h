@@ -1,6 +1,7 @@
 #pragma once
 
 #include <array>
+#include <atomic>
 #include <cstdint>
 
 #include "core/KAudioPlugin.h"
@@ -51,7 +52,12 @@ public:
   // Back to the start of the cycle, the channels their set distance apart.
   void Reset() noexcept;
   // The next n values of channel c's LFO, in [-1, 1].
-  void Fill(int32_t c, double* values, int32_t n) noexcept { lfos_[c].Fill(values, n); }
+  void Fill(int32_t c, double* values, int32_t n) noexcept {
+    lfos_[c].Fill(values, n);
+    if (c == 0) shownPhase_.store(lfos_[0].Phase(), std::memory_order_relaxed);
+  }
+  // Where the first channel's cycle stood after the latest Fill, for the editors (any thread).
+  double ShownPhase() const noexcept { return shownPhase_.load(std::memory_order_relaxed); }
   // One cycle of the shape in use, for the editors' pictures.
   static double Picture(const KAudioPlugin& plugin, const KLFOControls& controls, double phase) noexcept;
 
@@ -61,4 +67,5 @@ private:
   KLFO lfos_[kChannels];
   KLFOSettings settings_;
   double offset_ = 0.0;  // cycles the second channel runs behind
+  std::atomic<double> shownPhase_{0.0};
 };

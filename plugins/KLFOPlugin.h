@@ -16,6 +16,10 @@ public:
   KLFOPlugin(std::span<const KParameterInfo> parameters, const KLFOControls& controls)
       : KAudioPlugin(parameters, kEffectShape), controls_(controls) {}
 
+  const KLFOControls& LFOControls() const noexcept { return controls_; }
+  // Where the LFO's cycle stands (in cycles, 0..1) as the audio thread last left it.
+  double LFOPhase() const noexcept { return lfos_.ShownPhase(); }
+
 protected:
   // The effect's own work: its settings (`jump`: land at once, no glide), its audio, its state.
   virtual void UpdateEffect(bool jump) noexcept = 0;

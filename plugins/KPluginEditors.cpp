@@ -64,9 +64,10 @@ KString KPluginEditorHelp(KAudioPlugin& plugin, const KString& key) {
     KString markup(KHelpTexts::Section(KString::FromUtf8(help->title)));
     return markup.Append(KString::FromUtf8(help->overview)).Append(KString("<p>")).Append(KString::Static(KHelpTexts::kF1Hint));
   }
-  const KAudioPluginBase::Parameter* parameter = plugin.FindParameter(key);
-  if (!parameter) return {};
-  return KPluginHelpPage(plugin).ControlHelp(parameter->Index());
+  if (const KAudioPluginBase::Parameter* parameter = plugin.FindParameter(key)) return KPluginHelpPage(plugin).ControlHelp(parameter->Index());
+  for (const KButtonHelp& button : help->buttons)
+    if (key.ToUtf8() == button.key) return KHelpTexts::ControlHelp(KString::FromUtf8(button.text), KHelpTexts::ButtonActions());
+  return {};
 }
 
 std::unique_ptr<KEditor> KMakePluginEditor(KAudioPlugin& plugin, KEditorHost* host, KStyle style) {

@@ -5,6 +5,7 @@
 
 #include "core/KAudioPlugin.h"
 #include "kernel/KExport.h"
+#include "ui/controls/KCycleGraph.h"
 #include "ui/controls/KStyle.h"
 #include "ui/editor/KEditor.h"
 #include "ui/editor/KEditorDescription.h"
@@ -23,9 +24,13 @@ TORVANE_API std::string KPluginEditorSnapshotPNG(KAudioPlugin& plugin, double sc
 // overview for an empty key; empty when none is written.
 KString KPluginEditorHelp(KAudioPlugin& plugin, const KString& key);
 
-struct KLFOControls;
-// A graph of one cycle of an LFO-driven plug-in's wave, for its editor description.
-KEditorDescription::GraphFactory KLFOGraph(const KLFOControls& controls);
+// What an LFO-driven plug-in's LFO means at a value in [-1, 1], in the units of its graph.
+using KLFOMeaning = double (*)(const KAudioPlugin& plugin, double lfo);
+// A graph of two cycles of what the LFO moves, for an editor description of a plug-in built on
+// KLFOPlugin, with its help under `helpKey`.
+KEditorDescription::GraphFactory KLFOGraph(KCycleGraph::Axes axes, KLFOMeaning meaning, const char* helpKey);
+// The axes of a frequency swept by an LFO, as log2 of hertz over the audible range.
+KCycleGraph::Axes KFrequencyCycleAxes();
 
 // Each plug-in's own editor description.
 KEditorDescription KUtilityEditor();

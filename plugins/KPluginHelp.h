@@ -15,12 +15,21 @@ struct KParameterHelp {
   const char* text;
 };
 
-// A plug-in's help: what it is for, then every parameter. Texts are UTF-8.
+// The help of an editor control that is no parameter (a button), by its help key.
+struct KButtonHelp {
+  const char* key;
+  const char* title;
+  const char* text;
+};
+
+// A plug-in's help: what it is for, then every parameter, then its editor's own buttons.
+// Texts are UTF-8.
 struct KPluginHelp {
   const char* plugin;  // registry key
   const char* title;
   const char* overview;
   std::span<const KParameterHelp> parameters;
+  std::span<const KButtonHelp> buttons = {};
 
   // The entry for a parameter key, or null; `number` receives what a "#" matched (else 0).
   TORVANE_API const KParameterHelp* Find(std::string_view key, int32_t& number) const noexcept;

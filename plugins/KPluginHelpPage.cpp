@@ -54,6 +54,8 @@ KString KPluginHelpPage::Markup() const {
     const KString text = ParameterText(i);
     markup.Append(text.IsEmpty() ? KString::Static(KHelpTexts::kNoHelp) : text).Append(KString("<p>"));
   }
+  for (const KButtonHelp& button : help_.buttons)
+    markup.Append(KHelpTexts::Section(KString::FromUtf8(button.title))).Append(KString("<p>")).Append(KString::FromUtf8(button.text)).Append(KString("<p>"));
   return markup;
 }
 
@@ -70,6 +72,10 @@ std::string KPluginHelpPage::Html() const {
     page.Heading(2, plugin_.GetParameter(i).Name());
     const KString text = ParameterText(i);
     page.Document(KRenderHelpMarkup(text.IsEmpty() ? KString::Static(KHelpTexts::kNoHelp) : text));
+  }
+  for (const KButtonHelp& button : help_.buttons) {
+    page.Heading(2, KString::FromUtf8(button.title));
+    page.Document(KRenderHelpMarkup(KString::FromUtf8(button.text)));
   }
   return page.Finish();
 }

@@ -13,9 +13,11 @@ constexpr const char* kSwitchActions[] = {
     "Click to step to the next setting; right-click lists them all.",
     "Ctrl+click to return to the default setting.",
 };
+constexpr const char* kButtonActions[] = {"Click to run it."};
 }  // namespace
 
 std::span<const char* const> KHelpTexts::KnobActions() noexcept { return kKnobActions; }
+std::span<const char* const> KHelpTexts::ButtonActions() noexcept { return kButtonActions; }
 std::span<const char* const> KHelpTexts::SwitchActions() noexcept { return kSwitchActions; }
 
 const KString& KHelpTexts::SemanticTagSets() {

@@ -17,9 +17,10 @@ struct TORVANE_API KHelpTexts {
       "Move mouse cursor on a control and press F1 to get detailed info about it. If the F1 key is captured by another "
       "application, try using Ctrl+F1 or Ctrl+H.";
 
-  // What the mouse and keys do on a knob or slider, and on a switch or list.
+  // What the mouse and keys do on a knob or slider, on a switch or list, and on a button.
   static std::span<const char* const> KnobActions() noexcept;
   static std::span<const char* const> SwitchActions() noexcept;
+  static std::span<const char* const> ButtonActions() noexcept;
 
   // The tag sets of the semantic tags, in the colours of the HTML export; render them first.
   static const KString& SemanticTagSets();

@@ -85,6 +85,20 @@ TORVANE_API bool RemoveFile(const std::string& path);
 // by byte value; a missing folder holds none. "Could not list the folder '{0}' ({1})."
 std::vector<std::string> ListFiles(const std::string& folder);
 
+// Names of the folders in the folder (hidden ones included), sorted by byte value; a missing
+// folder holds none. "Could not list the folder '{0}' ({1})."
+std::vector<std::string> ListFolders(const std::string& folder);
+
+// The folder that holds a file or a folder, ending in the separator; a root holds itself.
+std::string ParentFolder(const std::string& path);
+
+// A folder's path as the functions here take it: ending in the separator.
+std::string AsFolder(const std::string& path);
+
+// The user's home folder ($HOME; on Windows the profile folder), ending in the separator.
+// "Could not find the user's home folder."
+std::string HomeFolder();
+
 // A new, empty folder of the caller's own under the system's temporary folder.
 // "Could not create a temporary folder in '{0}' ({1})."
 std::string CreateTemporaryFolder();

@@ -20,6 +20,21 @@ constexpr KParameterHelp kParameters[] = {
      "Tip: a narrower reverb keeps a mono source in the centre of the mix."},
 };
 
+constexpr KButtonHelp kButtons[] = {
+    {"impulsefile", "Load impulse response",
+     "<control>Load impulse response...</control> opens a chooser of WAV and FLAC files: pick a recording of a room, a hall or a "
+     "vintage unit, and it plays instead of the built-in space. The file is read and resampled beside the sound, which goes on "
+     "playing the old space until the new one is ready. Its path is saved with the project.<p>"
+     "Tip: a response with one channel plays on both sides; one with two keeps its stereo image."},
+    {"builtinspace", "Built-in space",
+     "<control>Built-in space</control> forgets the loaded file and goes back to the space chosen under <control>Space</control>."},
+    {"filechooser", "Choosing a file",
+     "The chooser lists the folder named at its top: first <value>..</value>, the way up, then the folders, then the WAV and FLAC "
+     "files. Click an entry to select it; double-click it, or press <shortcut>Return</shortcut>, to open a folder or load a file. "
+     "<shortcut>Backspace</shortcut> goes up a folder, <shortcut>Escape</shortcut> closes the chooser. Click the path to type "
+     "another folder or a file's whole path."},
+};
+
 constexpr KPluginHelp kHelp{
     "KConvolutionReverbPlugin",
     "Convolution reverb",
@@ -27,6 +42,7 @@ constexpr KPluginHelp kHelp{
     "response, its answer to a single click. Load a WAV or FLAC recording of a room, a hall or a vintage unit, or use one of the "
     "built-in spaces. It adds no latency.",
     kParameters,
+    kButtons,
 };
 }  // namespace
 

@@ -123,9 +123,32 @@ std::unique_ptr<KConvolutionReverbPlugin::Space> KConvolutionReverbPlugin::Prepa
   return space;
 }
 
+std::shared_ptr<const KConvolutionReverbPlugin::Envelope> KConvolutionReverbPlugin::EnvelopeOf(const KImpulseResponse& response) {
+  auto envelope = std::make_shared<Envelope>();
+  envelope->seconds = response.Length() / response.sampleRate;
+  envelope->decibels = KImpulseEnvelope(response, kEnvelopeSlices);
+  return envelope;
+}
+
+std::shared_ptr<const KConvolutionReverbPlugin::Envelope> KConvolutionReverbPlugin::PlayingEnvelope() const {
+  std::lock_guard<std::mutex> lock(pathMutex_);
+  if (fileEnvelope_) return fileEnvelope_;
+  const auto index = static_cast<size_t>(GetParameter(kImpulse).Working());
+  return spaceEnvelopes_.empty() ? nullptr : spaceEnvelopes_[std::min(index, spaceEnvelopes_.size() - 1)];
+}
+
 void KConvolutionReverbPlugin::BuildSyntheticSpaces() {
   synthetic_.clear();
-  for (int32_t index = 0; index < kSpaceCount; ++index) synthetic_.push_back(Prepare(SyntheticSpace(index, SampleRate())));
+  std::vector<std::shared_ptr<const Envelope>> envelopes;
+  for (int32_t index = 0; index < kSpaceCount; ++index) {
+    const KImpulseResponse response = SyntheticSpace(index, SampleRate());
+    synthetic_.push_back(Prepare(response));
+    envelopes.push_back(EnvelopeOf(response));
+  }
+  {
+    std::lock_guard<std::mutex> lock(pathMutex_);
+    spaceEnvelopes_ = std::move(envelopes);
+  }
   playing_ = nullptr;
   MarkUpdatePending();
 }
@@ -149,15 +172,17 @@ bool KConvolutionReverbPlugin::SetSampleRate(double sampleRate) {
 
 void KConvolutionReverbPlugin::SetImpulseResponseFile(const KString& path) {
   std::unique_ptr<Space> space;
+  std::shared_ptr<const Envelope> envelope;
   if (!path.IsEmpty()) {
     const KImpulseResponse response = KReadImpulseResponse(path, SampleRate());
     space = Prepare(response);
+    envelope = EnvelopeOf(response);
   }
   {
     std::lock_guard<std::mutex> lock(pathMutex_);
     path_ = path;
   }
-  Publish(std::move(space));
+  Publish(std::move(space), std::move(envelope));
 }
 
 KString KConvolutionReverbPlugin::ImpulseResponseFile() const {
@@ -165,7 +190,11 @@ KString KConvolutionReverbPlugin::ImpulseResponseFile() const {
   return path_;
 }
 
-void KConvolutionReverbPlugin::Publish(std::unique_ptr<Space> file) {
+void KConvolutionReverbPlugin::Publish(std::unique_ptr<Space> file, std::shared_ptr<const Envelope> envelope) {
+  {
+    std::lock_guard<std::mutex> lock(pathMutex_);
+    fileEnvelope_ = std::move(envelope);
+  }
   CollectRetired();
   fileSettle_.store(file ? file->Settle() : -1, std::memory_order_relaxed);
   Space* const offer = file ? file.release() : NoFile();

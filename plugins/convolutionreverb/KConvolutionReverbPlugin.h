@@ -51,6 +51,15 @@ public:
   void SetImpulseResponseFile(const KString& path);
   KString ImpulseResponseFile() const;
 
+  // What plays, for the editor's picture: the envelope of the file's response or else of the
+  // chosen built-in space (kEnvelopeSlices slices, see KImpulseEnvelope), and its length.
+  struct Envelope {
+    double seconds = 0.0;
+    std::vector<double> decibels;
+  };
+  static constexpr int32_t kEnvelopeSlices = 240;
+  std::shared_ptr<const Envelope> PlayingEnvelope() const;
+
   // The built-in space `index` at `sampleRate`: two decorrelated channels.
   static KImpulseResponse SyntheticSpace(int32_t index, double sampleRate);
 
@@ -71,9 +80,11 @@ private:
     int32_t Settle() const noexcept;
   };
   static std::unique_ptr<Space> Prepare(const KImpulseResponse& response);
+  static std::shared_ptr<const Envelope> EnvelopeOf(const KImpulseResponse& response);
   static Space* NoFile() noexcept;
   void BuildSyntheticSpaces();
-  void Publish(std::unique_ptr<Space> file);
+  // Offers the file's space (null: the built-in spaces) with its picture.
+  void Publish(std::unique_ptr<Space> file, std::shared_ptr<const Envelope> envelope = nullptr);
   void CollectRetired() noexcept;
   void TakePublished() noexcept;
 
@@ -88,8 +99,11 @@ private:
   std::vector<float> wet_;               // two sides of one chunk
   double dry_ = 1.0, wetSame_ = 0.0, wetOther_ = 0.0;  // wet: own side and the other side
 
-  mutable std::mutex pathMutex_;  // writers of the path (editor, state load)
+  // The path and the pictures, shared by the editor, state loads and set-up.
+  mutable std::mutex pathMutex_;
   KString path_;
+  std::shared_ptr<const Envelope> fileEnvelope_;                 // null without a file
+  std::vector<std::shared_ptr<const Envelope>> spaceEnvelopes_;  // one per built-in space
 };
 
 extern const KPluginDescription kConvolutionReverbDescription;

@@ -55,6 +55,8 @@ public:
   uint32_t TailSamples() const noexcept override;
   // The delay in seconds the settings ask for at a tempo (BPM).
   double DelaySeconds(double tempo) const noexcept;
+  // The filters every repeat passes once more, at the present settings and rate.
+  void DesignFilters(KFilterSection& lowCut, KFilterSection& highCut) const noexcept;
 
 protected:
   void ProcessUpdate() override;
@@ -67,7 +69,6 @@ private:
   enum GlideLane : int32_t { kDelayGlide, kFeedbackGlide, kWetGlide, kGlides };
 
   void Aim(bool jump) noexcept;
-  void DesignFilters(KFilterSection& lowCut, KFilterSection& highCut) const noexcept;
 
   KDelayLine lines_[kChannels];
   KFilterSection lowCut_, highCut_;

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <complex>
 #include <utility>
 
 #include "core/KParameter.h"
@@ -108,6 +109,18 @@ void KReverbPlugin::ProcessUpdate() {
   targets[kWetGlide] = wet;
   targets[kSideGlide] = wet * width;
   glides_.Aim(targets, static_cast<int32_t>(kGlideSeconds * rate), std::exchange(jump_, false));
+}
+
+double KReverbPlugin::DecaySeconds(double hz) const noexcept {
+  const double rate = SampleRate(), decay = GetParameter(kDecay).Working();
+  double mean = 0.0;
+  for (int32_t j = 0; j < kLines; ++j) mean += LineLength(j) / double(kLines);
+  // The damping filter (1 − p) / (1 − p·z⁻¹) at the frequency, in dB per pass.
+  const double pole = kMostDamping * GetParameter(kDamping).Working() / 100.0;
+  const std::complex<double> z = std::polar(1.0, -2.0 * 3.141592653589793 * std::min(hz, 0.5 * rate) / rate);
+  const double passDb = 20.0 * std::log10(std::abs((1.0 - pole) / (1.0 - pole * z)));
+  const double fallPerSecond = 60.0 / decay - passDb * rate / mean;
+  return 60.0 / fallPerSecond;
 }
 
 // The pre-delay and the diffusers' smear, then the network's fall by 100 dB (a little more

@@ -50,6 +50,9 @@ public:
 
   bool SetSampleRate(double sampleRate) override;
   uint32_t TailSamples() const noexcept override;
+  // The seconds the tail takes to fall by 60 dB at a frequency: the decay setting at the lowest
+  // frequencies, shorter above as the damping takes its share on every pass through a line.
+  double DecaySeconds(double hz) const noexcept;
 
 protected:
   void ProcessUpdate() override;

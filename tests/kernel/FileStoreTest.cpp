@@ -69,3 +69,28 @@ TEST_F(KFileStoreFiles, UserDataFoldersFollowXdgThenHomeAndAreMadeOnDemand) {
   EXPECT_EQ(KModule(KString::FromUtf8("..")).GetDataPath_User(), family + "_../");
   EXPECT_EQ(KModule(KString()).GetDataPath_User(), family + "_/");
 }
+
+TEST_F(KFileStoreFiles, FoldersListApartFromFilesAndPathsClimbToTheRoot) {
+  KPlatform::CreateFolders(folder_ + "b rooms/inner/");
+  KPlatform::CreateFolders(folder_ + "A halls/");
+  KPlatform::CreateFolders(folder_ + ".hidden/");
+  KPlatform::WriteFileAtomically(folder_ + "hall.wav", "RIFF");
+  EXPECT_EQ(KPlatform::ListFolders(folder_), (std::vector<std::string>{".hidden", "A halls", "b rooms"}));
+  EXPECT_EQ(KPlatform::ListFiles(folder_), std::vector<std::string>{"hall.wav"});
+  EXPECT_TRUE(KPlatform::ListFolders(folder_ + "missing/").empty());
+  // A file is no folder to list.
+  EXPECT_EQ(FailureOf([&] { KPlatform::ListFolders(folder_ + "hall.wav"); }).rfind("Could not list the folder '" + folder_ + "hall.wav'", 0), 0u);
+
+  EXPECT_EQ(KPlatform::ParentFolder(folder_ + "b rooms/inner/"), folder_ + "b rooms/");
+  EXPECT_EQ(KPlatform::ParentFolder(folder_ + "b rooms/inner"), folder_ + "b rooms/");
+  EXPECT_EQ(KPlatform::ParentFolder(folder_ + "hall.wav"), folder_);
+  EXPECT_EQ(KPlatform::ParentFolder("/tmp/"), "/");
+  EXPECT_EQ(KPlatform::ParentFolder("/"), "/");
+  EXPECT_EQ(KPlatform::AsFolder(folder_ + "A halls"), folder_ + "A halls/");
+  EXPECT_EQ(KPlatform::AsFolder(folder_), folder_);
+
+  setenv("HOME", (folder_ + "home").c_str(), 1);
+  EXPECT_EQ(KPlatform::HomeFolder(), folder_ + "home/");
+  unsetenv("HOME");
+  EXPECT_EQ(FailureOf([] { KPlatform::HomeFolder(); }), "Could not find the user's home folder.");
+}

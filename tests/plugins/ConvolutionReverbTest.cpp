@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 #include <sndfile.h>
 
+#include <algorithm>
 #include <cmath>
 #include <filesystem>
 #include <numeric>
@@ -152,5 +153,42 @@ TEST(ConvolutionReverb, SwapsSpacesWithoutAllocatingOnTheAudioThread) {
   const Channels hall = Render(*plugin, Channels(2, std::vector<float>(2000, 0.25f)), {512});
   EXPECT_LT(std::abs(hall[0][800]), 1e-6f);
   EXPECT_GT(PeakOf(hall, 1000, 2000), 0.01f);
+  std::filesystem::remove(path);
+}
+
+// The picture of what plays: the loudest of the channels in each slice, in dB below the loudest
+// slice; the built-in space chosen, or the file's response once one is loaded.
+TEST(ConvolutionReverb, EnvelopeShowsThePeaksOfWhatPlays) {
+  KImpulseResponse response;
+  response.sampleRate = 1000.0;
+  response.channels.assign(2, std::vector<float>(1000, 0.0f));
+  response.channels[0][150] = -1.0f;  // slice 1, whichever sign
+  response.channels[1][950] = 0.1f;   // slice 9, 20 dB down
+  response.channels[0][951] = 0.05f;  // quieter in the same slice: the peak counts
+  const std::vector<double> envelope = KImpulseEnvelope(response, 10);
+  ASSERT_EQ(envelope.size(), 10u);
+  EXPECT_DOUBLE_EQ(envelope[1], 0.0);
+  EXPECT_NEAR(envelope[9], -20.0, 1e-6);
+  for (size_t s : {0u, 2u, 5u, 8u}) EXPECT_EQ(envelope[s], -180.0);
+  EXPECT_EQ(KImpulseEnvelope(KImpulseResponse{}, 4), std::vector<double>(4, -180.0));
+
+  const auto plugin = Make(30.0);
+  plugin->GetParameter(R::kImpulse).SetWorking(0);  // Small room: 4 ms gap and 0.5 s
+  ASSERT_NE(plugin->PlayingEnvelope(), nullptr);
+  EXPECT_NEAR(plugin->PlayingEnvelope()->seconds, 0.504, 1e-4);
+  plugin->GetParameter(R::kImpulse).SetWorking(1);  // Hall: 18 ms gap and 2.2 s
+  EXPECT_NEAR(plugin->PlayingEnvelope()->seconds, 2.218, 1e-4);
+  const std::vector<double>& hall = plugin->PlayingEnvelope()->decibels;
+  ASSERT_EQ(hall.size(), size_t(R::kEnvelopeSlices));
+  EXPECT_EQ(hall.front(), -180.0);  // the gap before the first reflection
+  EXPECT_LT(hall.back(), -50.0);    // 60 dB down at the end
+
+  const std::string path = WriteClick(480, 48000);
+  plugin->SetImpulseResponseFile(KString::FromUtf8(path));
+  EXPECT_NEAR(plugin->PlayingEnvelope()->seconds, 680.0 / 48000.0, 1e-9);
+  const std::vector<double>& click = plugin->PlayingEnvelope()->decibels;
+  EXPECT_EQ(std::max_element(click.begin(), click.end()) - click.begin(), 480 * R::kEnvelopeSlices / 680);
+  plugin->SetImpulseResponseFile(KString());
+  EXPECT_NEAR(plugin->PlayingEnvelope()->seconds, 2.218, 1e-4);
   std::filesystem::remove(path);
 }

@@ -26,10 +26,14 @@ void PaintNode(KDrawer& drawer, const KStyle& style, KPointF at, bool active, bo
 
 }  // namespace
 
-std::vector<double> KGraph::Sample() const {
+std::vector<double> KGraph::Sample(const std::function<double(double x)>& value) const {
   std::vector<double> values(kSamples);
-  for (int32_t i = 0; i < kSamples; ++i) values[static_cast<size_t>(i)] = Evaluate(FromFraction(i / double(kSamples - 1)));
+  for (int32_t i = 0; i < kSamples; ++i) values[static_cast<size_t>(i)] = value(FromFraction(i / double(kSamples - 1)));
   return values;
+}
+
+std::vector<double> KGraph::Sample() const {
+  return Sample([this](double x) { return Evaluate(x); });
 }
 
 void KGraph::OnTimer() {
@@ -53,7 +57,7 @@ void KGraph::FromPixel(KPoint at, double& x, double& y) const noexcept {
 }
 
 void KGraph::PaintCurve(KDrawer& drawer, const KStyle& style, const std::vector<double>& xLines,
-                        const std::vector<double>& yLines, double fillTo) {
+                        const std::vector<double>& yLines, double fillTo, const std::function<double(double x)>& under) {
   const KRect& r = Bounds();
   drawer.FillRoundRectangle(r, style.Get(KStyle::kRadius), style.Get(KStyle::kGraphBack), 255, kDrawBlend);
   const KRect p = Plot();
@@ -68,6 +72,10 @@ void KGraph::PaintCurve(KDrawer& drawer, const KStyle& style, const std::vector<
   curve_ = Sample();
   const std::vector<double>& curve = curve_;
   const double previous = drawer.LineWidth();
+  if (under) {
+    drawer.SetLineWidth(1.5);
+    drawer.PaintHorizontalPolyLine(p, Sample(under), Top(), Bottom(), style.Get(KStyle::kTextDim), 255, kDrawBlend);
+  }
   drawer.SetLineWidth(2);
   if (std::isfinite(fillTo))
     drawer.PaintHorizontalGraph(p, curve, Top(), Bottom(), fillTo, style.Get(KStyle::kGraphCurve), style.Get(KStyle::kGraphFill),

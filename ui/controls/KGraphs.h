@@ -13,6 +13,9 @@ class KGraph : public KControl {
 public:
   static constexpr int32_t kSamples = 160;
   static constexpr double kNodeRadius = 6;
+  // Room before zero on axes that start at zero (time, phase), as a share of their length, so
+  // that what happens at zero is not cut by the frame.
+  static constexpr double kLead = 0.02;
 
   explicit KGraph(const KRect& bounds) noexcept : KControl(bounds) {}
   void OnTimer() override;
@@ -36,11 +39,13 @@ protected:
   KPointF ToPixel(double x, double y) const noexcept;
   void FromPixel(KPoint at, double& x, double& y) const noexcept;
   // Face, grid lines at `xLines` and `yLines` (in units), the curve (filled down to `fillTo`
-  // when it is finite) and its outline.
+  // when it is finite) and its outline; `under`, when given, is a dimmer second curve drawn
+  // beneath it (another channel, another band of frequencies).
   void PaintCurve(KDrawer& drawer, const KStyle& style, const std::vector<double>& xLines, const std::vector<double>& yLines,
-                  double fillTo);
+                  double fillTo, const std::function<double(double x)>& under = {});
 
 private:
+  std::vector<double> Sample(const std::function<double(double x)>& value) const;
   std::vector<double> Sample() const;
   std::vector<double> curve_;
 };

@@ -240,18 +240,41 @@ bool KPlatform::RemoveFile(const std::string& path) {
   FailOnPath("Could not remove the file '{0}' ({1}).", path, errno);
 }
 
-std::vector<std::string> KPlatform::ListFiles(const std::string& folder) {
+namespace {
+// The names of the entries in a folder that are folders (or, with `folders` false, regular files).
+std::vector<std::string> ListEntries(const std::string& folder, bool folders) {
   std::vector<std::string> names;
   std::error_code error;
   std::filesystem::directory_iterator entry(folder, error);
   if (error == std::errc::no_such_file_or_directory) return names;
   for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error)) {
-    std::error_code ignored;  // an entry removed while listing is simply not a file any more
-    if (entry->is_regular_file(ignored)) names.push_back(entry->path().filename().string());
+    std::error_code ignored;  // an entry removed while listing is simply neither any more
+    if (folders ? entry->is_directory(ignored) : entry->is_regular_file(ignored)) names.push_back(entry->path().filename().string());
   }
   if (error) FailOnPath("Could not list the folder '{0}' ({1}).", folder, error.value());
   std::sort(names.begin(), names.end());
   return names;
+}
+}  // namespace
+
+std::vector<std::string> KPlatform::ListFiles(const std::string& folder) { return ListEntries(folder, false); }
+
+std::vector<std::string> KPlatform::ListFolders(const std::string& folder) { return ListEntries(folder, true); }
+
+std::string KPlatform::ParentFolder(const std::string& path) {
+  std::string trimmed = path;
+  while (trimmed.size() > 1 && trimmed.back() == '/') trimmed.pop_back();
+  const size_t slash = trimmed.rfind('/');
+  return slash == std::string::npos ? std::string("/") : trimmed.substr(0, slash + 1);
+}
+
+std::string KPlatform::AsFolder(const std::string& path) { return !path.empty() && path.back() == '/' ? path : path + "/"; }
+
+std::string KPlatform::HomeFolder() {
+  const char* home = std::getenv("HOME");
+  if (!home || home[0] != '/') throw KException("Could not find the user's home folder.");
+  std::string folder = home;
+  return folder.back() == '/' ? folder : folder + "/";
 }
 
 std::string KPlatform::CreateTemporaryFolder() {

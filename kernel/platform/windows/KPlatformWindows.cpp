@@ -172,11 +172,19 @@ bool KPlatform::OpenTraceDestination() noexcept {
   return true;
 }
 
-std::string KPlatform::UserDataHome() {
+namespace {
+// A shell folder's path as the system gives it, or empty when it has none.
+std::string KnownFolder(REFKNOWNFOLDERID id) {
   wchar_t* folder = nullptr;
-  const HRESULT result = ::SHGetKnownFolderPath(FOLDERID_RoamingAppData, KF_FLAG_DEFAULT, nullptr, &folder);
-  std::string home = SUCCEEDED(result) && folder ? Narrow(folder, static_cast<int>(std::wcslen(folder))) : std::string();
+  const HRESULT result = ::SHGetKnownFolderPath(id, KF_FLAG_DEFAULT, nullptr, &folder);
+  std::string path = SUCCEEDED(result) && folder ? KPlatform::Narrow(folder, static_cast<int>(std::wcslen(folder))) : std::string();
   ::CoTaskMemFree(folder);
+  return path;
+}
+}  // namespace
+
+std::string KPlatform::UserDataHome() {
+  std::string home = KnownFolder(FOLDERID_RoamingAppData);
   if (home.empty()) throw KException("Could not find the user's data folder: the roaming application data folder is unknown.");
   while (home.size() > 3 && (home.back() == '\\' || home.back() == '/')) home.pop_back();
   return home.back() == '\\' ? home : home + "\\";
@@ -270,25 +278,51 @@ bool KPlatform::RemoveFile(const std::string& path) {
   FailOnPath("Could not remove the file '{0}' ({1}).", path, error);
 }
 
-std::vector<std::string> KPlatform::ListFiles(const std::string& folder) {
+namespace {
+// The names of the entries in a folder that are folders (or, with `folders` false, files).
+std::vector<std::string> ListEntries(const std::string& folder, bool folders) {
   std::vector<std::string> names;
   std::string pattern = folder;
   if (!pattern.empty() && pattern.back() != '\\' && pattern.back() != '/') pattern += '\\';
   WIN32_FIND_DATAW entry{};
-  HANDLE search = ::FindFirstFileW(Wide(pattern + "*").c_str(), &entry);
+  HANDLE search = ::FindFirstFileW(KPlatform::Wide(pattern + "*").c_str(), &entry);
   if (search == INVALID_HANDLE_VALUE) {
     const DWORD error = ::GetLastError();
     if (error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND) return names;
     FailOnPath("Could not list the folder '{0}' ({1}).", folder, error);
   }
   do {
-    if (!(entry.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY)) names.push_back(Narrow(entry.cFileName, static_cast<int>(std::wcslen(entry.cFileName))));
+    const bool isFolder = (entry.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
+    const bool dots = std::wcscmp(entry.cFileName, L".") == 0 || std::wcscmp(entry.cFileName, L"..") == 0;
+    if (isFolder == folders && !dots) names.push_back(KPlatform::Narrow(entry.cFileName, static_cast<int>(std::wcslen(entry.cFileName))));
   } while (::FindNextFileW(search, &entry));
   const DWORD error = ::GetLastError();
   ::FindClose(search);
   if (error != ERROR_NO_MORE_FILES) FailOnPath("Could not list the folder '{0}' ({1}).", folder, error);
   std::sort(names.begin(), names.end());
   return names;
+}
+}  // namespace
+
+std::vector<std::string> KPlatform::ListFiles(const std::string& folder) { return ListEntries(folder, false); }
+
+std::vector<std::string> KPlatform::ListFolders(const std::string& folder) { return ListEntries(folder, true); }
+
+std::string KPlatform::ParentFolder(const std::string& path) {
+  std::string trimmed = path;
+  while (trimmed.size() > 3 && (trimmed.back() == '\\' || trimmed.back() == '/')) trimmed.pop_back();
+  const size_t separator = trimmed.find_last_of("\\/");
+  return separator == std::string::npos ? trimmed + "\\" : trimmed.substr(0, separator + 1);
+}
+
+std::string KPlatform::AsFolder(const std::string& path) {
+  return !path.empty() && (path.back() == '\\' || path.back() == '/') ? path : path + "\\";
+}
+
+std::string KPlatform::HomeFolder() {
+  const std::string home = KnownFolder(FOLDERID_Profile);
+  if (home.empty()) throw KException("Could not find the user's home folder.");
+  return home.back() == '\\' ? home : home + "\\";
 }
 
 std::string KPlatform::CreateTemporaryFolder() {

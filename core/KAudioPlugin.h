@@ -249,6 +249,13 @@ protected:
   // their defaults are not stored, and loading from an element without them restores defaults.
   virtual void StorePluginSettings(Element& /*section*/, uint32_t /*flags*/) {}
   void SetOversampling(int32_t factor) noexcept { oversampling_.store(factor > 1 ? factor : 1, std::memory_order_relaxed); }
+  // For a plug-in whose own last pass reads its main inputs and writes its outputs anyway: on
+  // (from ProcessUpdate), the cycle reads no audio for the level meters and every Process
+  // reports the peaks of its channels instead, with MeterPeaks; off, the cycle meters itself.
+  void SetMetersInProcess(bool on) noexcept { metersInProcess_ = on; }
+  // From Process, for main channel `channel` (0 or 1): the largest magnitudes of its input and
+  // of its output over the sub-block's `sampleCount` samples, NaN samples left out.
+  void MeterPeaks(int32_t channel, float input, float output, int32_t sampleCount) noexcept;
 
 private:
   struct ActivePreset {
@@ -273,13 +280,10 @@ private:
 
   // Samples of the channel mode's input copies, which live on the stack of the processing call.
   static constexpr int32_t kScratchSamples = 2 * kMaxChunk;
-  // The longest piece of a host block processed at once: kMaxChunk, shorter for plug-ins with
-  // more than two inputs.
-  int32_t ChunkLength() const noexcept;
   void ProcessChunk(const float* const* inputs, float* const* outputs, int32_t start, int32_t length) noexcept;
   void ProcessAudio(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
-  void ProcessAudio_Prepare(const float* const* inputs, int32_t sampleCount) noexcept;
-  void ProcessAudio_Finish(float* const* outputs, int32_t sampleCount) noexcept;
+  // Feeds the meter pair from `first` with a channel pair, or its left meter with one channel.
+  void MeterChannels(Meter first, const float* left, const float* right, int32_t sampleCount) noexcept;
 
   Shape shape_;
   KString identifier_;
@@ -287,6 +291,9 @@ private:
   KMIDIQueue midi_;
   KLevelMeter meters_[kMeterCount];
   int32_t channelsPerBus_ = kChannelCounts[0];
+  // The longest piece of a host block processed at once: kMaxChunk, shorter for plug-ins with
+  // more than two inputs. Follows the channel count.
+  int32_t chunkLength_ = kMaxChunk;
   double sampleRate_ = 44100.0;
   int32_t subBlockCap_ = kDefaultSubBlockCap;
   int32_t fineSubBlockCap_ = kDefaultFineSubBlockCap;
@@ -300,6 +307,7 @@ private:
   int32_t chunkMode_ = 0;
   std::atomic<bool> bypass_{false};
   bool resumeFromBypass_ = false;  // audio thread
+  bool metersInProcess_ = false;   // audio thread
 
   // State beyond the parameters, user-interface thread unless noted.
   KModule* module_ = nullptr;

@@ -165,10 +165,12 @@ TEST(DynamicsProcessor, MeasuredPeaksAreTheLargestMagnitudesOfEachChannelsInputA
   for (int32_t variant = 0; variant < 6; ++variant) {
     KDynamicsSettings s;
     s.linkChannels = variant % 2 == 0, s.threshold = 0.2, s.ratio = variant < 4 ? 6.0 : 1.0, s.sampleRate = kRate;
+    s.attack = 1.0;  // slow, so that the loud samples below come out loudest too
     Engine measuring(s, 3, 256), plain(s, 3, 256);  // 999 frames: three whole pieces and an odd end
     measuring.MeasurePeaks(true);
     Channels x = Noise(3, 999, 8 + variant);
-    x[1][998] = variant < 2 ? 1.5f : -1.25f;  // the loudest sample at the scalar end
+    x[0][993] = -8.0f;                         // the loudest sample in the last four-sample step
+    x[1][998] = variant < 2 ? 1.5f : -1.25f;  // and at the scalar end
     if (variant == 2) x[0][17] = NAN;
     const Channels y = measuring.Run(x), expected = plain.Run(x);
     for (size_t c = 0; c < 3; ++c)
@@ -178,6 +180,7 @@ TEST(DynamicsProcessor, MeasuredPeaksAreTheLargestMagnitudesOfEachChannelsInputA
       EXPECT_EQ(measuring.OutputPeak(c), peak(y[size_t(c)])) << variant << " " << c;
     }
     EXPECT_EQ(measuring.InputPeak(1), variant < 2 ? 1.5f : 1.25f);
+    EXPECT_EQ(measuring.OutputPeak(0), std::fabs(y[0][993]));
     if (variant == 3) {  // in place: the input is read before its sample is overwritten
       Channels z = Noise(3, 999, 20);
       const float inputPeak = peak(z[0]);

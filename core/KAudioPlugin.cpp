@@ -92,7 +92,11 @@ void KAudioPlugin::ScheduleMIDIEvent(int32_t sampleOffset, KMIDIBytes bytes) noe
 void KAudioPlugin::ProcessHostBlock(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept {
   KDenormalScope denormals;
   gPublishedSampleRate.store(sampleRate_, std::memory_order_relaxed);
-  lastProcessingTime_.store(KPlatform::MillisecondClock(), std::memory_order_relaxed);
+  if (sinceStamp_ >= kStampSamples) {
+    sinceStamp_ = 0;
+    lastProcessingTime_.store(KPlatform::MillisecondClock(), std::memory_order_relaxed);
+  }
+  sinceStamp_ += std::clamp(sampleCount, 1, kStampSamples);
   AcceptPostedRamps();
   const int32_t outputCount = OutputChannelCount();
   bool hasOutputs = outputs != nullptr;
@@ -219,11 +223,4 @@ void KAudioPlugin::ProcessAudio(const float* const* inputs, float* const* output
 void KAudioPlugin::MeterChannels(Meter first, const float* left, const float* right, int32_t sampleCount) noexcept {
   if (right) KLevelMeter::AccumulatePair(meters_[first], meters_[first + 1], left, right, sampleCount);
   else meters_[first].Accumulate(left, sampleCount);
-}
-
-void KAudioPlugin::MeterPeaks(int32_t channel, float input, float output, int32_t sampleCount) noexcept {
-  if (channel < 0 || channel >= std::min(channelsPerBus_, 2)) return;
-  if (shape_.inputBuses > 0) meters_[kInputLeft + channel].AccumulatePeak(input, sampleCount);
-  if (shape_.outputBuses > 0 && chunkMode_ == KChannelMode::kLeftRight)
-    meters_[kOutputLeft + channel].AccumulatePeak(output, sampleCount);
 }

@@ -8,6 +8,7 @@
 
 #include "core/Element.h"
 #include "core/KAudioPluginBase.h"
+#include "core/KChannelMode.h"
 #include "core/KControllerMap.h"
 #include "core/KGlobalSettings.h"
 #include "core/KHandOver.h"
@@ -100,8 +101,8 @@ public:
   void SetMeterReset(bool reset) noexcept { meterReset_.store(reset, std::memory_order_relaxed); }
   const KLevelMeter& GetMeter(Meter meter) const noexcept { return meters_[meter]; }
   KLevelMeter& GetMeter(Meter meter) noexcept { return meters_[meter]; }
-  // Milliseconds (platform clock) at the start of the latest block: tells the editor whether
-  // the host is processing.
+  // Milliseconds (platform clock) at the start of a recent block, taken again once at least
+  // kStampSamples were processed since: tells the editor whether the host is processing.
   uint64_t LastProcessingTime() const noexcept { return lastProcessingTime_.load(std::memory_order_relaxed); }
   // The sample rate of whichever instance processed most recently, for code without a plug-in
   // at hand.
@@ -257,8 +258,14 @@ protected:
   // reports the peaks of its channels instead, with MeterPeaks; off, the cycle meters itself.
   void SetMetersInProcess(bool on) noexcept { metersInProcess_ = on; }
   // From Process, for main channel `channel` (0 or 1): the largest magnitudes of its input and
-  // of its output over the sub-block's `sampleCount` samples, NaN samples left out.
-  void MeterPeaks(int32_t channel, float input, float output, int32_t sampleCount) noexcept;
+  // of its output over the sub-block's `sampleCount` samples, NaN samples left out. Outputs that
+  // the channel mode converts after Process are the cycle's to meter.
+  void MeterPeaks(int32_t channel, float input, float output, int32_t sampleCount) noexcept {
+    if (channel < 0 || channel >= channelsPerBus_ || channel > 1) return;
+    if (shape_.inputBuses > 0) meters_[kInputLeft + channel].AccumulatePeak(input, sampleCount);
+    if (shape_.outputBuses > 0 && chunkMode_ == KChannelMode::kLeftRight)
+      meters_[kOutputLeft + channel].AccumulatePeak(output, sampleCount);
+  }
 
 private:
   struct ActivePreset {
@@ -307,6 +314,9 @@ private:
   std::atomic<int32_t> channelMode_{0};
   std::atomic<bool> meterReset_{false};
   std::atomic<uint64_t> lastProcessingTime_{0};
+  // Reading the clock at every block would cost a small block a noticeable share of its time.
+  static constexpr int32_t kStampSamples = 512;
+  int32_t sinceStamp_ = kStampSamples;  // audio thread: samples since the stamp; the first block takes one
   // The channel mode of the current chunk, read once so that routing and restoring agree.
   int32_t chunkMode_ = 0;
   std::atomic<bool> bypass_{false};

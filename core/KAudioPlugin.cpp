@@ -16,11 +16,19 @@ namespace {
 std::atomic<double> gPublishedSampleRate{44100.0};
 // Read by plug-ins whose host gave no input buffers.
 alignas(16) const float kSilence[KAudioPlugin::kMaxChunk] = {};
+
+// The channel mode's copies of the inputs share one stack area of `scratch` samples; with more
+// than one channel pair the pieces get shorter so that every copy fits (rounded down to four
+// samples so that each copy stays 16-byte aligned).
+int32_t ChunkLengthFor(int32_t inputCount, int32_t scratch) noexcept {
+  return inputCount <= 2 ? KAudioPlugin::kMaxChunk : scratch / inputCount / 4 * 4;
+}
 }  // namespace
 
 KAudioPlugin::KAudioPlugin(std::span<const KParameterInfo> parameters, const Shape& shape)
     : KAudioPluginBase(parameters), KMIDIProcessor(transport_), shape_(shape) {
   KMIDIProcessor::SetSampleRate(sampleRate_);
+  chunkLength_ = ChunkLengthFor(InputChannelCount(), kScratchSamples);
   locked_.Reserve(ParameterCount());
   for (int32_t i = 0; i < ParameterCount(); ++i) locked_.Append(false);
 }
@@ -34,6 +42,7 @@ bool KAudioPlugin::SetChannelsPerBus(int32_t channels) noexcept {
   const int32_t buses = std::max(shape_.inputBuses, shape_.outputBuses);
   if (!supported || channels * buses > kMaxChannels) return false;
   channelsPerBus_ = channels;
+  chunkLength_ = ChunkLengthFor(InputChannelCount(), kScratchSamples);
   MarkUpdatePending();
   return true;
 }
@@ -84,7 +93,11 @@ void KAudioPlugin::ScheduleMIDIEvent(int32_t sampleOffset, KMIDIBytes bytes) noe
 void KAudioPlugin::ProcessHostBlock(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept {
   KDenormalScope denormals;
   gPublishedSampleRate.store(sampleRate_, std::memory_order_relaxed);
-  lastProcessingTime_.store(KPlatform::MillisecondClock(), std::memory_order_relaxed);
+  if (sinceStamp_ >= kStampSamples) {
+    sinceStamp_ = 0;
+    lastProcessingTime_.store(KPlatform::MillisecondClock(), std::memory_order_relaxed);
+  }
+  sinceStamp_ += std::clamp(sampleCount, 1, kStampSamples);
   AcceptPostedRamps();
   const int32_t outputCount = OutputChannelCount();
   bool hasOutputs = outputs != nullptr;
@@ -97,9 +110,8 @@ void KAudioPlugin::ProcessHostBlock(const float* const* inputs, float* const* ou
     // Ramps waited while the plug-in rested: their values land at once rather than late.
     if (std::exchange(resumeFromBypass_, false)) RequestJump();
     ResolveBlockEnd(sampleCount);
-    const int32_t chunk = ChunkLength();
-    for (int32_t start = 0; start < sampleCount; start += chunk)
-      ProcessChunk(inputs, outputs, start, std::min(chunk, sampleCount - start));
+    for (int32_t start = 0; start < sampleCount; start += chunkLength_)
+      ProcessChunk(inputs, outputs, start, std::min(chunkLength_, sampleCount - start));
   }
   // Every message of the block arrives within it, even when there was no audio to cut or it is
   // stamped past the block's end (a host's mistake): no note hangs, none is carried over.
@@ -127,14 +139,6 @@ void KAudioPlugin::ProcessMIDIController(const KMIDIEvent& event) {
   });
 }
 
-int32_t KAudioPlugin::ChunkLength() const noexcept {
-  // The channel mode's copies of the inputs share one stack area of kScratchSamples; with more
-  // than one channel pair the pieces get shorter so that every copy fits (rounded down to four
-  // samples so that each copy stays 16-byte aligned).
-  const int32_t inputCount = InputChannelCount();
-  return inputCount <= 2 ? kMaxChunk : kScratchSamples / inputCount / 4 * 4;
-}
-
 void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* outputs, int32_t start, int32_t length) noexcept {
   const int32_t inputCount = InputChannelCount();
   const int32_t outputCount = OutputChannelCount();
@@ -147,7 +151,7 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
   // are never written.
   const int32_t mode = chunkMode_ = channelsPerBus_ == 2 ? ChannelMode() : KChannelMode::kLeftRight;
   alignas(16) float scratch[kScratchSamples];
-  const int32_t stride = ChunkLength();
+  const int32_t stride = chunkLength_;
   for (int32_t c = 0; c + 1 < inputCount && mode != KChannelMode::kLeftRight; c += 2)
     KChannelMode::RouteInputs(mode, in[c], in[c + 1], scratch + c * stride, scratch + (c + 1) * stride, length);
   if (KChannelMode::SwapsOutputs(mode))
@@ -197,36 +201,27 @@ void KAudioPlugin::Modulate(int32_t length) noexcept {
 
 void KAudioPlugin::ProcessAudio(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept {
   KGuard("KAudioPlugin::ProcessAudio", [&] {
-    ProcessAudio_Prepare(inputs, sampleCount);
     if (TakeUpdatePending()) ProcessUpdate();
+    // The meters show the main bus only: a mono plug-in's side-chain is no right channel. The
+    // input meters read what Process reads, before it may overwrite it in place.
+    const bool measured = metersInProcess_;
+    const bool pair = channelsPerBus_ >= 2;
+    if (shape_.inputBuses > 0 && !measured) MeterChannels(kInputLeft, inputs[0], pair ? inputs[1] : nullptr, sampleCount);
     Process(inputs, outputs, sampleCount);
-    ProcessAudio_Finish(outputs, sampleCount);
-  });
-}
-
-void KAudioPlugin::ProcessAudio_Prepare(const float* const* inputs, int32_t sampleCount) noexcept {
-  KGuard("KAudioPlugin::ProcessAudio_Prepare", [&] {
-    // The meters show the main bus only: a mono plug-in's side-chain is no right channel.
-    if (shape_.inputBuses > 0 && channelsPerBus_ >= 2)
-      KLevelMeter::AccumulatePair(meters_[kInputLeft], meters_[kInputRight], inputs[0], inputs[1], sampleCount);
-    else if (shape_.inputBuses > 0)
-      meters_[kInputLeft].Accumulate(inputs[0], sampleCount);
-  });
-}
-
-void KAudioPlugin::ProcessAudio_Finish(float* const* outputs, int32_t sampleCount) noexcept {
-  KGuard("KAudioPlugin::ProcessAudio_Finish", [&] {
     // `outputs` are the plug-in's pointers; where the mode exchanged a pair, the host's left
-    // channel is the plug-in's second.
+    // channel is the plug-in's second. Restored outputs are no longer what Process measured.
     const int32_t outputCount = OutputChannelCount();
     const int32_t swapped = KChannelMode::SwapsOutputs(chunkMode_) ? 1 : 0;
     for (int32_t c = 0; c + 1 < outputCount && chunkMode_ != KChannelMode::kLeftRight; c += 2)
       KChannelMode::RestoreOutputs(chunkMode_, outputs[c + swapped], outputs[c + 1 - swapped], sampleCount);
-    if (shape_.outputBuses > 0 && channelsPerBus_ >= 2)
-      KLevelMeter::AccumulatePair(meters_[kOutputLeft], meters_[kOutputRight], outputs[swapped], outputs[1 - swapped], sampleCount);
-    else if (shape_.outputBuses > 0)
-      meters_[kOutputLeft].Accumulate(outputs[0], sampleCount);
+    if (shape_.outputBuses > 0 && (!measured || chunkMode_ != KChannelMode::kLeftRight))
+      MeterChannels(kOutputLeft, outputs[swapped], pair ? outputs[1 - swapped] : nullptr, sampleCount);
     if (meterReset_.load(std::memory_order_relaxed))
       for (KLevelMeter& meter : meters_) meter.Reset();
   });
+}
+
+void KAudioPlugin::MeterChannels(Meter first, const float* left, const float* right, int32_t sampleCount) noexcept {
+  if (right) KLevelMeter::AccumulatePair(meters_[first], meters_[first + 1], left, right, sampleCount);
+  else meters_[first].Accumulate(left, sampleCount);
 }

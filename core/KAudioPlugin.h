@@ -8,6 +8,7 @@
 
 #include "core/Element.h"
 #include "core/KAudioPluginBase.h"
+#include "core/KChannelMode.h"
 #include "core/KControllerMap.h"
 #include "core/KGlobalSettings.h"
 #include "core/KHandOver.h"
@@ -100,8 +101,8 @@ public:
   void SetMeterReset(bool reset) noexcept { meterReset_.store(reset, std::memory_order_relaxed); }
   const KLevelMeter& GetMeter(Meter meter) const noexcept { return meters_[meter]; }
   KLevelMeter& GetMeter(Meter meter) noexcept { return meters_[meter]; }
-  // Milliseconds (platform clock) at the start of the latest block: tells the editor whether
-  // the host is processing.
+  // Milliseconds (platform clock) at the start of a recent block, taken again once at least
+  // kStampSamples were processed since: tells the editor whether the host is processing.
   uint64_t LastProcessingTime() const noexcept { return lastProcessingTime_.load(std::memory_order_relaxed); }
   // The sample rate of whichever instance processed most recently, for code without a plug-in
   // at hand.
@@ -271,6 +272,19 @@ protected:
   // their defaults are not stored, and loading from an element without them restores defaults.
   virtual void StorePluginSettings(Element& /*section*/, uint32_t /*flags*/) {}
   void SetOversampling(int32_t factor) noexcept { oversampling_.store(factor > 1 ? factor : 1, std::memory_order_relaxed); }
+  // For a plug-in whose own last pass reads its main inputs and writes its outputs anyway: on
+  // (from ProcessUpdate), the cycle reads no audio for the level meters and every Process
+  // reports the peaks of its channels instead, with MeterPeaks; off, the cycle meters itself.
+  void SetMetersInProcess(bool on) noexcept { metersInProcess_ = on; }
+  // From Process, for main channel `channel` (0 or 1): the largest magnitudes of its input and
+  // of its output over the sub-block's `sampleCount` samples, NaN samples left out. Outputs that
+  // the channel mode converts after Process are the cycle's to meter.
+  void MeterPeaks(int32_t channel, float input, float output, int32_t sampleCount) noexcept {
+    if (channel < 0 || channel >= channelsPerBus_ || channel > 1) return;
+    if (shape_.inputBuses > 0) meters_[kInputLeft + channel].AccumulatePeak(input, sampleCount);
+    if (shape_.outputBuses > 0 && chunkMode_ == KChannelMode::kLeftRight)
+      meters_[kOutputLeft + channel].AccumulatePeak(output, sampleCount);
+  }
 
 private:
   struct ActivePreset {
@@ -301,13 +315,10 @@ private:
 
   // Samples of the channel mode's input copies, which live on the stack of the processing call.
   static constexpr int32_t kScratchSamples = 2 * kMaxChunk;
-  // The longest piece of a host block processed at once: kMaxChunk, shorter for plug-ins with
-  // more than two inputs.
-  int32_t ChunkLength() const noexcept;
   void ProcessChunk(const float* const* inputs, float* const* outputs, int32_t start, int32_t length) noexcept;
   void ProcessAudio(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
-  void ProcessAudio_Prepare(const float* const* inputs, int32_t sampleCount) noexcept;
-  void ProcessAudio_Finish(float* const* outputs, int32_t sampleCount) noexcept;
+  // Feeds the meter pair from `first` with a channel pair, or its left meter with one channel.
+  void MeterChannels(Meter first, const float* left, const float* right, int32_t sampleCount) noexcept;
 
   Shape shape_;
   KString identifier_;
@@ -316,6 +327,9 @@ private:
   KMIDIQueue midi_;
   KLevelMeter meters_[kMeterCount];
   int32_t channelsPerBus_ = kChannelCounts[0];
+  // The longest piece of a host block processed at once: kMaxChunk, shorter for plug-ins with
+  // more than two inputs. Follows the channel count.
+  int32_t chunkLength_ = kMaxChunk;
   double sampleRate_ = 44100.0;
   int32_t subBlockCap_ = kDefaultSubBlockCap;
   int32_t fineSubBlockCap_ = kDefaultFineSubBlockCap;
@@ -325,10 +339,14 @@ private:
   std::atomic<int32_t> channelMode_{0};
   std::atomic<bool> meterReset_{false};
   std::atomic<uint64_t> lastProcessingTime_{0};
+  // Reading the clock at every block would cost a small block a noticeable share of its time.
+  static constexpr int32_t kStampSamples = 512;
+  int32_t sinceStamp_ = kStampSamples;  // audio thread: samples since the stamp; the first block takes one
   // The channel mode of the current chunk, read once so that routing and restoring agree.
   int32_t chunkMode_ = 0;
   std::atomic<bool> bypass_{false};
   bool resumeFromBypass_ = false;  // audio thread
+  bool metersInProcess_ = false;   // audio thread
 
   // State beyond the parameters, user-interface thread unless noted.
   KModule* module_ = nullptr;

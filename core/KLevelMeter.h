@@ -17,6 +17,9 @@ public:
     left.Take(peaks[0], n);
     right.Take(peaks[1], n);
   }
+  // A peak magnitude that the processing found over n samples as it went (never NaN), taken as
+  // Accumulate would take the samples themselves.
+  void AccumulatePeak(float peak, int32_t n) noexcept { Take(peak > Level() ? peak : Level(), n); }
   void Reset() noexcept {
     if (count_ < limit_) hold_ = false;
     level_.store(resetValue_, std::memory_order_relaxed);

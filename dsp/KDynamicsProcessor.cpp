@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <iterator>
 #include <limits>
 
 #include "dsp/KDecibels.h"
@@ -95,6 +96,7 @@ void KDynamicsProcessor::Process(int32_t n, const float* const* in, float* const
                                  int32_t channels) noexcept {
   if (n <= 0 || channels <= 0) return;
   lowestGain_ = static_cast<float>(curve_.TotalGain());
+  if (measuring_) std::fill_n(&peaks_[0][0], std::size(peaks_) * 2, 0.0f);
   if (idle_) {
     Amplify(n, in, out, channels);
     return;
@@ -188,14 +190,36 @@ float StoreGains(const double* gains, float* stored, int32_t frames, float lowes
   return lowest;
 }
 
-// out = gain · in, in double, two samples per instruction.
-void ApplyGains(const double* gains, const float* in, float* out, int32_t frames) noexcept {
+// The larger of a magnitude and a running peak; a NaN magnitude leaves the peak, as maxps does
+// with the running peak as its second operand.
+float Larger(float magnitude, float peak) noexcept { return magnitude > peak ? magnitude : peak; }
+
+// out = gain · in, in double, two samples per instruction. kMeasure also keeps the largest
+// magnitudes of in and out in peaks[0] and peaks[1], from the same registers.
+template <bool kMeasure>
+void ApplyGains(const double* gains, const float* in, float* out, int32_t frames, float* peaks) noexcept {
+  const __m128 sign = _mm_set1_ps(-0.0f);
+  __m128 top = _mm_setr_ps(peaks[0], peaks[0], peaks[1], peaks[1]);  // input in the low lanes, output in the high
   int32_t i = 0;
   for (; i + 2 <= frames; i += 2) {
-    const __m128d x = _mm_cvtps_pd(LoadTwo(in + i));
-    _mm_storel_epi64(reinterpret_cast<__m128i*>(out + i), _mm_castps_si128(_mm_cvtpd_ps(_mm_mul_pd(_mm_loadu_pd(gains + i), x))));
+    const __m128 x = LoadTwo(in + i);
+    const __m128 y = _mm_cvtpd_ps(_mm_mul_pd(_mm_loadu_pd(gains + i), _mm_cvtps_pd(x)));
+    _mm_storel_epi64(reinterpret_cast<__m128i*>(out + i), _mm_castps_si128(y));
+    if constexpr (kMeasure) top = _mm_max_ps(_mm_andnot_ps(sign, _mm_movelh_ps(x, y)), top);
   }
-  for (; i < frames; ++i) out[i] = static_cast<float>(gains[i] * in[i]);
+  if constexpr (kMeasure) {
+    top = _mm_max_ps(top, _mm_shuffle_ps(top, top, _MM_SHUFFLE(2, 3, 0, 1)));
+    peaks[0] = _mm_cvtss_f32(top);
+    peaks[1] = _mm_cvtss_f32(_mm_movehl_ps(top, top));
+  }
+  for (; i < frames; ++i) {
+    const float x = in[i];  // before the store: `out` may be `in`
+    out[i] = static_cast<float>(gains[i] * x);
+    if constexpr (kMeasure) {
+      peaks[0] = Larger(std::fabs(x), peaks[0]);
+      peaks[1] = Larger(std::fabs(out[i]), peaks[1]);
+    }
+  }
 }
 
 // The same three passes four samples at a time, for processors with AVX: the same operations
@@ -233,22 +257,71 @@ void ApplyGains(const double* gains, const float* in, float* out, int32_t frames
   return i < frames ? StoreGains(gains + i, stored + i, frames - i, lowest) : lowest;
 }
 
-[[gnu::target("avx")]] void ApplyGainsWide(const double* gains, const float* in, float* out, int32_t frames) noexcept {
+// Four samples of ApplyGainsWide; answers the products before they are rounded to float.
+[[gnu::target("avx"), gnu::always_inline]] inline __m256d ApplyFour(const double* gains, const float* in, float* out) noexcept {
+  const __m256d y = _mm256_mul_pd(_mm256_loadu_pd(gains), _mm256_cvtps_pd(_mm_loadu_ps(in)));
+  _mm_storeu_ps(out, _mm256_cvtpd_ps(y));
+  return y;
+}
+
+// Eight samples a turn. Measuring, the inputs are compared eight at a time as read, and the
+// outputs before they are rounded: rounding keeps their order, so the largest product rounds to
+// the largest output, and the comparisons stay off the unit that the conversions keep busy.
+template <bool kMeasure>
+[[gnu::target("avx")]] void ApplyGainsWide(const double* gains, const float* in, float* out, int32_t frames, float* peaks) noexcept {
+  const __m256 signs = _mm256_set1_ps(-0.0f);
+  const __m256d sign = _mm256_set1_pd(-0.0);
+  __m256 read = _mm256_set1_ps(peaks[0]);
+  __m256d written = _mm256_set1_pd(peaks[1]), other = written;
   int32_t i = 0;
-  for (; i + 4 <= frames; i += 4)
-    _mm_storeu_ps(out + i, _mm256_cvtpd_ps(_mm256_mul_pd(_mm256_loadu_pd(gains + i), _mm256_cvtps_pd(_mm_loadu_ps(in + i)))));
+  for (; i + 8 <= frames; i += 8) {
+    const __m256 x = _mm256_loadu_ps(in + i);  // before the stores: `out` may be `in`
+    const __m256d a = ApplyFour(gains + i, in + i, out + i), b = ApplyFour(gains + i + 4, in + i + 4, out + i + 4);
+    if constexpr (kMeasure) {
+      read = _mm256_max_ps(_mm256_andnot_ps(signs, x), read);
+      written = _mm256_max_pd(_mm256_andnot_pd(sign, a), written);
+      other = _mm256_max_pd(_mm256_andnot_pd(sign, b), other);
+    }
+  }
+  if (i + 4 <= frames) {
+    const __m128 x = _mm_loadu_ps(in + i);
+    const __m256d a = ApplyFour(gains + i, in + i, out + i);
+    if constexpr (kMeasure) {
+      read = _mm256_max_ps(_mm256_andnot_ps(signs, _mm256_set_m128(x, x)), read);
+      written = _mm256_max_pd(_mm256_andnot_pd(sign, a), written);
+    }
+    i += 4;
+  }
+  if constexpr (kMeasure) {
+    __m128 x = _mm_max_ps(_mm256_castps256_ps128(read), _mm256_extractf128_ps(read, 1));
+    x = _mm_max_ps(x, _mm_movehl_ps(x, x));
+    peaks[0] = _mm_cvtss_f32(_mm_max_ss(x, _mm_shuffle_ps(x, x, 1)));
+    written = _mm256_max_pd(written, other);
+    __m128d y = _mm_max_pd(_mm256_castpd256_pd128(written), _mm256_extractf128_pd(written, 1));
+    peaks[1] = static_cast<float>(_mm_cvtsd_f64(_mm_max_sd(y, _mm_unpackhi_pd(y, y))));
+  }
   _mm256_zeroupper();
-  if (i < frames) ApplyGains(gains + i, in + i, out + i, frames - i);
+  if (i < frames) ApplyGains<kMeasure>(gains + i, in + i, out + i, frames - i, peaks);
+}
+
+bool HasAVX() noexcept {
+  static const bool avx = __builtin_cpu_supports("avx");
+  return avx;
 }
 
 }  // namespace
 
 KDynamicsProcessor::KDynamicsProcessor() noexcept {
-  static const bool avx = __builtin_cpu_supports("avx");
-  squareSum_ = avx ? SquareSumWide : SquareSum;
-  storeGains_ = avx ? StoreGainsWide : StoreGains;
-  applyGains_ = avx ? ApplyGainsWide : ApplyGains;
+  squareSum_ = HasAVX() ? SquareSumWide : SquareSum;
+  storeGains_ = HasAVX() ? StoreGainsWide : StoreGains;
+  MeasurePeaks(false);
   Update(KDynamicsSettings{});
+}
+
+void KDynamicsProcessor::MeasurePeaks(bool on) noexcept {
+  measuring_ = on;
+  if (HasAVX()) applyGains_ = on ? ApplyGainsWide<true> : ApplyGainsWide<false>;
+  else applyGains_ = on ? ApplyGains<true> : ApplyGains<false>;
 }
 
 // One detector fed by the mean square of all channels; every channel gets its gain. The work
@@ -262,7 +335,8 @@ void KDynamicsProcessor::DetectLinked(KDynamicsProcessor& self, int32_t channels
            self.e_[0]);
   self.curve_.Gains(work, work, frames);
   self.lowestGain_ = self.storeGains_(work, self.gains_.data(), frames, self.lowestGain_);
-  for (int32_t ch = 0; ch < channels; ++ch) self.applyGains_(work, self.pieceIn_[ch], self.pieceOut_[ch], frames);
+  for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch)
+    self.applyGains_(work, self.pieceIn_[ch], self.pieceOut_[ch], frames, self.PeaksOf(ch));
 }
 
 // A detector, an envelope row and a gain row per channel.
@@ -275,17 +349,27 @@ void KDynamicsProcessor::DetectUnlinked(KDynamicsProcessor& self, int32_t channe
              self.p_[ch], self.e_[ch]);
     self.curve_.Gains(work, work, frames);
     self.lowestGain_ = self.storeGains_(work, self.gains_.data() + row, frames, self.lowestGain_);
-    self.applyGains_(work, self.pieceIn_[ch], self.pieceOut_[ch], frames);
+    self.applyGains_(work, self.pieceIn_[ch], self.pieceOut_[ch], frames, self.PeaksOf(ch));
   }
 }
 
 // Ratio 1:1 without a custom shape: a plain gain, in place or copying.
-void KDynamicsProcessor::Amplify(int32_t n, const float* const* in, float* const* out, int32_t channels) const noexcept {
+void KDynamicsProcessor::Amplify(int32_t n, const float* const* in, float* const* out, int32_t channels) noexcept {
   const auto factor = static_cast<float>(gIn_ * gOut_);
   for (int32_t ch = 0; ch < channels; ++ch) {
     const float* x = in[ch];
     float* y = out[ch];
-    for (int32_t i = 0; i < n; ++i) y[i] = factor * x[i];
+    if (!measuring_) {
+      for (int32_t i = 0; i < n; ++i) y[i] = factor * x[i];
+      continue;
+    }
+    float* peaks = PeaksOf(static_cast<size_t>(ch));
+    for (int32_t i = 0; i < n; ++i) {
+      const float v = x[i];
+      y[i] = factor * v;
+      peaks[0] = Larger(std::fabs(v), peaks[0]);
+      peaks[1] = Larger(std::fabs(y[i]), peaks[1]);
+    }
   }
 }
 

@@ -94,6 +94,16 @@ public:
   // the gain rows hold it; the total gain G when the engine is idle.
   float LowestGain() const noexcept { return lowestGain_; }
 
+  // Whether Process also finds, as it writes each channel, the largest magnitudes of that
+  // channel's input and output (for level meters, which then need no pass of their own). Off
+  // until set; the outputs are the same either way.
+  void MeasurePeaks(bool on) noexcept;
+  // Of the last Process with measuring on, for channels 0 and 1: the largest magnitude of the
+  // input and of the output. A NaN sample is left out, as level meters leave it out.
+  static constexpr int32_t kMeasuredChannels = 2;
+  float InputPeak(int32_t channel) const noexcept { return peaks_[channel][0]; }
+  float OutputPeak(int32_t channel) const noexcept { return peaks_[channel][1]; }
+
 private:
   using Detector = void (*)(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
   // The passes around the envelope, chosen once for the processor: four samples at a time with
@@ -101,12 +111,16 @@ private:
   using SquareSumPass = void (*)(const float* const* x, int32_t channels, int32_t from, int32_t frames, double gIn,
                                  double share, double* sums) noexcept;
   using StoreGainsPass = float (*)(const double* gains, float* stored, int32_t frames, float lowest) noexcept;
-  using ApplyGainsPass = void (*)(const double* gains, const float* in, float* out, int32_t frames) noexcept;
+  // `peaks` holds the input's and the output's largest magnitudes so far; a variant that does
+  // not measure leaves them alone.
+  using ApplyGainsPass = void (*)(const double* gains, const float* in, float* out, int32_t frames, float* peaks) noexcept;
 
   static void DetectLinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
   static void DetectUnlinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
   void DesignBandLimits(const KDynamicsSettings& settings) noexcept;
-  void Amplify(int32_t n, const float* const* in, float* const* out, int32_t channels) const noexcept;
+  void Amplify(int32_t n, const float* const* in, float* const* out, int32_t channels) noexcept;
+  // Where the passes measure channel `ch`: its own pair, or the row nobody reads.
+  float* PeaksOf(size_t ch) noexcept { return peaks_[ch < kMeasuredChannels ? ch : kMeasuredChannels]; }
   void Settle(int32_t states) noexcept;
   const float* Row(const std::vector<float>& rows, int32_t channel) const noexcept {
     return rows.data() + static_cast<size_t>(channel) * static_cast<size_t>(maxFrames_);
@@ -120,6 +134,7 @@ private:
   SquareSumPass squareSum_;
   StoreGainsPass storeGains_;
   ApplyGainsPass applyGains_;
+  bool measuring_ = false;
   bool idle_ = false;
   bool linked_ = true;
   bool sideChain_ = false;
@@ -134,6 +149,7 @@ private:
   std::vector<float> envelope_, gains_, filtered_;
   std::vector<double> work_;  // one piece's detector values, then its gains
   float lowestGain_ = 1.0f;
+  float peaks_[kMeasuredChannels + 1][2] = {};  // input and output of each measured channel; a last row for the rest
   std::vector<float*> filteredRows_, pieceOut_;
   std::vector<const float*> pieceIn_, pieceDetect_;
 };

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "core/Element.h"
+#include "core/KChannelMode.h"
 #include "core/KParameter.h"
 #include "plugins/compressor/KCompressorPlugin.h"
 
@@ -120,4 +121,53 @@ TEST_F(CompressorTest, BadSamplesSpoilOneBlockAndSilenceEndsInZeros) {
   Play(plugin, loud, loud);
   for (int k = 0; k < 6; ++k) EXPECT_EQ(Play(plugin, silence, silence), silence);
   EXPECT_EQ(plugin.Engine().Level(0), 0.0);  // 3 s of silence: the 50 ms release fell below 1e-20 and stopped
+}
+
+// The level meters show the largest magnitudes of the main bus read and of the output written,
+// whoever measures them: the engine's last pass while compressing (host buffers apart or in
+// place, mono too), the cycle in audition and in a mode that converts the channels, where the
+// input meters read the converted pair the compressor sees.
+TEST_F(CompressorTest, LevelMetersShowWhatWasReadAndWritten) {
+  const auto peak = [](const std::vector<float>& row) {
+    float top = 0.0f;
+    for (float v : row) top = std::fabs(v) > top ? std::fabs(v) : top;
+    return top;
+  };
+  Channels main = Quadrature(0.9, 441.0, 2000), key = Quadrature(0.5, 97.0, 2000);
+  for (float& v : main[1]) v *= 0.4f;
+  main[0][1999] = -0.95f;  // the loudest left sample in the scalar end of the last block
+  for (int32_t scene = 0; scene < 5; ++scene) {
+    C fresh;
+    Set("threshold", 0.2, &fresh), Set("ratio", 8.0, &fresh);
+    if (scene == 1) Set("SideChainInput", 1.0, &fresh), Set("SideChainPlay", 1.0, &fresh);
+    if (scene == 2) fresh.SetChannelMode(KChannelMode::kMonoStereo);
+    Channels seen = main, out = Quadrature(0.0, 1.0, 2000);
+    if (scene == 3) {  // in place: the host hands its input buffers for the output
+      out = main;
+      for (size_t at = 0; at < 2000; at += 333) {
+        float* io[] = {&out[0][at], &out[1][at]};
+        const float* in[] = {io[0], io[1], &key[0][at], &key[1][at]};
+        fresh.ProcessHostBlock(in, io, static_cast<int32_t>(std::min<size_t>(333, 2000 - at)));
+      }
+    } else if (scene == 4) {  // mono: one main channel and one side-chain channel
+      ASSERT_TRUE(fresh.SetChannelsPerBus(1));
+      for (size_t at = 0; at < 2000; at += 256) {
+        const float* in[] = {&main[0][at], &key[0][at]};
+        float* o[] = {&out[0][at]};
+        fresh.ProcessHostBlock(in, o, static_cast<int32_t>(std::min<size_t>(256, 2000 - at)));
+      }
+      seen[1].assign(2000, 0.0f), out[1].assign(2000, 0.0f);
+    } else {
+      out = Play(fresh, main, key);
+    }
+    if (scene == 2) {  // mid and side, as the cycle converts them
+      const float *left = main[0].data(), *right = main[1].data();
+      KChannelMode::RouteInputs(KChannelMode::kMonoStereo, left, right, seen[0].data(), seen[1].data(), 2000);
+      ASSERT_TRUE(left == seen[0].data() && right == seen[1].data());
+    }
+    for (int32_t c = 0; c < 2; ++c) {
+      EXPECT_EQ(fresh.GetMeter(KAudioPlugin::Meter(KAudioPlugin::kInputLeft + c)).Level(), peak(seen[size_t(c)])) << scene << c;
+      EXPECT_EQ(fresh.GetMeter(KAudioPlugin::Meter(KAudioPlugin::kOutputLeft + c)).Level(), peak(out[size_t(c)])) << scene << c;
+    }
+  }
 }

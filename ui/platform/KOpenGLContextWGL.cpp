@@ -6,6 +6,7 @@
 
 #include "kernel/KException.h"
 #include "ui/platform/KOpenGLContext.h"
+#include "ui/platform/KWin32Module.h"
 
 namespace {
 constexpr wchar_t kClassName[] = L"TorvaneOpenGLSurface";
@@ -14,7 +15,7 @@ ATOM RegisterSurfaceClass() noexcept {
   WNDCLASSW type{};
   type.style = CS_OWNDC;
   type.lpfnWndProc = ::DefWindowProcW;
-  type.hInstance = ::GetModuleHandleW(nullptr);
+  type.hInstance = KThisModule();
   type.lpszClassName = kClassName;
   return ::RegisterClassW(&type);
 }
@@ -25,7 +26,7 @@ public:
     if (width <= 0 || height <= 0) throw KException("The drawing area is empty.");
     static const ATOM registered = RegisterSurfaceClass();
     if (!registered) Fail();
-    window_ = ::CreateWindowExW(0, kClassName, L"", WS_POPUP, 0, 0, width, height, nullptr, nullptr, ::GetModuleHandleW(nullptr), nullptr);
+    window_ = ::CreateWindowExW(0, kClassName, L"", WS_POPUP, 0, 0, width, height, nullptr, nullptr, KThisModule(), nullptr);
     device_ = window_ ? ::GetDC(window_) : nullptr;
     if (!device_) Fail();
     PIXELFORMATDESCRIPTOR format{};

@@ -24,6 +24,9 @@ public:
   // `display` with XPutImage.
   static std::unique_ptr<KWindowSurface> X11Software(struct _XDisplay* display, unsigned long window, int32_t width,
                                                      int32_t height, double scale);
+  // The software drawer into a back buffer of width × height pixels, put on a Win32 window
+  // through GDI.
+  static std::unique_ptr<KWindowSurface> Win32Software(struct HWND__* window, int32_t width, int32_t height, double scale);
 
   virtual KDrawer& Drawer() noexcept = 0;
   virtual bool IsOpenGL() const noexcept = 0;

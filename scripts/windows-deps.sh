@@ -22,6 +22,8 @@ pins=(
   "freetype 2.12.1+dfsg-5+deb12u4"
   "libepoxy 1.5.10-1"
   "libsndfile 1.2.0-1+deb12u1"
+  "kissfft 131.1.0-4.1~deb12u1"
+  "libsamplerate 0.2.2-3"
   "googletest 1.12.1-0.2"
 )
 
@@ -58,7 +60,7 @@ cpu = 'x86_64'
 endian = 'little'
 CROSS
 export PKG_CONFIG_LIBDIR="$prefix/lib/pkgconfig" PKG_CONFIG_PATH=""
-cmake_cross=(-G Ninja -DCMAKE_BUILD_TYPE=Release -DCMAKE_SYSTEM_NAME=Windows -DCMAKE_SYSTEM_PROCESSOR=x86_64
+cmake_cross=(-G Ninja --no-warn-unused-cli -Wno-dev -Wno-deprecated -DCMAKE_BUILD_TYPE=Release -DCMAKE_SYSTEM_NAME=Windows -DCMAKE_SYSTEM_PROCESSOR=x86_64
   -DCMAKE_C_COMPILER=$host-gcc-posix -DCMAKE_CXX_COMPILER=$host-g++-posix -DCMAKE_RC_COMPILER=$host-windres
   -DCMAKE_FIND_ROOT_PATH="/usr/$host;$prefix" -DCMAKE_FIND_ROOT_PATH_MODE_PROGRAM=NEVER
   -DCMAKE_FIND_ROOT_PATH_MODE_LIBRARY=ONLY -DCMAKE_FIND_ROOT_PATH_MODE_INCLUDE=ONLY
@@ -124,6 +126,13 @@ build_libsndfile() {
   build_cmake "$1" -DENABLE_EXTERNAL_LIBS=OFF -DENABLE_MPEG=OFF -DBUILD_PROGRAMS=OFF -DBUILD_EXAMPLES=OFF -DBUILD_TESTING=OFF \
     -DENABLE_CPACK=OFF -DINSTALL_PKGCONFIG_MODULE=ON -DINSTALL_MANPAGES=OFF
 }
+# The FFT of the convolution engine, in single precision as on Linux (kissfft-float). Its build
+# skips GNUInstallDirs outside Unix, so the folders are given.
+build_kissfft() {
+  build_cmake "$1" -DKISSFFT_DATATYPE=float -DKISSFFT_STATIC=ON -DKISSFFT_TEST=OFF -DKISSFFT_TOOLS=OFF -DKISSFFT_PKGCONFIG=ON \
+    -DCMAKE_INSTALL_LIBDIR=lib -DCMAKE_INSTALL_INCLUDEDIR=include -DCMAKE_INSTALL_BINDIR=bin
+}
+build_libsamplerate() { build_cmake "$1" -DBUILD_TESTING=OFF -DLIBSAMPLERATE_EXAMPLES=OFF; }
 build_googletest() { build_cmake "$1" -DBUILD_GMOCK=ON -Dgtest_disable_pthreads=OFF; }
 
 for pin in "${pins[@]}"; do

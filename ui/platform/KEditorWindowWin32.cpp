@@ -87,6 +87,7 @@ KEditorWindowWin32::~KEditorWindowWin32() {
 }
 
 bool KEditorWindowWin32::PaintsWithOpenGL() const noexcept { return surface_->IsOpenGL(); }
+KBitmap KEditorWindowWin32::Picture() { return surface_->Picture(); }
 
 void KEditorWindowWin32::MakeSurface() {
   surface_.reset();

@@ -3,6 +3,8 @@
 #include <cstdint>
 #include <memory>
 
+#include "ui/KBitmap.h"
+
 class KEditor;
 class KWindowSurface;
 struct HWND__;
@@ -35,6 +37,8 @@ public:
   int64_t PaintDirty();
   double LastFullPaintMs() const noexcept { return lastFullPaintMs_; }
   bool PaintsWithOpenGL() const noexcept;
+  // The picture last painted for the window, as its drawer reads it back.
+  KBitmap Picture();
 
   // The window procedure's way in; answers whether the message was handled.
   bool HandleMessage(unsigned message, uintptr_t wParam, intptr_t lParam);

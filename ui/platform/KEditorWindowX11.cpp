@@ -60,6 +60,7 @@ KEditorWindowX11::~KEditorWindowX11() {
 }
 
 bool KEditorWindowX11::PaintsWithOpenGL() const noexcept { return surface_->IsOpenGL(); }
+KBitmap KEditorWindowX11::Picture() { return surface_->Picture(); }
 
 int KEditorWindowX11::FileDescriptor() const noexcept { return ConnectionNumber(display_); }
 

@@ -6,6 +6,7 @@
 
 #include "kernel/KException.h"
 #include "ui/platform/KOpenGLContext.h"
+#include "ui/platform/KWGLDispatch.h"
 #include "ui/platform/KWin32Module.h"
 
 namespace {
@@ -39,6 +40,7 @@ public:
     format.iLayerType = PFD_MAIN_PLANE;
     const int chosen = ::ChoosePixelFormat(device_, &format);
     if (chosen == 0 || !::SetPixelFormat(device_, chosen, &format)) Fail();
+    KPrepareWGLDispatch();
     context_ = wglCreateContext(device_);
     if (!context_) Fail();
   }
@@ -46,7 +48,10 @@ public:
 
   int32_t Width() const noexcept override { return width_; }
   int32_t Height() const noexcept override { return height_; }
-  bool MakeCurrent() noexcept override { return wglMakeCurrent(device_, context_) == TRUE; }
+  bool MakeCurrent() noexcept override {
+    KPrepareWGLDispatch();
+    return wglMakeCurrent(device_, context_) == TRUE;
+  }
   void Release() noexcept override { wglMakeCurrent(nullptr, nullptr); }
 
 private:

@@ -5,6 +5,7 @@
 
 #include "kernel/KException.h"
 #include "ui/platform/KOpenGLWindowContext.h"
+#include "ui/platform/KWGLDispatch.h"
 
 namespace {
 class WGLWindowContext final : public KOpenGLWindowContext {
@@ -25,6 +26,7 @@ public:
       const int chosen = ::ChoosePixelFormat(device_, &format);
       if (chosen == 0 || !::SetPixelFormat(device_, chosen, &format)) Fail();
     }
+    KPrepareWGLDispatch();
     context_ = wglCreateContext(device_);
     if (!context_ || !MakeCurrent()) Fail();
     Release();
@@ -33,7 +35,10 @@ public:
 
   int32_t Width() const noexcept override { return width_; }
   int32_t Height() const noexcept override { return height_; }
-  bool MakeCurrent() noexcept override { return wglMakeCurrent(device_, context_) == TRUE; }
+  bool MakeCurrent() noexcept override {
+    KPrepareWGLDispatch();
+    return wglMakeCurrent(device_, context_) == TRUE;
+  }
   void Release() noexcept override { wglMakeCurrent(nullptr, nullptr); }
   void Present() noexcept override { ::SwapBuffers(device_); }
 

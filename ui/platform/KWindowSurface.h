@@ -2,6 +2,7 @@
 
 #include <memory>
 
+#include "ui/KBitmap.h"
 #include "ui/KGeometry.h"
 
 class KDrawer;
@@ -35,4 +36,8 @@ public:
   virtual void Begin() = 0;
   // Puts the pixels in `changed` (inclusive; empty for none) on the window and ends the paint.
   virtual void Show(const KRect& changed) = 0;
+  // Outside a paint: the picture the drawer last painted, read back from where it keeps it (the
+  // software back buffer; OpenGL's off-screen framebuffer, or without one the window's back
+  // buffer, which a Show leaves undefined).
+  virtual KBitmap Picture() = 0;
 };

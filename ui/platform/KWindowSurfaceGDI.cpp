@@ -36,6 +36,8 @@ public:
     ::ReleaseDC(window_, device);
   }
 
+  KBitmap Picture() override { return backBuffer_; }
+
 private:
   HWND window_;
   KBitmap backBuffer_;

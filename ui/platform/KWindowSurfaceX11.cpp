@@ -32,6 +32,8 @@ public:
     XFlush(display_);
   }
 
+  KBitmap Picture() override { return backBuffer_; }
+
 private:
   Display* display_;
   Window window_;

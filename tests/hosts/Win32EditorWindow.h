@@ -10,6 +10,7 @@
 #include <cstdlib>
 #include <string>
 
+#include "tests/ui/EditorTestSupport.h"
 #include "ui/KBitmap.h"
 #include "ui/KGeometry.h"
 
@@ -27,24 +28,6 @@ inline KBitmap LinuxSnapshot(const std::string& plugin) {
   return png.empty() ? KBitmap() : KBitmap::Decode(png, "snapshot");
 }
 
-// Pixels further apart than the drawers' tolerance in any channel, within `area` (pixels; the
-// whole picture when empty); -1 for pictures of different sizes.
-inline int64_t Differences(const KBitmap& a, const KBitmap& b, KRect area = {}) {
-  if (a.Width() != b.Width() || a.Height() != b.Height() || a.Width() == 0) return -1;
-  if (area.IsEmpty()) area = a.Bounds();
-  int64_t beyond = 0;
-  for (int32_t y = area.top; y <= area.bottom; ++y)
-    for (int32_t x = area.left; x <= area.right; ++x)
-      for (int shift = 0; shift < 24; shift += 8)
-        if (std::abs(int((a.Pixel(x, y) >> shift) & 0xFF) - int((b.Pixel(x, y) >> shift) & 0xFF)) > 2) {
-          ++beyond;
-          break;
-        }
-  return beyond;
-}
-
-// Pixels of `shown` beyond the tolerance from `expected` (within `area`, all of it when empty).
-// A picture that differs is left as TORVANE_UI_PICTURES/<name>.png for a person to look at.
 inline int64_t DifferencesShown(const KBitmap& shown, const KBitmap& expected, const char* name, KRect area = {});
 
 inline RECT WindowBox(HWND window) {
@@ -112,7 +95,7 @@ inline KBitmap Screenshot(HWND window, int32_t width, int32_t height) {
 }
 
 inline int64_t DifferencesShown(const KBitmap& shown, const KBitmap& expected, const char* name, KRect area) {
-  const int64_t differences = Differences(shown, expected, area);
+  const int64_t differences = KEditorPictureDifferences(shown, expected, area);
   if (differences != 0 && shown.Width() > 0) {
     ::CreateDirectoryA(TORVANE_UI_PICTURES, nullptr);
     shown.Store(std::string(TORVANE_UI_PICTURES) + name + ".png");

@@ -2,19 +2,13 @@
 // only the changed pixels go to the window through GDI.
 #include <windows.h>
 
-#include "ui/KDrawerToKBitmap.h"
-#include "ui/platform/KWindowSurface.h"
+#include "ui/platform/KSoftwareSurface.h"
 
 namespace {
-class GDISoftwareSurface final : public KWindowSurface {
+class GDISoftwareSurface final : public KSoftwareSurface {
 public:
-  GDISoftwareSurface(HWND window, int32_t width, int32_t height, double scale)
-      : window_(window), backBuffer_(width, height), drawer_(backBuffer_, scale) {}
+  GDISoftwareSurface(HWND window, int32_t width, int32_t height, double scale) : KSoftwareSurface(width, height, scale), window_(window) {}
 
-  KDrawer& Drawer() noexcept override { return drawer_; }
-  bool IsOpenGL() const noexcept override { return false; }
-  bool KeepsPicture() const noexcept override { return true; }
-  void Begin() override {}
   void Show(const KRect& changed) override {
     if (changed.IsEmpty()) return;
     // The back buffer's 0xAARRGGBB words are a top-down 32-bit device-independent bitmap.
@@ -36,12 +30,8 @@ public:
     ::ReleaseDC(window_, device);
   }
 
-  KBitmap Picture() override { return backBuffer_; }
-
 private:
   HWND window_;
-  KBitmap backBuffer_;
-  KDrawerToKBitmap drawer_;
 };
 }  // namespace
 

@@ -46,5 +46,7 @@ for linux_render in "$linux"/vst3-render/*.f32; do
   if cmp "$linux_render" "build/windows/vst3-render/$(basename "$linux_render")"; then renders=$((renders + 1)); else status=1; fi
 done
 echo "windows: $renders VST 3 bundle renders identical to the Linux bundles'"
+# A Linux build whose suite ran leaves renders: none at all compares nothing.
+if [ -d "$linux" ] && [ "$renders" -eq 0 ]; then echo "windows: no Linux VST 3 renders in $linux/vst3-render"; status=1; fi
 echo "windows stage: $((SECONDS - start)) s"
 exit "$status"

@@ -109,8 +109,6 @@ struct EditorWindowFixture : ::testing::Test {
   // Pixels further apart than the drawers' tolerance in any channel, within `area` (pixels; the
   // whole picture when empty); -1 for pictures of different sizes.
   static int64_t Differences(const KBitmap& a, const KBitmap& b, KRect area = {}) { return KEditorPictureDifferences(a, b, area); }
-    return beyond;
-  }
 };
 
 }  // namespace KX11Test

@@ -4,7 +4,7 @@
 # cmake/mingw-w64-x86_64.cmake finds them there):
 #   bash scripts/windows-deps.sh [prefix]        (default ~/.cache/torvane-win/prefix)
 # Each library is built once per pinned version and recipe (a stamp in the prefix remembers it). The audio
-# file library is built without its external codecs: WAV, AIFF, CAF, W64 and AU, no FLAC or Ogg.
+# file library reads and writes FLAC and Ogg as on Linux; MPEG is left out.
 # Needs scripts/install-deps.sh --windows; adds Debian's source lists when they are missing.
 set -euo pipefail
 prefix=${1:-$HOME/.cache/torvane-win/prefix}
@@ -21,7 +21,13 @@ pins=(
   "libwebp 1.2.4-0.2+deb12u1"
   "freetype 2.12.1+dfsg-5+deb12u4"
   "libepoxy 1.5.10-1"
+  "libogg 1.3.5-3"
+  "libvorbis 1.3.7-1"
+  "flac 1.4.2+ds-2"
+  "opus 1.3.1-3"
   "libsndfile 1.2.0-1+deb12u1"
+  "kissfft 131.1.0-4.1~deb12u1"
+  "libsamplerate 0.2.2-3"
   "googletest 1.12.1-0.2"
 )
 
@@ -58,7 +64,7 @@ cpu = 'x86_64'
 endian = 'little'
 CROSS
 export PKG_CONFIG_LIBDIR="$prefix/lib/pkgconfig" PKG_CONFIG_PATH=""
-cmake_cross=(-G Ninja -DCMAKE_BUILD_TYPE=Release -DCMAKE_SYSTEM_NAME=Windows -DCMAKE_SYSTEM_PROCESSOR=x86_64
+cmake_cross=(-G Ninja --no-warn-unused-cli -Wno-dev -Wno-deprecated -DCMAKE_BUILD_TYPE=Release -DCMAKE_SYSTEM_NAME=Windows -DCMAKE_SYSTEM_PROCESSOR=x86_64
   -DCMAKE_C_COMPILER=$host-gcc-posix -DCMAKE_CXX_COMPILER=$host-g++-posix -DCMAKE_RC_COMPILER=$host-windres
   -DCMAKE_FIND_ROOT_PATH="/usr/$host;$prefix" -DCMAKE_FIND_ROOT_PATH_MODE_PROGRAM=NEVER
   -DCMAKE_FIND_ROOT_PATH_MODE_LIBRARY=ONLY -DCMAKE_FIND_ROOT_PATH_MODE_INCLUDE=ONLY
@@ -120,10 +126,32 @@ build_libepoxy() {
     -Ddefault_library=static -Degl=no -Dglx=no -Dx11=false -Dtests=false -Ddocs=false >/dev/null
   ninja -C "$1/_win" -j"$jobs" install >/dev/null
 }
-build_libsndfile() {
-  build_cmake "$1" -DENABLE_EXTERNAL_LIBS=OFF -DENABLE_MPEG=OFF -DBUILD_PROGRAMS=OFF -DBUILD_EXAMPLES=OFF -DBUILD_TESTING=OFF \
-    -DENABLE_CPACK=OFF -DINSTALL_PKGCONFIG_MODULE=ON -DINSTALL_MANPAGES=OFF
+# The audio-file library reads FLAC only with all of its Xiph codecs (Ogg, Vorbis, FLAC, Opus):
+# the libraries alone, without programs, tests, documents or stack-protector runtime.
+build_libogg() { build_cmake "$1" -DBUILD_TESTING=OFF -DINSTALL_DOCS=OFF; }
+build_libvorbis() { build_cmake "$1" -DBUILD_TESTING=OFF; }
+build_flac() {
+  build_cmake "$1" -DBUILD_CXXLIBS=OFF -DBUILD_PROGRAMS=OFF -DBUILD_EXAMPLES=OFF -DBUILD_TESTING=OFF -DBUILD_DOCS=OFF \
+    -DINSTALL_MANPAGES=OFF -DWITH_STACK_PROTECTOR=OFF -DWITH_FORTIFY_SOURCE=OFF -DWITH_OGG=ON
 }
+# Debian's Opus source lacks a file its CMake build includes: autotools, without the fortified
+# string calls that would need the stack-protector runtime (its configure adds them unless the
+# level is given).
+build_opus() {
+  build_autotools "$1" --disable-doc --disable-extra-programs --disable-stack-protector CPPFLAGS="-I$prefix/include -D_FORTIFY_SOURCE=0"
+}
+# FLAC's headers declare DLL imports unless told that the library is static.
+build_libsndfile() {
+  build_cmake "$1" -DENABLE_EXTERNAL_LIBS=ON -DCMAKE_C_FLAGS=-DFLAC__NO_DLL -DENABLE_MPEG=OFF -DBUILD_PROGRAMS=OFF \
+    -DBUILD_EXAMPLES=OFF -DBUILD_TESTING=OFF -DENABLE_CPACK=OFF -DINSTALL_PKGCONFIG_MODULE=ON -DINSTALL_MANPAGES=OFF
+}
+# The FFT of the convolution engine, in single precision as on Linux (kissfft-float). Its build
+# skips GNUInstallDirs outside Unix, so the folders are given.
+build_kissfft() {
+  build_cmake "$1" -DKISSFFT_DATATYPE=float -DKISSFFT_STATIC=ON -DKISSFFT_TEST=OFF -DKISSFFT_TOOLS=OFF -DKISSFFT_PKGCONFIG=ON \
+    -DCMAKE_INSTALL_LIBDIR=lib -DCMAKE_INSTALL_INCLUDEDIR=include -DCMAKE_INSTALL_BINDIR=bin
+}
+build_libsamplerate() { build_cmake "$1" -DBUILD_TESTING=OFF -DLIBSAMPLERATE_EXAMPLES=OFF; }
 build_googletest() { build_cmake "$1" -DBUILD_GMOCK=ON -Dgtest_disable_pthreads=OFF; }
 
 for pin in "${pins[@]}"; do

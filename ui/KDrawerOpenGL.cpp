@@ -159,19 +159,25 @@ void KDrawerOpenGL::CopyToDefaultFramebuffer() {
   });
 }
 
+namespace {
+// The current read buffer's width × height pixels, top row first (OpenGL's rows run bottom to top).
+KBitmap ReadPicture(int32_t width, int32_t height) {
+  KBitmap shot(width, height);
+  glPixelStorei(GL_PACK_ALIGNMENT, 4);
+  glReadPixels(0, 0, width, height, GL_BGRA, GL_UNSIGNED_BYTE, shot.Pixels());
+  for (int32_t y = 0; y < height / 2; ++y) std::swap_ranges(shot.Row(y), shot.Row(y) + width, shot.Row(height - 1 - y));
+  return shot;
+}
+}  // namespace
+
 KBitmap KDrawerOpenGL::GetScreenShot() {
   KBitmap picture;
   KGuard("KDrawerOpenGL::GetScreenShot", [&] {
     const bool wasPainting = painting_;
     if (!wasPainting) BeginPaint();
     if (!painting_) return;
-    KBitmap shot(context_.Width(), context_.Height());
-    glPixelStorei(GL_PACK_ALIGNMENT, 4);
-    glReadPixels(0, 0, shot.Width(), shot.Height(), GL_BGRA, GL_UNSIGNED_BYTE, shot.Pixels());
+    picture = ReadPicture(context_.Width(), context_.Height());
     if (!wasPainting) EndPaint();
-    // OpenGL's rows run bottom to top.
-    for (int32_t y = 0; y < shot.Height() / 2; ++y) std::swap_ranges(shot.Row(y), shot.Row(y) + shot.Width(), shot.Row(shot.Height() - 1 - y));
-    picture = std::move(shot);
   });
   return picture;
 }

@@ -124,7 +124,8 @@ enum ViewContainerType : int32_t {
 class IViewContainer {
 public:
   virtual int32_t GetType() = 0;
-  // The native window (an X11 window id cast to a pointer for kViewContainerX11Window).
+  // The native window (an HWND for kViewContainerHWND, an X11 window id cast to a pointer for
+  // kViewContainerX11Window).
   virtual void* GetPtr() = 0;
   virtual Result SetViewSize(int32_t width, int32_t height) = 0;
 

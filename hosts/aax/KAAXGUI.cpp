@@ -7,6 +7,15 @@
 
 using namespace KAAX;
 
+namespace {
+// The kind of container window this system's editor windows live in.
+#if defined(_WIN32)
+constexpr ViewContainerType kNativeContainer = kViewContainerHWND;
+#else
+constexpr ViewContainerType kNativeContainer = kViewContainerX11Window;
+#endif
+}  // namespace
+
 KAAXGUI::KAAXGUI(KAudioPluginAAXAdapter& effect) noexcept : effect_(&effect) { effect.AttachGUI(this); }
 
 KAAXGUI::~KAAXGUI() { DetachEffect(); }
@@ -36,8 +45,7 @@ Result KAAXGUI::CreateViewContents() {
       host_ = std::make_unique<KInterfaceEditorHost>(*effect_);
       view_ = std::make_unique<KHostEditor>(effect_->GetPlugin(), host_.get());
     }
-    if (container_->GetType() == kViewContainerX11Window && !view_->IsOpen())
-      view_->Open(static_cast<unsigned long>(reinterpret_cast<uintptr_t>(container_->GetPtr())));
+    if (container_->GetType() == kNativeContainer && !view_->IsOpen()) view_->Open(reinterpret_cast<uintptr_t>(container_->GetPtr()));
     return Resize(view_->PixelWidth(), view_->PixelHeight()) ? kSuccess : kErrorNotInitialized;
   });
 }

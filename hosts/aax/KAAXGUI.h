@@ -12,9 +12,9 @@ class KAudioPluginAAXAdapter;
 
 // The GUI of an AAX effect: the host makes it for one effect-parameters object, gives it a
 // view container (Create), then asks it for its contents (CreateViewContents): the plug-in's
-// editor, embedded into the container's X11 window and framed at the editor's size. The host's
-// periodic TimerWakeup runs the editor's timers and window; DeleteViewContents gives the window
-// back. Edits reach the host as the adapter's touch, set and release requests, and the editor's
+// editor, embedded into the container's window (an HWND on Windows, an X11 window on Linux)
+// and framed at the editor's size. The host's periodic TimerWakeup runs the editor's timers and
+// window; DeleteViewContents gives the window back. Edits reach the host as the adapter's touch, set and release requests, and the editor's
 // new sizes go to the container.
 //
 // Every method is guarded as the adapter's are ("KAAXGUI::<Method>").

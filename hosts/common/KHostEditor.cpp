@@ -17,7 +17,7 @@ KHostEditor::~KHostEditor() { Close(); }
 int32_t KHostEditor::PixelWidth() const noexcept { return editor_->PixelWidth(); }
 int32_t KHostEditor::PixelHeight() const noexcept { return editor_->PixelHeight(); }
 
-bool KHostEditor::Open(unsigned long parent) {
+bool KHostEditor::Open(uintptr_t parent) {
   if (window_ || parent == 0) return false;
   window_ = std::make_unique<KEditorWindow>(parent, *editor_);
   shownWidth_ = editor_->PixelWidth();

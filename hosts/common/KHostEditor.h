@@ -12,7 +12,8 @@ class KAudioPluginHost;
 class KEditor;
 
 // The plug-in's editor as the host formats without a run loop of their own show it (VST 2, AAX,
-// the LV2 UI): made once, embedded into a host's X11 window on Open, driven only by the host's
+// the LV2 UI): made once, embedded into a host's window (X11, or an HWND on Windows) on Open,
+// driven only by the host's
 // idle calls, given back on Close and opened again at will. Edits go to the `host` the format
 // glue gives (by default the plug-in's host interface: begin, send, end gesture and the
 // editor-resize slot); a host that takes the new size has the window follow it at the next idle.
@@ -31,9 +32,10 @@ public:
   int32_t PixelWidth() const noexcept;
   int32_t PixelHeight() const noexcept;
 
-  // A child window of the X11 window `parent`, painted at once; false when one is open already
-  // or `parent` is 0. KException when there is no display.
-  bool Open(unsigned long parent);
+  // A child window of the host's window `parent` (an X11 window, or an HWND on Windows), painted
+  // at once; false when one is open already or `parent` is 0. KException when there is no
+  // display or the system refuses the window.
+  bool Open(uintptr_t parent);
   void Close() noexcept;
   // The host's idle call: the editor's timers, the window's events, the size the host took.
   void Idle();

@@ -53,7 +53,7 @@ bool KAudioPluginVSTAdapter::KEditor::getRect(ERect** rect) {
 
 bool KAudioPluginVSTAdapter::KEditor::open(void* window) {
   return KHostGuarded("KAudioPluginVSTAdapter::KEditor::open", false,
-                      [&] { return View().Open(static_cast<unsigned long>(reinterpret_cast<uintptr_t>(window))); });
+                      [&] { return View().Open(reinterpret_cast<uintptr_t>(window)); });
 }
 
 void KAudioPluginVSTAdapter::KEditor::close() {

@@ -6,9 +6,9 @@
 #include "hosts/common/KHostEditor.h"
 #include "hosts/vst2/KAudioPluginVSTAdapter.h"
 
-// The plug-in's editor in a VST 2 host's window: on Linux the host hands effEditOpen an X11
-// window to embed into, and drives everything else by its effEditIdle calls (the editor's timers,
-// the window's events, gestures that went quiet). The editor itself is made on the host's first
+// The plug-in's editor in a VST 2 host's window: the host hands effEditOpen the window to embed
+// into (an X11 window on Linux, an HWND on Windows) and drives everything else by its effEditIdle
+// calls (the editor's timers, the window's events, gestures that went quiet). The editor itself is made on the host's first
 // question about it, so that a host that never opens it (a scanner) never builds it.
 //
 // A new size (the editor's size menu) goes to the host with sizeWindow; a host that refuses has

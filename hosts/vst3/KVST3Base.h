@@ -3,7 +3,10 @@
 // Our declarations of the VST 3 interfaces, written from the interface's published facts: the
 // interface identifiers, the order of each vtable, the argument types and the record layouts.
 // Linux and macOS conventions: the compiler's default calling convention, natural alignment,
-// result codes of the non-COM family and identifiers stored as four big-endian 32-bit words.
+// result codes of the non-COM family and identifiers stored as four big-endian 32-bit words. On
+// Windows the interface is COM's: result codes are HRESULTs and identifiers are GUIDs in memory
+// (the first word and the two halves of the second little-endian, the rest as published); x64
+// has one calling convention.
 // Method names follow our own style; only the slot order counts across the boundary. Each
 // interface has a protected destructor: it adds no slot, and nobody deletes through it.
 
@@ -13,6 +16,17 @@
 namespace KVST3 {
 
 using TResult = int32_t;
+#if defined(_WIN32)
+inline constexpr TResult kNoInterface = static_cast<TResult>(0x80004002);
+inline constexpr TResult kResultOk = 0;
+inline constexpr TResult kResultTrue = 0;
+inline constexpr TResult kResultFalse = 1;
+inline constexpr TResult kInvalidArgument = static_cast<TResult>(0x80070057);
+inline constexpr TResult kNotImplemented = static_cast<TResult>(0x80004001);
+inline constexpr TResult kInternalError = static_cast<TResult>(0x80004005);
+inline constexpr TResult kNotInitialized = static_cast<TResult>(0x8000FFFF);
+inline constexpr TResult kOutOfMemory = static_cast<TResult>(0x8007000E);
+#else
 inline constexpr TResult kNoInterface = -1;
 inline constexpr TResult kResultOk = 0;
 inline constexpr TResult kResultTrue = 0;
@@ -22,6 +36,7 @@ inline constexpr TResult kNotImplemented = 3;
 inline constexpr TResult kInternalError = 4;
 inline constexpr TResult kNotInitialized = 5;
 inline constexpr TResult kOutOfMemory = 6;
+#endif
 
 using TBool = uint8_t;
 using TChar = char16_t;
@@ -39,6 +54,18 @@ struct KUID {
     const uint32_t words[4] = {a, b, c, d};
     for (int w = 0; w < 4; ++w)
       for (int k = 0; k < 4; ++k) id.bytes[4 * w + k] = static_cast<char>((words[w] >> (24 - 8 * k)) & 0xFF);
+#if defined(_WIN32)
+    // A GUID's Data1 (4 bytes), Data2 and Data3 (2 bytes each) are little-endian.
+    const auto swap = [&id](int i, int j) {
+      const char t = id.bytes[i];
+      id.bytes[i] = id.bytes[j];
+      id.bytes[j] = t;
+    };
+    swap(0, 3);
+    swap(1, 2);
+    swap(4, 5);
+    swap(6, 7);
+#endif
     return id;
   }
   constexpr bool operator==(const KUID&) const noexcept = default;

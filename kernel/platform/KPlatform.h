@@ -35,6 +35,10 @@ bool OpenTraceDestination() noexcept;
 // linked into), ending in the separator: where files installed beside the kernel are found.
 std::string KernelFolder();
 
+// Where the file name begins in `path`: after its last separator ('/', on Windows '\\' too), 0
+// when it has none.
+size_t FileNameStart(const std::string& path) noexcept;
+
 // Files and folders. Paths are UTF-8; a folder path ends in the system's separator. Failures
 // throw KException with a sentence naming the path and the system's reason, e.g.
 // "Could not write the file '{0}' ({1})." (see each function).

@@ -19,3 +19,11 @@ private:
   int64_t count_ = 0;
   KAllocationCounter* outer_;
 };
+
+// Whether the malloc family is counted as well as operator new: not on Windows, where MinGW's
+// thread-local storage allocates through malloc itself (see AllocationCounter.cpp).
+#if defined(_WIN32)
+inline constexpr bool kAllocationCounterSeesMalloc = false;
+#else
+inline constexpr bool kAllocationCounterSeesMalloc = true;
+#endif

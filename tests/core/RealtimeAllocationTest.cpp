@@ -38,7 +38,7 @@ TEST(RealtimeAllocation, RampsEventsAndChannelModesProcessWithoutAllocating) {
     probe.Append(1);
     probe.Append(2);
     const std::vector<int> one(1);
-    EXPECT_EQ(allocations.Count() - afterFirst - processing, 3);
+    EXPECT_EQ(allocations.Count() - afterFirst - processing, kAllocationCounterSeesMalloc ? 3 : 1);
     EXPECT_EQ(processing, 0) << (plugin == &utility ? "utility" : "recorder");
   }
   EXPECT_GT(recorder.Log().size(), 1u);  // the recorder was really driven

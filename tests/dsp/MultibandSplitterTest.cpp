@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <complex>
+#include <numbers>
 #include <cstdint>
 #include <limits>
 #include <vector>
@@ -34,7 +35,7 @@ Bands ImpulseResponses(KMultibandSplitter& splitter, int32_t channel = 0) {
 
 // The level in dB of a response at `hz`, from its transform at that one frequency.
 double LevelDb(const std::vector<double>& response, double hz) {
-  const std::complex<double> turn = std::polar(1.0, -2.0 * M_PI * hz / kRate);
+  const std::complex<double> turn = std::polar(1.0, -2.0 * std::numbers::pi * hz / kRate);
   std::complex<double> sum, z = 1.0;
   for (size_t n = 0; n < response.size(); ++n, z *= turn) sum += response[n] * z;
   return KLinearToDecibels(std::abs(sum));

@@ -110,6 +110,12 @@ inline KChunk GetChunk(KEffectParameters& effect, ChunkId id) {  // sized first,
 }
 
 using ACFEntry = ACFResult (*)(IACFUnknown*);
+// The loader's file name ends as the bundle's on Windows.
+#if defined(_WIN32)
+inline constexpr const char* kLoaderSuffix = ".aaxplugin";
+#else
+inline constexpr const char* kLoaderSuffix = ".so";
+#endif
 
 // A bundle's loader opened, started and registered as an AAX host does; shut down and unloaded.
 struct KBundle {
@@ -118,7 +124,7 @@ struct KBundle {
   template <class Function>
   Function Entry(const char* name) { return reinterpret_cast<Function>(KPlatform::FindSymbol(library, name)); }
   explicit KBundle(const std::string& name)
-      : library(KPlatform::OpenLibrary(TORVANE_AAX_DIR "/" + name + ".aaxplugin/Contents/" TORVANE_AAX_ARCH "/" + name + ".so")) {
+      : library(KPlatform::OpenLibrary(TORVANE_AAX_DIR "/" + name + ".aaxplugin/Contents/" TORVANE_AAX_ARCH "/" + name + kLoaderSuffix)) {
     EXPECT_NE(library, nullptr) << KPlatform::LibraryError();
     uint64_t version = 0;
     EXPECT_EQ(Entry<ACFEntry>("ACFStartup")(nullptr), kACFOk);

@@ -108,19 +108,7 @@ struct EditorWindowFixture : ::testing::Test {
   }
   // Pixels further apart than the drawers' tolerance in any channel, within `area` (pixels; the
   // whole picture when empty); -1 for pictures of different sizes.
-  static int64_t Differences(const KBitmap& a, const KBitmap& b, KRect area = {}) {
-    if (a.Width() != b.Width() || a.Height() != b.Height()) return -1;
-    if (area.IsEmpty()) area = a.Bounds();
-    int64_t beyond = 0;
-    for (int32_t y = area.top; y <= area.bottom; ++y)
-      for (int32_t x = area.left; x <= area.right; ++x)
-        for (int shift = 0; shift < 24; shift += 8)
-          if (std::abs(int((a.Pixel(x, y) >> shift) & 0xFF) - int((b.Pixel(x, y) >> shift) & 0xFF)) > 2) {
-            ++beyond;
-            break;
-          }
-    return beyond;
-  }
+  static int64_t Differences(const KBitmap& a, const KBitmap& b, KRect area = {}) { return KEditorPictureDifferences(a, b, area); }
 };
 
 }  // namespace KX11Test

@@ -2,6 +2,7 @@
 
 #include <cmath>
 #include <complex>
+#include <numbers>
 #include <vector>
 
 #include "core/KParameter.h"
@@ -30,7 +31,7 @@ TEST(MultibandCompressor, UncompressedBandsSumToAFlatResponse) {
     const Channels out = Render(*compressor, in, {1024});
     for (double hz = 30.0; hz < 20000.0; hz *= 1.3) {
       std::complex<double> sum;
-      for (size_t n = 0; n < out[0].size(); ++n) sum += static_cast<double>(out[0][n]) * std::polar(1.0, -2.0 * M_PI * hz * n / 48000.0);
+      for (size_t n = 0; n < out[0].size(); ++n) sum += static_cast<double>(out[0][n]) * std::polar(1.0, -2.0 * std::numbers::pi * hz * n / 48000.0);
       EXPECT_NEAR(20.0 * std::log10(std::abs(sum)), 0.0, 0.01) << bands << " bands at " << hz << " Hz";
     }
   }

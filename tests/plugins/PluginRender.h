@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <complex>
+#include <numbers>
 #include <initializer_list>
 #include <span>
 #include <vector>
@@ -39,7 +40,7 @@ inline Channels Render(KAudioPlugin& plugin, const Channels& in, std::initialize
 inline Channels Sine(size_t channels, size_t length, double hz, double amplitude, size_t from = 0, size_t to = SIZE_MAX) {
   Channels rows(channels, std::vector<float>(length));
   for (auto& row : rows)
-    for (size_t i = from; i < std::min(length, to); ++i) row[i] = static_cast<float>(amplitude * std::sin(2.0 * M_PI * hz * static_cast<double>(i) / 48000.0));
+    for (size_t i = from; i < std::min(length, to); ++i) row[i] = static_cast<float>(amplitude * std::sin(2.0 * std::numbers::pi * hz * static_cast<double>(i) / 48000.0));
   return rows;
 }
 
@@ -47,7 +48,7 @@ inline Channels Sine(size_t channels, size_t length, double hz, double amplitude
 // frequency of the transform, over whole periods for a steady tone.
 inline double Amplitude(const std::vector<float>& row, double hz, size_t from, size_t to) {
   std::complex<double> sum;
-  for (size_t i = from; i < to; ++i) sum += static_cast<double>(row[i]) * std::polar(1.0, -2.0 * M_PI * hz * static_cast<double>(i) / 48000.0);
+  for (size_t i = from; i < to; ++i) sum += static_cast<double>(row[i]) * std::polar(1.0, -2.0 * std::numbers::pi * hz * static_cast<double>(i) / 48000.0);
   return 2.0 * std::abs(sum) / static_cast<double>(to - from);
 }
 

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdlib>
 #include <memory>
 #include <string>
 #include <vector>
@@ -7,6 +8,7 @@
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
 #include "kernel/KEntryPoints.h"
+#include "ui/KBitmap.h"
 #include "ui/controls/KControlTree.h"
 #include "ui/controls/KEditorHost.h"
 
@@ -50,6 +52,23 @@ T* KFindControl(KControl& from, F&& match) {
   for (int32_t i = 0; i < from.ChildCount(); ++i)
     if (T* found = KFindControl<T>(from.Child(i), match)) return found;
   return nullptr;
+}
+
+// Pixels of two editor pictures further apart than the drawers' tolerance (2) in any colour
+// channel, within `area` (pixels; the whole picture when empty); -1 for pictures of different
+// sizes.
+inline int64_t KEditorPictureDifferences(const KBitmap& a, const KBitmap& b, KRect area = {}) {
+  if (a.Width() != b.Width() || a.Height() != b.Height()) return -1;
+  if (area.IsEmpty()) area = a.Bounds();
+  int64_t beyond = 0;
+  for (int32_t y = area.top; y <= area.bottom; ++y)
+    for (int32_t x = area.left; x <= area.right; ++x)
+      for (int shift = 0; shift < 24; shift += 8)
+        if (std::abs(int((a.Pixel(x, y) >> shift) & 0xFF) - int((b.Pixel(x, y) >> shift) & 0xFF)) > 2) {
+          ++beyond;
+          break;
+        }
+  return beyond;
 }
 
 inline KPoint KCentreOf(const KRect& r) { return {(r.left + r.right) / 2, (r.top + r.bottom) / 2}; }

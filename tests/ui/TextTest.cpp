@@ -2,6 +2,7 @@
 // alignment says, in the sizes and styles help texts use.
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <fstream>
 
 #include "ui/KDrawerToKBitmap.h"
@@ -29,7 +30,7 @@ KBitmap Text(const KRect& rect, const char16_t* text, const KFont& font, uint32_
 TEST(Text, TheFontFilesLieBesideTheKernel) {
   const std::string folder = KFont::FontFolder();
   ASSERT_FALSE(folder.empty());
-  EXPECT_EQ(folder.back(), '/');
+  EXPECT_EQ(folder.back(), static_cast<char>(std::filesystem::path::preferred_separator));
   EXPECT_TRUE(std::ifstream(folder + "DejaVuSans.ttf").good()) << folder;
 }
 

@@ -92,8 +92,7 @@ KStyle KStyle::Load(const std::string& path) {
   try {
     const std::optional<std::string> text = KPlatform::ReadFile(path);
     if (!text) return style;
-    const size_t slash = path.find_last_of('/');
-    style.Apply(KXMLReader::Read(*text), slash == std::string::npos ? std::string() : path.substr(0, slash + 1));
+    style.Apply(KXMLReader::Read(*text), path.substr(0, KPlatform::FileNameStart(path)));
   } catch (const KException& e) {
     KShowUserMessage(KFormat("The skin '{0}' could not be used, so the default skin is shown.\n\n{1}")
                          .Arg(KString::FromUtf8(path))

@@ -8,9 +8,11 @@
 #include <cwchar>
 
 #include "kernel/KException.h"
-#include "ui/KDrawerToKBitmap.h"
 #include "ui/editor/KEditor.h"
 #include "ui/platform/KEditorPaint.h"
+#include "ui/platform/KOpenGLWindowContext.h"
+#include "ui/platform/KWin32Module.h"
+#include "ui/platform/KWindowSurface.h"
 
 namespace {
 constexpr wchar_t kClassName[] = L"TorvaneEditor";
@@ -55,8 +57,10 @@ LRESULT CALLBACK EditorProcedure(HWND window, UINT message, WPARAM wParam, LPARA
 
 ATOM RegisterEditorClass() noexcept {
   WNDCLASSW type{};
+  // A device of its own per window: the pixel format and context of OpenGL stay with it.
+  type.style = CS_OWNDC;
   type.lpfnWndProc = EditorProcedure;
-  type.hInstance = ::GetModuleHandleW(nullptr);
+  type.hInstance = KThisModule();
   type.hCursor = ::LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(IDC_ARROW));
   type.lpszClassName = kClassName;
   return ::RegisterClassW(&type);
@@ -67,30 +71,35 @@ KEditorWindowWin32::KEditorWindowWin32(uintptr_t parent, KEditor& editor) : edit
   static const ATOM registered = RegisterEditorClass();
   if (registered) {
     window_ = ::CreateWindowExW(0, kClassName, L"", WS_CHILD | WS_VISIBLE | WS_CLIPSIBLINGS, 0, 0, editor_.PixelWidth(),
-                                editor_.PixelHeight(), reinterpret_cast<HWND>(parent), nullptr, ::GetModuleHandleW(nullptr), this);
+                                editor_.PixelHeight(), reinterpret_cast<HWND>(parent), nullptr, KThisModule(), this);
   }
   if (!window_) throw KException("The editor cannot open its window.");
-  MakeBackBuffer();
+  MakeSurface();
   ::SetTimer(window_, kTickTimer, kTickMilliseconds, nullptr);
 }
 
 KEditorWindowWin32::~KEditorWindowWin32() {
   ::KillTimer(window_, kTickTimer);
   ::SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
+  // The context goes before the window it paints.
+  surface_.reset();
   ::DestroyWindow(window_);
-  drawer_.reset();
 }
 
-void KEditorWindowWin32::MakeBackBuffer() {
-  drawer_.reset();
-  backBuffer_ = KBitmap(editor_.PixelWidth(), editor_.PixelHeight());
-  drawer_ = std::make_unique<KDrawerToKBitmap>(backBuffer_, editor_.Scale());
-  editor_.Tree().InvalidateAll();
+bool KEditorWindowWin32::PaintsWithOpenGL() const noexcept { return surface_->IsOpenGL(); }
+KBitmap KEditorWindowWin32::Picture() { return surface_->Picture(); }
+
+void KEditorWindowWin32::MakeSurface() {
+  surface_.reset();
+  const int32_t width = editor_.PixelWidth(), height = editor_.PixelHeight();
+  surface_ = KMakeWindowSurface(
+      editor_, [&] { return KOpenGLWindowContext::CreateForWin32(window_, width, height); },
+      [&] { return KWindowSurface::Win32Software(window_, width, height, editor_.Scale()); });
 }
 
 void KEditorWindowWin32::Resize() {
   ::SetWindowPos(window_, nullptr, 0, 0, editor_.PixelWidth(), editor_.PixelHeight(), SWP_NOMOVE | SWP_NOZORDER | SWP_NOACTIVATE);
-  MakeBackBuffer();
+  MakeSurface();
   PaintDirty();
 }
 
@@ -165,25 +174,4 @@ bool KEditorWindowWin32::HandleMessage(unsigned message, uintptr_t wParam, intpt
   return true;
 }
 
-int64_t KEditorWindowWin32::PaintDirty() {
-  return KPaintEditorDirty(editor_, *drawer_, lastFullPaintMs_, [this](const KRect& pixels) { Present(pixels); });
-}
-
-void KEditorWindowWin32::Present(const KRect& pixels) {
-  if (pixels.IsEmpty()) return;
-  // The back buffer's 0xAARRGGBB words are a top-down 32-bit device-independent bitmap.
-  BITMAPINFO info{};
-  info.bmiHeader.biSize = sizeof(info.bmiHeader);
-  info.bmiHeader.biWidth = backBuffer_.Width();
-  info.bmiHeader.biHeight = -backBuffer_.Height();
-  info.bmiHeader.biPlanes = 1;
-  info.bmiHeader.biBitCount = 32;
-  info.bmiHeader.biCompression = BI_RGB;
-  HDC device = ::GetDC(window_);
-  if (!device) return;
-  // Only the repainted area reaches the window: the rest is clipped away.
-  ::IntersectClipRect(device, pixels.left, pixels.top, pixels.right + 1, pixels.bottom + 1);
-  ::SetDIBitsToDevice(device, 0, 0, static_cast<DWORD>(backBuffer_.Width()), static_cast<DWORD>(backBuffer_.Height()), 0, 0, 0,
-                      static_cast<UINT>(backBuffer_.Height()), backBuffer_.Pixels(), &info, DIB_RGB_COLORS);
-  ::ReleaseDC(window_, device);
-}
+int64_t KEditorWindowWin32::PaintDirty() { return KPaintEditorDirty(editor_, *surface_, lastFullPaintMs_); }

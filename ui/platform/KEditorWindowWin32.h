@@ -4,15 +4,15 @@
 #include <memory>
 
 #include "ui/KBitmap.h"
-#include "ui/KGeometry.h"
 
 class KEditor;
-class KDrawerToKBitmap;
+class KWindowSurface;
 struct HWND__;
 
 // An editor in a Win32 child window of a host's window. Messages reach it through the host's
-// message loop; its own timer drives the editor's tick. Painting goes through the software
-// drawer into a back buffer, of which only the repainted area is put on the window through GDI.
+// message loop; its own timer drives the editor's tick. The OpenGL drawer paints it through WGL
+// where the system has OpenGL, else the software drawer through GDI; either repaints only what
+// changed.
 class KEditorWindowWin32 {
 public:
   // A child window of `parent` (an HWND) the editor's pixel size. Throws KException when the
@@ -36,17 +36,19 @@ public:
   // Paints what is dirty and puts it on the window; answers the pixels put.
   int64_t PaintDirty();
   double LastFullPaintMs() const noexcept { return lastFullPaintMs_; }
+  bool PaintsWithOpenGL() const noexcept;
+  // The picture last painted for the window, as its drawer reads it back.
+  KBitmap Picture();
 
   // The window procedure's way in; answers whether the message was handled.
   bool HandleMessage(unsigned message, uintptr_t wParam, intptr_t lParam);
 
 private:
-  void Present(const KRect& pixels);
-  void MakeBackBuffer();
+  // A surface of the editor's pixel size: OpenGL's when it can paint, else software.
+  void MakeSurface();
 
   KEditor& editor_;
   HWND__* window_ = nullptr;
-  KBitmap backBuffer_;
-  std::unique_ptr<KDrawerToKBitmap> drawer_;
+  std::unique_ptr<KWindowSurface> surface_;
   double lastFullPaintMs_ = 0;
 };

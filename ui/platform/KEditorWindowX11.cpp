@@ -60,19 +60,16 @@ KEditorWindowX11::~KEditorWindowX11() {
 }
 
 bool KEditorWindowX11::PaintsWithOpenGL() const noexcept { return surface_->IsOpenGL(); }
+KBitmap KEditorWindowX11::Picture() { return surface_->Picture(); }
 
 int KEditorWindowX11::FileDescriptor() const noexcept { return ConnectionNumber(display_); }
 
 void KEditorWindowX11::MakeSurface() {
   surface_.reset();
   const int32_t width = editor_.PixelWidth(), height = editor_.PixelHeight();
-  try {
-    surface_ = KWindowSurface::OpenGL(KOpenGLWindowContext::CreateForX11(display_, window_, width, height), editor_.Scale());
-  } catch (const KException&) {
-    // No OpenGL here (or not enough of it): the same picture in software.
-    surface_ = KWindowSurface::X11Software(display_, window_, width, height, editor_.Scale());
-  }
-  editor_.Tree().InvalidateAll();
+  surface_ = KMakeWindowSurface(
+      editor_, [&] { return KOpenGLWindowContext::CreateForX11(display_, window_, width, height); },
+      [&] { return KWindowSurface::X11Software(display_, window_, width, height, editor_.Scale()); });
 }
 
 void KEditorWindowX11::Resize() {
@@ -157,10 +154,4 @@ void KEditorWindowX11::HandleEvent(const XEvent& event) {
   }
 }
 
-int64_t KEditorWindowX11::PaintDirty() {
-  KControlTree& tree = editor_.Tree();
-  if (!tree.NeedsPaint()) return 0;
-  if (!surface_->KeepsPicture()) tree.InvalidateAll();
-  surface_->Begin();
-  return KPaintEditorDirty(editor_, surface_->Drawer(), lastFullPaintMs_, [this](const KRect& pixels) { surface_->Show(pixels); });
-}
+int64_t KEditorWindowX11::PaintDirty() { return KPaintEditorDirty(editor_, *surface_, lastFullPaintMs_); }

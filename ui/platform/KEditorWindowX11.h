@@ -3,6 +3,8 @@
 #include <cstdint>
 #include <memory>
 
+#include "ui/KBitmap.h"
+
 class KEditor;
 class KWindowSurface;
 
@@ -37,6 +39,8 @@ public:
   // The milliseconds the last full repaint took, until its pixels were on their way to the window.
   double LastFullPaintMs() const noexcept { return lastFullPaintMs_; }
   bool PaintsWithOpenGL() const noexcept;
+  // The picture last painted for the window, as its drawer reads it back.
+  KBitmap Picture();
 
 private:
   void HandleEvent(const union _XEvent& event);

@@ -2,6 +2,7 @@
 
 #include <memory>
 
+#include "ui/KBitmap.h"
 #include "ui/KGeometry.h"
 
 class KDrawer;
@@ -24,6 +25,9 @@ public:
   // `display` with XPutImage.
   static std::unique_ptr<KWindowSurface> X11Software(struct _XDisplay* display, unsigned long window, int32_t width,
                                                      int32_t height, double scale);
+  // The software drawer into a back buffer of width × height pixels, put on a Win32 window
+  // through GDI.
+  static std::unique_ptr<KWindowSurface> Win32Software(struct HWND__* window, int32_t width, int32_t height, double scale);
 
   virtual KDrawer& Drawer() noexcept = 0;
   virtual bool IsOpenGL() const noexcept = 0;
@@ -32,4 +36,8 @@ public:
   virtual void Begin() = 0;
   // Puts the pixels in `changed` (inclusive; empty for none) on the window and ends the paint.
   virtual void Show(const KRect& changed) = 0;
+  // Outside a paint: the picture the drawer last painted, read back from where it keeps it (the
+  // software back buffer; OpenGL's off-screen framebuffer, or without one the window's back
+  // buffer, which a Show leaves undefined).
+  virtual KBitmap Picture() = 0;
 };

@@ -26,6 +26,7 @@ public:
     }
     drawer_.EndPaint();
   }
+  KBitmap Picture() override { return drawer_.GetScreenShot(); }
 
 private:
   std::unique_ptr<KOpenGLWindowContext> context_;

@@ -3,21 +3,15 @@
 #include <X11/Xlib.h>
 #include <X11/Xutil.h>
 
-#include "ui/KDrawerToKBitmap.h"
-#include "ui/platform/KWindowSurface.h"
+#include "ui/platform/KSoftwareSurface.h"
 
 namespace {
-class X11SoftwareSurface final : public KWindowSurface {
+class X11SoftwareSurface final : public KSoftwareSurface {
 public:
   X11SoftwareSurface(Display* display, Window window, int32_t width, int32_t height, double scale)
-      : display_(display), window_(window), gc_(XCreateGC(display, window, 0, nullptr)), backBuffer_(width, height),
-        drawer_(backBuffer_, scale) {}
+      : KSoftwareSurface(width, height, scale), display_(display), window_(window), gc_(XCreateGC(display, window, 0, nullptr)) {}
   ~X11SoftwareSurface() override { XFreeGC(display_, gc_); }
 
-  KDrawer& Drawer() noexcept override { return drawer_; }
-  bool IsOpenGL() const noexcept override { return false; }
-  bool KeepsPicture() const noexcept override { return true; }
-  void Begin() override {}
   void Show(const KRect& changed) override {
     if (changed.IsEmpty()) return;
     // The back buffer's pixels are 0xAARRGGBB words: the layout of a 24-bit TrueColor visual.
@@ -36,8 +30,6 @@ private:
   Display* display_;
   Window window_;
   GC gc_;
-  KBitmap backBuffer_;
-  KDrawerToKBitmap drawer_;
 };
 }  // namespace
 

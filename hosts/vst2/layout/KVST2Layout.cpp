@@ -38,9 +38,12 @@ int main(int argc, char** argv) {
       list << name << "\n";
     }
     KCopyIfChanged(kernel, dir / argv[4]);
-    std::ifstream previous(dir / "modules.txt");
-    for (std::string name; std::getline(previous, name);)
-      if (!names.contains(name)) fs::remove(dir / (name + loader.extension().string()));
+    {
+      // Closed before the rename: Windows replaces no file that is open.
+      std::ifstream previous(dir / "modules.txt");
+      for (std::string name; std::getline(previous, name);)
+        if (!names.contains(name)) fs::remove(dir / (name + loader.extension().string()));
+    }
     list.close();
     fs::rename(dir / "modules.txt.new", dir / "modules.txt");
   } catch (const std::exception& failure) {

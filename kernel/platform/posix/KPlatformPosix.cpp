@@ -63,16 +63,10 @@ bool ConsumeInjectedFailure() noexcept {
   return left > 0;
 }
 
-// Where the file name begins in `path`: after the last separator.
-size_t NameStart(const std::string& path) noexcept {
-  const size_t slash = path.rfind('/');
-  return slash == std::string::npos ? 0 : slash + 1;
-}
-
 // A hidden sibling of `path` that no other writer uses: ".<name>.<pid>-<counter>.tmp". Created
 // exclusively, so a name left by a crashed process is skipped rather than reused.
 int OpenTemporarySibling(const std::string& path, std::string& temporary) {
-  const size_t start = NameStart(path);
+  const size_t start = KPlatform::FileNameStart(path);
   for (int attempt = 0; attempt < 100; ++attempt) {
     temporary = path.substr(0, start) + "." + path.substr(start) + "." + std::to_string(::getpid()) + "-" +
                 std::to_string(gTemporaryCounter.fetch_add(1)) + ".tmp";
@@ -86,7 +80,7 @@ int OpenTemporarySibling(const std::string& path, std::string& temporary) {
 // Makes a finished rename in the folder of `path` durable. Best effort: the new content is
 // already in place, and a folder that cannot be synced is no reason to report a failed write.
 void SyncFolderOf(const std::string& path) {
-  const size_t start = NameStart(path);
+  const size_t start = KPlatform::FileNameStart(path);
   const std::string folder = start == 0 ? std::string(".") : path.substr(0, start);
   const int fd = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   if (fd < 0) return;
@@ -299,5 +293,10 @@ std::string KPlatform::KernelFolder() {
   char* resolved = ::realpath(info.dli_fname, nullptr);
   std::string path = resolved ? resolved : info.dli_fname;
   std::free(resolved);
-  return path.substr(0, NameStart(path));
+  return path.substr(0, KPlatform::FileNameStart(path));
+}
+
+size_t KPlatform::FileNameStart(const std::string& path) noexcept {
+  const size_t slash = path.rfind('/');
+  return slash == std::string::npos ? 0 : slash + 1;
 }

@@ -65,17 +65,11 @@ bool ConsumeInjectedFailure() noexcept {
   return left > 0;
 }
 
-// Where the file name begins in `path`: after the last separator of either kind.
-size_t NameStart(const std::string& path) noexcept {
-  const size_t separator = path.find_last_of("/\\");
-  return separator == std::string::npos ? 0 : separator + 1;
-}
-
 // A sibling of `path` that no other writer uses: ".<name>.<pid>-<counter>.tmp", created
 // exclusively, so a name left by a crashed process is skipped rather than reused. Answers the
 // open handle, or INVALID_HANDLE_VALUE with the system's error set.
 HANDLE OpenTemporarySibling(const std::string& path, std::string& temporary) {
-  const size_t start = NameStart(path);
+  const size_t start = KPlatform::FileNameStart(path);
   for (int attempt = 0; attempt < 100; ++attempt) {
     temporary = path.substr(0, start) + "." + path.substr(start) + "." + std::to_string(::GetCurrentProcessId()) + "-" +
                 std::to_string(gTemporaryCounter.fetch_add(1)) + ".tmp";
@@ -124,11 +118,12 @@ uint64_t KPlatform::MillisecondClock() noexcept {
 
 void KPlatform::ShowMessageBox(const char16_t* text, size_t length) noexcept {
   try {
-    // A box that cannot be shown (no display behind the desktop) answers 0: the text then goes
-    // to the standard error stream as well.
+    // A box that was shown answers the button that closed it; one that could not be shown (no
+    // display behind the desktop) answers 0, or -1 from a dialog whose window failed (as under
+    // Wine without a display): the text then goes to the standard error stream as well.
     if (HasDesktop()) {
       const std::wstring wide(reinterpret_cast<const wchar_t*>(text), length);
-      if (::MessageBoxW(nullptr, wide.c_str(), nullptr, MB_OK | MB_ICONEXCLAMATION) != 0) return;
+      if (::MessageBoxW(nullptr, wide.c_str(), nullptr, MB_OK | MB_ICONEXCLAMATION) > 0) return;
     }
     std::string line;
     KUtf8::Encode(text, static_cast<int32_t>(length), line);
@@ -348,5 +343,10 @@ void KPlatform::RemoveFolderTree(const std::string& path) {
 std::string KPlatform::KernelFolder() {
   static const char anchor = 0;
   const std::string path = ModulePathOf(&anchor);
-  return path.substr(0, NameStart(path));
+  return path.substr(0, KPlatform::FileNameStart(path));
+}
+
+size_t KPlatform::FileNameStart(const std::string& path) noexcept {
+  const size_t separator = path.find_last_of("/\\");
+  return separator == std::string::npos ? 0 : separator + 1;
 }

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 #include <memory>
 #include <vector>
@@ -27,3 +28,9 @@ struct KModuleChain {
 };
 
 using KChainExchange = KHandOver<KModuleChain>;
+
+// The newest chain as threads other than the audio thread read it (a host asking a slot
+// parameter's text while the user-interface thread edits): shared, so that a reader keeps the
+// chain and its modules it holds alive however soon the hand-over lets that chain go. The
+// audio thread never touches it.
+using KChainView = std::atomic<std::shared_ptr<const KModuleChain>>;

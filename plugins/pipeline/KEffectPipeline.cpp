@@ -48,7 +48,7 @@ const KAudioPluginBase::Parameter* KSlotKind::Carried(const KModuleChain& chain)
 }
 
 KString KSlotKind::ToText(double working) const {
-  const std::shared_ptr<const KModuleChain> chain = view_.load();
+  const std::shared_ptr<const KModuleChain> chain = view_.Load();
   const KAudioPluginBase::Parameter* carried = Carried(*chain);
   if (!carried) return KString::Static("-");
   const KString unit = carried->Unit();
@@ -57,7 +57,7 @@ KString KSlotKind::ToText(double working) const {
 }
 
 bool KSlotKind::FromText(const KString& text, double& working) const {
-  const std::shared_ptr<const KModuleChain> chain = view_.load();
+  const std::shared_ptr<const KModuleChain> chain = view_.Load();
   const KAudioPluginBase::Parameter* carried = Carried(*chain);
   return carried && carried->NormalizedFromText(text, working);
 }
@@ -180,7 +180,7 @@ void KEffectPipeline::SetModuleBypass(int32_t slot, bool bypass) {
 
 void KEffectPipeline::Publish(std::unique_ptr<KModuleChain> chain) {
   // Readers on other threads get a copy of their own, whatever the hand-over frees.
-  view.store(std::make_shared<const KModuleChain>(*chain));
+  view.Store(std::make_shared<const KModuleChain>(*chain));
   chains.Publish(std::move(chain));
   MarkUpdatePending();
   ReportLatency(LatencyOf(Chain()));

@@ -278,17 +278,20 @@ TEST(KEffectPipeline, AutomatingAModulesLastParameterMovesIt) {
   const double target = carried.Kind().ToNormalized(-6.0);
   const int32_t host = P::ParameterIndex(slot, last);
   EXPECT_EQ(host, P::kFirstExtra + slot * (P::kModuleParameters - P::kSlotParameters) + last - P::kSlotParameters);
-  pipeline->PostValue(host, target, 0);  // as a host's automation arrives
-
+  KEqualizerPlugin equalizer;
+  ASSERT_TRUE(equalizer.SetSampleRate(kRate));
+  // Both run a block first, so that the value arrives at a running module and glides alike.
   std::vector<Signal> viaPipeline = Program(4800), viaPlugin = viaPipeline;
+  std::vector<Signal> first = Program(480), second = first;
+  Play(*pipeline, first, 480);
+  Play(equalizer, second, 480);
+  pipeline->GetParameter(host).SetNormalized(target);  // as a host sets it between blocks
   Play(*pipeline, viaPipeline, 480);
   EXPECT_EQ(carried.Normalized(), target);
   const std::string unit = carried.Unit().ToUtf8();
   EXPECT_EQ(pipeline->GetParameter(host).Text().ToUtf8(), carried.Text().ToUtf8() + (unit.empty() ? "" : " " + unit));
   EXPECT_NE(pipeline->GetParameter(host).Text().ToUtf8(), "-");
 
-  KEqualizerPlugin equalizer;
-  ASSERT_TRUE(equalizer.SetSampleRate(kRate));
   equalizer.GetParameter(last).SetNormalized(target);
   Play(equalizer, viaPlugin, 480);
   EXPECT_EQ(viaPipeline, viaPlugin);

@@ -8,7 +8,8 @@
 
 namespace {
 // One entry per slot for its parameters, so that each text names its control as the host does
-// ("Slot 2 parameter 5"); the number of the parameter is what the "#" matched.
+// ("Slot 2 parameter 5"); the number of the parameter is what the "#" matched. The entries take
+// no values of their parameters, so the help page gives each once, for the whole slot.
 struct PipelineHelp {
   std::vector<std::string> keys, texts;
   std::vector<KParameterHelp> entries;

@@ -11,6 +11,7 @@
 #include "core/KParameter.h"
 #include "kernel/KRegistries.h"
 #include "plugins/KPluginEditors.h"
+#include "plugins/KPluginHelpPage.h"
 #include "plugins/pipeline/KEffectPipeline.h"
 #include "plugins/pipeline/KPipelineChainPanel.h"
 #include "tests/core/AllocationCounter.h"
@@ -202,4 +203,21 @@ TEST_F(PipelineEditor, FullChainAndHelpOfTheButtons) {
     texts.push_back(markup);
     Tree().Key({kKeyEscape, 0});
   }
+}
+
+// The help page gives each slot's parameters one section, since their texts differ only in the
+// number; the bypasses, whose texts hold their defaults, keep one each.
+TEST_F(PipelineEditor, HelpPageGivesEachSlotOneSection) {
+  const std::string markup = KPluginHelpPage(*plugin_).Markup().ToUtf8();
+  const auto count = [&](const std::string& what) {
+    size_t n = 0;
+    for (size_t at = markup.find(what); at != std::string::npos; at = markup.find(what, at + 1)) ++n;
+    return n;
+  };
+  const std::string last = std::to_string(P::kModuleParameters);
+  EXPECT_EQ(count("<l2>Slot 1 parameter 1 to Slot 1 parameter " + last + "</l2>"), 1u);
+  EXPECT_EQ(count("<l2>Slot 6 parameter 1 to Slot 6 parameter " + last + "</l2>"), 1u);
+  EXPECT_EQ(count("<l2>Slot 3 parameter 13"), 0u);
+  EXPECT_EQ(count("<l2>Slot 4 bypass</l2>"), 1u);
+  EXPECT_EQ(count("<l2>"), size_t(2 * P::kSlots));
 }

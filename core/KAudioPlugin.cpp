@@ -59,10 +59,11 @@ void KAudioPlugin::SetChannelMode(int32_t mode) noexcept {
   MarkUpdatePending();
 }
 
-KAudioPlugin* KAdoptNewPlugin(KAudioPlugin* plugin, const KString& name, KModule* module) {
+KAudioPlugin* KAdoptNewPlugin(KAudioPlugin* plugin, const KString& name, KModule* module, std::span<const KFactoryPreset> presets) {
   std::unique_ptr<KAudioPlugin> owned(plugin);
   owned->SetIdentifier(name);
   owned->SetModule(module);
+  owned->SetFactoryPresets(presets);
   return owned.release();
 }
 

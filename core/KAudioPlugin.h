@@ -148,7 +148,7 @@ public:
   //     <Arpeggiator/>                            kept as found
   //     <ParamLock key="1" .../>
   //     <Controllers flags...><NoteControllers/><Controller Number= Channel= Parameter=/>...</Controllers>
-  //     <ActivePreset Name="..." Current="1"/>
+  //     <ActivePreset Name="..." Current="1" Factory="1"/>
   //   </TorvaneState>
   // Stores every section into `root` (named kStateRoot here). kRemoveDefaults in `flags`
   // cleans a root that holds an earlier state of values that went back to their defaults.
@@ -202,22 +202,41 @@ public:
   void SetChannelContext(const KChannelContext& context) { channelContext_ = context; }
   const KChannelContext& ChannelContext() const noexcept { return channelContext_; }
 
-  // ---- presets, in "presets.xml" of Module()'s user data folder (KException on failure)
+  // ---- presets (KException on failure)
+  // Two kinds, listed in this order wherever presets are offered: the plug-in's factory presets,
+  // which ship with it and never change, then the user's own, kept in "presets.xml" of
+  // Module()'s user data folder. A position in ListPresets() counts across both.
+  //
+  // Factory presets are read-only: saving or renaming a user preset to a factory preset's name
+  // is refused, and renaming or deleting acts on the user's presets only. A user preset that
+  // already bears a factory name (written by an older version, or by hand) is listed among the
+  // user's and reached by its position; by name, the factory preset comes first.
+  void SetFactoryPresets(std::span<const KFactoryPreset> presets) noexcept { factoryPresets_ = presets; }
+  std::span<const KFactoryPreset> FactoryPresets() const noexcept { return factoryPresets_; }
+  int32_t FactoryPresetCount() const noexcept { return static_cast<int32_t>(factoryPresets_.size()); }
+  // The factory presets' names alone: what can be offered even when the user's cannot be read.
+  KStringList FactoryPresetNames() const;
+  // The factory presets' names, then the user's in file order.
+  KStringList ListPresets() const;
+  // Loads the preset at `index` of ListPresets(); "There is no preset number {0}." beyond it.
+  void SelectPreset(int32_t index);
   void SavePreset(const KString& name);
   // Loads a preset's sound: the parameters but the locked ones, the plug-in's own settings, the
   // kept modulator sections and, unless DoNotLoadFromPresets is on, the controller
   // assignments. The instance's global settings and parameter locks stay. One undo step.
+  // A factory preset of that name, else the user's.
   void LoadPreset(const KString& name);
-  KStringList ListPresets() const;
   // Loads one of the plug-in's own sounds the same way: the parameters it names take its values,
   // every other one its default. A KException, before anything changes, for a key the plug-in
   // does not have.
   void LoadFactoryPreset(const KFactoryPreset& preset);
   void RenamePreset(const KString& from, const KString& to);
   void DeletePreset(const KString& name);
-  // The preset the settings came from (empty: none), and whether they are still its settings:
-  // no change was recorded for undo since it was loaded or saved.
+  // The preset the settings came from (empty: none), whether it is a factory preset, and
+  // whether the settings are still its own: no change was recorded for undo since it was loaded
+  // or saved.
   const KString& ActivePresetName() const noexcept { return activePreset_.name; }
+  bool IsActivePresetFactory() const noexcept { return activePreset_.factory; }
   bool IsActivePresetCurrent() const noexcept { return activePreset_.current; }
 
   // ---- undo (user-interface thread); the editor reports every change it makes
@@ -257,6 +276,7 @@ private:
   struct ActivePreset {
     KString name;
     bool current = false;
+    bool factory = false;
   };
   // Which sections a load touches: all of them, or a preset's sound only.
   enum class Scope { kWholeState, kPresetSound };
@@ -267,8 +287,13 @@ private:
   // KException, before anything changes, for a tree that is not a plug-in state.
   static void RequireStateRoot(const Element& root);
   int32_t DefaultChannelMode() const noexcept;
-  // The global current preset follows the active one: its name and its place in the list.
+  // The global current preset follows the active one: its name and its place in ListPresets().
   void FollowActivePreset(const KPresetStore& store);
+  // The factory preset of that name, or null.
+  const KFactoryPreset* FindFactoryPreset(const KString& name) const;
+  // KException "... is a factory preset ..." when a user preset may not take or lose that name.
+  void RequireUserPresetName(const KString& name, const char* refusal) const;
+  void LoadUserPreset(const KPresetStore& store, const KString& name);
   void TellHostSettingsChanged() noexcept;
   void PassThrough(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
   // Audio thread, before each piece of a host block: the modulator's ramps for it.
@@ -318,6 +343,7 @@ private:
   Element arpeggiator_;
   Element noteControllers_;
   ActivePreset activePreset_;
+  std::span<const KFactoryPreset> factoryPresets_;
   KChannelContext channelContext_;
   KUndoHistory undo_{*this};
 };

@@ -8,8 +8,13 @@
 #include "core/KStateSection.h"
 #include "core/KAudioPluginHost.h"
 #include "kernel/KException.h"
+#include "kernel/KFormat.h"
 #include "kernel/KGuard.h"
 #include "kernel/KModule.h"
+
+namespace {
+constexpr const char* kFactoryNameTaken = "'{0}' is the name of a factory preset; please choose another name.";
+}  // namespace
 
 KModule& KAudioPlugin::Module() const {
   if (module_) return *module_;
@@ -19,7 +24,14 @@ KModule& KAudioPlugin::Module() const {
 
 void KAudioPlugin::FollowActivePreset(const KPresetStore& store) {
   globals_.preset = activePreset_.name;
-  globals_.presetIndex = activePreset_.name.IsEmpty() ? -1 : store.ListNames().IndexOf(activePreset_.name);
+  int32_t index = -1;
+  if (activePreset_.factory) {
+    index = FactoryPresetNames().IndexOf(activePreset_.name);
+  } else if (!activePreset_.name.IsEmpty()) {
+    const int32_t user = store.ListNames().IndexOf(activePreset_.name);
+    if (user >= 0) index = FactoryPresetCount() + user;
+  }
+  globals_.presetIndex = index;
 }
 
 void KAudioPlugin::TellHostSettingsChanged() noexcept {
@@ -28,23 +40,59 @@ void KAudioPlugin::TellHostSettingsChanged() noexcept {
   });
 }
 
+KStringList KAudioPlugin::FactoryPresetNames() const {
+  KStringList names;
+  for (const KFactoryPreset& preset : factoryPresets_) names.Append(KString::FromUtf8(preset.name));
+  return names;
+}
+
+const KFactoryPreset* KAudioPlugin::FindFactoryPreset(const KString& name) const {
+  const int32_t index = FactoryPresetNames().IndexOf(name);
+  return index < 0 ? nullptr : &factoryPresets_[static_cast<size_t>(index)];
+}
+
+void KAudioPlugin::RequireUserPresetName(const KString& name, const char* refusal) const {
+  if (FindFactoryPreset(name)) throw KException(KFormatText(KString::Static(refusal), name));
+}
+
+KStringList KAudioPlugin::ListPresets() const {
+  KStringList names = FactoryPresetNames();
+  for (const KString& name : KPresetStore(Module()).ListNames()) names.Append(name);
+  return names;
+}
+
+void KAudioPlugin::SelectPreset(int32_t index) {
+  if (index >= 0 && index < FactoryPresetCount()) return LoadFactoryPreset(factoryPresets_[static_cast<size_t>(index)]);
+  KPresetStore store(Module());
+  const KStringList names = store.ListNames();
+  const int32_t user = index - FactoryPresetCount();
+  if (index < 0 || user >= names.Count()) throw KException(KFormatText("There is no preset number {0}.", index));
+  LoadUserPreset(store, names[user]);
+}
+
 void KAudioPlugin::SavePreset(const KString& name) {
+  RequireUserPresetName(name, kFactoryNameTaken);
   KPresetStore store(Module());
   Element state;
   StoreState(state);
   store.Store(name, state);
-  activePreset_ = {name, true};
+  activePreset_ = {name, true, false};
   FollowActivePreset(store);
+  TellHostSettingsChanged();  // the host's list of presets grew
 }
 
 void KAudioPlugin::LoadPreset(const KString& name) {
-  KPresetStore store(Module());
+  if (const KFactoryPreset* preset = FindFactoryPreset(name)) return LoadFactoryPreset(*preset);
+  LoadUserPreset(KPresetStore(Module()), name);
+}
+
+void KAudioPlugin::LoadUserPreset(const KPresetStore& store, const KString& name) {
   Element preset = store.Load(name);  // a preset that cannot be read changes nothing
   RequireStateRoot(preset);
   undo_.UndoStoreSettings();
   StoreSections(preset, 0, Scope::kPresetSound);
   RequestJump();
-  activePreset_ = {name, true};
+  activePreset_ = {name, true, false};
   FollowActivePreset(store);
   TellHostSettingsChanged();
 }
@@ -66,26 +114,34 @@ void KAudioPlugin::LoadFactoryPreset(const KFactoryPreset& preset) {
   undo_.UndoStoreSettings();
   StoreSections(sound, 0, Scope::kPresetSound);
   RequestJump();
-  activePreset_ = {KString::FromUtf8(preset.name), true};
+  activePreset_ = {KString::FromUtf8(preset.name), true, true};
   globals_.preset = activePreset_.name;
-  globals_.presetIndex = -1;  // not one of the user's presets
+  // Its place among the plug-in's own; a sound from elsewhere has none.
+  const KFactoryPreset* first = factoryPresets_.data();
+  const bool own = first && &preset >= first && &preset < first + factoryPresets_.size();
+  globals_.presetIndex = own ? static_cast<int32_t>(&preset - first) : -1;
   TellHostSettingsChanged();
 }
 
-KStringList KAudioPlugin::ListPresets() const { return KPresetStore(Module()).ListNames(); }
-
+// Renaming and deleting touch the user's presets alone; a name only the factory knows is refused
+// with a sentence that says why.
 void KAudioPlugin::RenamePreset(const KString& from, const KString& to) {
+  RequireUserPresetName(to, kFactoryNameTaken);
   KPresetStore store(Module());
+  if (store.ListNames().IndexOf(from) < 0) RequireUserPresetName(from, "'{0}' is a factory preset, which cannot be renamed.");
   store.Rename(from, to);
-  if (activePreset_.name == from) activePreset_.name = to;
+  if (!activePreset_.factory && activePreset_.name == from) activePreset_.name = to;
   FollowActivePreset(store);
+  TellHostSettingsChanged();
 }
 
 void KAudioPlugin::DeletePreset(const KString& name) {
   KPresetStore store(Module());
+  if (store.ListNames().IndexOf(name) < 0) RequireUserPresetName(name, "'{0}' is a factory preset, which cannot be deleted.");
   store.Delete(name);
-  if (activePreset_.name == name) activePreset_ = {};
+  if (!activePreset_.factory && activePreset_.name == name) activePreset_ = {};
   FollowActivePreset(store);
+  TellHostSettingsChanged();
 }
 
 double KAudioPlugin::GetParameterValue(int32_t index) const { return GetParameter(index).Normalized(); }

@@ -216,6 +216,7 @@ void KAudioPlugin::StoreActivePresets(Element& section, uint32_t flags) {
   KStateSection s(section, flags);
   s.Text("Name", activePreset_.name, {});
   s.Flag("Current", activePreset_.current, false);
+  s.Flag("Factory", activePreset_.factory, false);
 }
 
 void KAudioPlugin::StoreSections(Element& root, uint32_t flags, Scope scope) {

@@ -39,8 +39,9 @@ public:
   void SendBypassAutomation(bool bypass) final;
   void RequestLatencyReport(int32_t mode) noexcept final { latencyRequest_.fetch_or(mode, std::memory_order_acq_rel); }
   // Runs on the interface's timer (user-interface thread): sends the values the audio thread
-  // handed over, ends gestures that went quiet, reports a changed latency.
-  void Idle();
+  // handed over, ends gestures that went quiet, reports a changed latency. Adapters add what
+  // their format hands over from the audio thread.
+  virtual void Idle();
 
   const KString& FormatName() const noexcept { return formatName_; }
   bool IsOffline() const noexcept { return offline_; }

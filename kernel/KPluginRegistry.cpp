@@ -8,8 +8,9 @@ KPluginRegistry::~KPluginRegistry() {
   for (KPluginRecord* record : records_) delete record;
 }
 
-void KPluginRegistry::Register(const KString& key, KPluginFactory factory, const KString& category) {
-  auto record = std::make_unique<KPluginRecord>(KPluginRecord{factory, category, key});
+void KPluginRegistry::Register(const KString& key, KPluginFactory factory, const KString& category,
+                               std::span<const KFactoryPreset> presets) {
+  auto record = std::make_unique<KPluginRecord>(KPluginRecord{factory, category, key, presets});
   if (!index_.Insert(key, record.get())) return;
   records_.Append(record.release());
   keys_.Append(key);
@@ -42,5 +43,5 @@ KAudioPlugin* KPluginRegistry::Create(const KString& name, KModule* context) con
     throw KException(message);
   }
   KAudioPlugin* plugin = record->factory(context, record);
-  return plugin ? KAdoptNewPlugin(plugin, name, context) : nullptr;
+  return plugin ? KAdoptNewPlugin(plugin, name, context, record->presets) : nullptr;
 }

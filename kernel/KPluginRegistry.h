@@ -1,6 +1,9 @@
 #pragma once
 
+#include <span>
+
 #include "kernel/KExport.h"
+#include "kernel/KFactoryPreset.h"
 #include "kernel/KHashIndex.h"
 #include "kernel/KStringList.h"
 
@@ -12,14 +15,16 @@ struct KPluginRecord;
 using KPluginFactory = KAudioPlugin* (*)(KModule* context, const KPluginRecord* record);
 
 // Implemented by the plug-in core, so that the registry needs no more than this declaration:
-// gives a new instance the name it was asked for and its module (its presets live in the
-// module's data folder), and answers it; deletes it and rethrows when that fails.
-KAudioPlugin* KAdoptNewPlugin(KAudioPlugin* plugin, const KString& name, KModule* module);
+// gives a new instance the name it was asked for, its module (its presets live in the
+// module's data folder) and the sounds it ships with, and answers it; deletes it and rethrows
+// when that fails.
+KAudioPlugin* KAdoptNewPlugin(KAudioPlugin* plugin, const KString& name, KModule* module, std::span<const KFactoryPreset> presets);
 
 struct KPluginRecord {
   KPluginFactory factory;
   KString category;  // empty in the main registry
   KString key;
+  std::span<const KFactoryPreset> presets = {};  // its factory presets, in the order offered
 };
 
 // A table from identifier to factory: hash index for exact names, records in registration
@@ -32,7 +37,7 @@ public:
   ~KPluginRegistry();
 
   // A key registered twice keeps its first record.
-  void Register(const KString& key, KPluginFactory factory, const KString& category);
+  void Register(const KString& key, KPluginFactory factory, const KString& category, std::span<const KFactoryPreset> presets = {});
 
   // Exact name; then, for a name starting with "K", the name without it; then the first record
   // in registration order whose key and the name agree on their common length. Null if none.

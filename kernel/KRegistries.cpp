@@ -16,11 +16,11 @@ void KRegistries::EnsureBuilt() {
 }
 
 void KRegistries::Build() {
-  for (const KPluginDescription& entry : catalogue_.plugins) main_.Register(KString::Static(entry.key), entry.factory, {});
+  for (const KPluginDescription& entry : catalogue_.plugins) main_.Register(KString::Static(entry.key), entry.factory, {}, entry.presets);
   for (const char* category : kCategories) {
     for (const KPluginDescription& entry : catalogue_.plugins) {
       if (entry.moduleKey && std::strcmp(entry.category, category) == 0)
-        modules_.Register(KString::Static(entry.moduleKey), entry.factory, KString::Static(category));
+        modules_.Register(KString::Static(entry.moduleKey), entry.factory, KString::Static(category), entry.presets);
     }
   }
   fileTypes_.Append(KFileType{"Effect pipeline file", "tvpipe"});

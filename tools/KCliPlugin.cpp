@@ -134,15 +134,16 @@ void KCliPlugin::LoadPreset(const std::string& fileOrName) {
   const std::string identifier = plugin_->Identifier().ToUtf8();
   std::ifstream file(fileOrName, std::ios::binary);
   if (!file) {
+    // Factory presets first, as listed; the one matched is the one loaded.
     const KStringList names = plugin_->ListPresets();
-    for (const KString& name : names) {
-      if (KLowerCase(name.ToUtf8()) != KLowerCase(fileOrName)) continue;
-      plugin_->LoadPreset(name);
+    for (int32_t i = 0; i < names.Count(); ++i) {
+      if (KLowerCase(names[i].ToUtf8()) != KLowerCase(fileOrName)) continue;
+      plugin_->SelectPreset(i);
       return;
     }
     std::vector<std::string> known;
     for (const KString& name : names) known.push_back(name.ToUtf8());
-    KCliFail("There is no preset file or saved preset '" + fileOrName + "' of " + identifier + "." + KSuggestions(fileOrName, known));
+    KCliFail("There is no preset file, factory preset or saved preset '" + fileOrName + "' of " + identifier + "." + KSuggestions(fileOrName, known));
   }
   std::ostringstream text;
   text << file.rdbuf();

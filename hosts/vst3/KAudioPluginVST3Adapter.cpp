@@ -17,6 +17,8 @@ using namespace KVST3;
 
 namespace {
 constexpr int32_t kRootUnit = UnitInfo::kRootUnitId;
+// The preset attribute that holds a program's name.
+constexpr const char* kPresetNameAttribute = "Name";
 }  // namespace
 
 KAudioPluginVST3Adapter::KAudioPluginVST3Adapter(std::unique_ptr<KAudioPlugin> plugin)
@@ -63,6 +65,7 @@ TResult KAudioPluginVST3Adapter::Initialize(FUnknown* context) {
       host_.Attach(context);
       buses_.Build();
       table_.Build();
+      table_.SetPrograms(PresetNames());
     }
     ++initializations_;
     return kResultOk;
@@ -288,7 +291,7 @@ KStringList KAudioPluginVST3Adapter::PresetNames() const {
   try {
     return plugin_->ListPresets();
   } catch (const KException&) {
-    return {};  // no preset folder: no programs
+    return plugin_->FactoryPresetNames();  // the user's presets cannot be read: the factory's stay
   }
 }
 
@@ -308,7 +311,7 @@ int32_t KAudioPluginVST3Adapter::GetProgramListCount() { return 1; }
 TResult KAudioPluginVST3Adapter::GetProgramListInfo(int32_t listIndex, ProgramListInfo& info) {
   return KHostGuarded("KAudioPluginVST3Adapter::GetProgramListInfo", kResultFalse, [&] {
     if (listIndex != 0) return kInvalidArgument;
-    info = ProgramListInfo{KParameterTable::kPresetList, {}, PresetNames().Count()};
+    info = ProgramListInfo{KParameterTable::kPresetList, {}, table_.Programs().Count()};
     KCopyText("Presets", info.name, 128);
     return kResultOk;
   });
@@ -316,14 +319,20 @@ TResult KAudioPluginVST3Adapter::GetProgramListInfo(int32_t listIndex, ProgramLi
 
 TResult KAudioPluginVST3Adapter::GetProgramName(int32_t listId, int32_t programIndex, String128 name) {
   return KHostGuarded("KAudioPluginVST3Adapter::GetProgramName", kResultFalse, [&] {
-    const KStringList names = listId == KParameterTable::kPresetList ? PresetNames() : KStringList();
-    if (!name || programIndex < 0 || programIndex >= names.Count()) return kInvalidArgument;
+    const KStringList& names = table_.Programs();
+    if (!name || listId != KParameterTable::kPresetList || programIndex < 0 || programIndex >= names.Count()) return kInvalidArgument;
     KCopyText(names[programIndex], name, 128);
     return kResultOk;
   });
 }
 
-TResult KAudioPluginVST3Adapter::GetProgramInfo(int32_t, int32_t, const char*, String128) { return kNotImplemented; }
+// The one attribute a preset of the list has to tell: its name, as the list gives it.
+TResult KAudioPluginVST3Adapter::GetProgramInfo(int32_t listId, int32_t programIndex, const char* attribute, String128 value) {
+  return KHostGuarded("KAudioPluginVST3Adapter::GetProgramInfo", kResultFalse, [&] {
+    if (!attribute || std::strcmp(attribute, kPresetNameAttribute) != 0) return kResultFalse;
+    return GetProgramName(listId, programIndex, value);
+  });
+}
 TResult KAudioPluginVST3Adapter::HasProgramPitchNames(int32_t, int32_t) { return kResultFalse; }
 TResult KAudioPluginVST3Adapter::GetProgramPitchName(int32_t, int32_t, int16_t, String128) { return kResultFalse; }
 int32_t KAudioPluginVST3Adapter::GetSelectedUnit() { return kRootUnit; }
@@ -365,7 +374,17 @@ void KAudioPluginVST3Adapter::ReportLatency(int32_t) { host_.Restart(kLatencyCha
 
 void KAudioPluginVST3Adapter::UpdateParameterNames() { host_.Restart(kParamTitlesChanged); }
 
-void KAudioPluginVST3Adapter::NotifyPresetChanged() { host_.Restart(kParamValuesChanged); }
+// A preset loaded, or the list changed: the program follows, and the list is read again. A new
+// count changes the program's step count, which hosts read with the parameters' titles.
+void KAudioPluginVST3Adapter::NotifyPresetChanged() {
+  const bool resized = table_.SetPrograms(PresetNames());
+  host_.Restart(kParamValuesChanged | (resized ? kParamTitlesChanged : 0));
+}
+
+void KAudioPluginVST3Adapter::Idle() {
+  KAudioPluginInterface::Idle();
+  table_.SelectPendingProgram();
+}
 
 // No editor yet, so nothing to resize.
 bool KAudioPluginVST3Adapter::ResizeEditor(int32_t, int32_t) { return false; }

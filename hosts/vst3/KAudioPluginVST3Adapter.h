@@ -153,6 +153,8 @@ public:
   void NotifyPresetChanged() override;
   bool ResizeEditor(int32_t width, int32_t height) override;
   void SendBypassValue(bool bypass) override;
+  // Also loads a preset the host chose through the program parameter while processing.
+  void Idle() override;
 
   const KString& HostName() const noexcept { return host_.HostName(); }
   // The host's knob mode (IEditController2::KnobMode), for the editor to come.

@@ -91,7 +91,8 @@ bool KParameterTable::Describe(int32_t index, ParameterInfo& info) const {
   } else if (index == pluginCount_ + 1) {
     info.id = kProgram;
     KCopyText("Program", info.title, 128);
-    info.stepCount = kProgramSteps;
+    info.stepCount = ProgramSteps();
+    info.unitId = UnitInfo::kRootUnitId;
     info.flags = ParameterInfo::kCanAutomate | ParameterInfo::kIsProgramChange;
   } else {
     const int32_t row = index - pluginCount_ - 2;
@@ -113,9 +114,11 @@ bool KParameterTable::Text(ParamID id, double normalized, KString& text) const {
     case Kind::kBypass:
       text = normalized >= 0.5 ? KString("On") : KString("Off");
       return true;
-    case Kind::kProgram:
-      text = KFormatText("{0}", Scaled(normalized, kProgramSteps) < 127 ? Scaled(normalized, kProgramSteps) : 127);
+    case Kind::kProgram: {
+      const int32_t index = ProgramIndex(normalized);
+      text = index < programs_.Count() ? programs_[index] : KFormatText("{0}", index);
       return true;
+    }
     case Kind::kController:
       text = KFormatText("{0}", Scaled(normalized, ControllerTop(parameter.controller)));
       return true;
@@ -137,8 +140,9 @@ bool KParameterTable::Value(ParamID id, const KString& text, double& normalized)
       else return false;
       return true;
     case Kind::kProgram:
-      if (!ReadWholeNumber(text, 127, number)) return false;
-      normalized = static_cast<double>(number) / kProgramSteps;
+      number = programs_.IndexOf(text);
+      if (number < 0 && !ReadWholeNumber(text, std::max(programs_.Count() - 1, 0), number)) return false;
+      normalized = static_cast<double>(number) / ProgramSteps();
       return true;
     case Kind::kController:
       if (!ReadWholeNumber(text, ControllerTop(parameter.controller), number)) return false;
@@ -154,7 +158,7 @@ double KParameterTable::ToPlain(ParamID id, double normalized) const noexcept {
   const Decoded parameter = Decode(id);
   switch (parameter.kind) {
     case Kind::kPlugin: return plugin_.GetParameter(parameter.index).Kind().ToWorking(normalized);
-    case Kind::kProgram: return Scaled(normalized, kProgramSteps);
+    case Kind::kProgram: return ProgramIndex(normalized);
     case Kind::kController: return Scaled(normalized, ControllerTop(parameter.controller));
     default: return normalized;
   }
@@ -164,10 +168,35 @@ double KParameterTable::ToNormalized(ParamID id, double plain) const noexcept {
   const Decoded parameter = Decode(id);
   switch (parameter.kind) {
     case Kind::kPlugin: return plugin_.GetParameter(parameter.index).Kind().ToNormalized(plain);
-    case Kind::kProgram: return std::clamp(plain / kProgramSteps, 0.0, 1.0);
+    case Kind::kProgram: return std::clamp(plain / ProgramSteps(), 0.0, 1.0);
     case Kind::kController: return std::clamp(plain / ControllerTop(parameter.controller), 0.0, 1.0);
     default: return std::clamp(plain, 0.0, 1.0);
   }
+}
+
+void KParameterTable::SelectPendingProgram() {
+  const int32_t index = pendingProgram_.exchange(-1, std::memory_order_acquire);
+  if (index >= 0) SelectProgram(index);
+}
+
+void KParameterTable::SelectProgram(int32_t index) {
+  if (index < programCount_.load(std::memory_order_relaxed) && index != plugin_.GlobalSettings().presetIndex) plugin_.SelectPreset(index);
+}
+
+bool KParameterTable::SetPrograms(KStringList names) {
+  const bool changed = names.Count() != programs_.Count();
+  programs_ = std::move(names);
+  programCount_.store(programs_.Count(), std::memory_order_relaxed);
+  return changed;
+}
+
+// One step per preset after the first; a list of one or none still steps, so that the program
+// never reads as a continuous control.
+int32_t KParameterTable::ProgramSteps() const noexcept { return std::max(programCount_.load(std::memory_order_relaxed) - 1, 1); }
+
+int32_t KParameterTable::ProgramIndex(double normalized) const noexcept {
+  const int32_t last = std::max(programCount_.load(std::memory_order_relaxed) - 1, 0);
+  return std::min(Scaled(normalized, ProgramSteps()), last);
 }
 
 std::atomic<double>* KParameterTable::Stored(const Decoded& parameter) const noexcept {
@@ -180,17 +209,24 @@ double KParameterTable::Normalized(ParamID id) const noexcept {
   const Decoded parameter = Decode(id);
   if (parameter.kind == Kind::kPlugin) return plugin_.GetParameter(parameter.index).Normalized();
   if (parameter.kind == Kind::kBypass) return plugin_.IsBypassed() ? 1.0 : 0.0;
+  if (parameter.kind == Kind::kProgram) {
+    const int32_t current = plugin_.GlobalSettings().presetIndex;
+    if (current >= 0 && current < programCount_.load(std::memory_order_relaxed)) return static_cast<double>(current) / ProgramSteps();
+  }
   const std::atomic<double>* stored = Stored(parameter);
   return stored ? stored->load(std::memory_order_relaxed) : 0.0;
 }
 
-bool KParameterTable::SetNormalized(ParamID id, double normalized) noexcept {
+bool KParameterTable::SetNormalized(ParamID id, double normalized) {
   const Decoded parameter = Decode(id);
   normalized = std::clamp(normalized, 0.0, 1.0);
   if (parameter.kind == Kind::kPlugin) {
     KTakeHostValue(plugin_, parameter.index, normalized);
   } else if (parameter.kind == Kind::kBypass) {
     plugin_.SetBypass(normalized >= 0.5);
+  } else if (parameter.kind == Kind::kProgram) {
+    stored_[0].store(normalized, std::memory_order_relaxed);
+    SelectProgram(ProgramIndex(normalized));
   } else if (std::atomic<double>* stored = Stored(parameter)) {
     stored->store(normalized, std::memory_order_relaxed);
   } else {
@@ -205,7 +241,7 @@ void KParameterTable::Apply(const Decoded& parameter, int32_t sampleOffset, doub
     plugin_.SetBypass(normalized >= 0.5);
   } else if (parameter.kind == Kind::kProgram) {
     stored_[0].store(normalized, std::memory_order_relaxed);
-    plugin_.ScheduleMIDIEvent(sampleOffset, ProgramMessage(normalized));
+    pendingProgram_.store(ProgramIndex(normalized), std::memory_order_release);
   } else if (parameter.kind == Kind::kController) {
     Stored(parameter)->store(normalized, std::memory_order_relaxed);
     plugin_.ScheduleMIDIEvent(sampleOffset, ControllerMessage(parameter.controller, parameter.channel, normalized));
@@ -221,11 +257,6 @@ KMIDIBytes KParameterTable::ControllerMessage(int32_t controller, int32_t channe
   const auto value = static_cast<uint8_t>(Scaled(normalized, 127));
   if (controller == IMidiMapping::kAfterTouch) return {static_cast<uint8_t>(0xD0 | status), value, 0, 0};
   return {static_cast<uint8_t>(0xB0 | status), static_cast<uint8_t>(controller & 127), value, 0};
-}
-
-KMIDIBytes KParameterTable::ProgramMessage(double normalized) noexcept {
-  const int32_t program = Scaled(normalized, kProgramSteps);
-  return {0xC0, static_cast<uint8_t>(program < 127 ? program : 127), 0, 0};
 }
 
 }  // namespace KVST3

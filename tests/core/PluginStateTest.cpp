@@ -4,13 +4,17 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cmath>
+#include <functional>
 #include <cstdlib>
 #include <optional>
 #include <random>
 #include <string>
+#include <vector>
 
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
+#include "core/KPresetStore.h"
 #include "core/KStateSection.h"
 #include "core/KXMLReader.h"
 #include "kernel/KException.h"
@@ -46,6 +50,20 @@ protected:
     KStateSection(section, flags).Integer("Curve", curve, 0);
   }
 };
+
+// Two sounds shipped with the plug-in: the second also leaves a value at its default.
+constexpr KFactoryPreset::Value kBrightValues[] = {{"gain", -6.0}, {"frequency", 4000.0}};
+constexpr KFactoryPreset::Value kDarkValues[] = {{"frequency", 200.0}, {"mode", 2.0}, {"ratio", 4.0}};
+constexpr KFactoryPreset kFactory[] = {{"Bright", kBrightValues}, {"Dark", kDarkValues}};
+
+// A working value to a millionth: curved kinds do not give back every value bit for bit.
+double Rounded(double value) { return std::round(value * 1e6) / 1e6; }
+
+std::vector<std::string> Names(const KStringList& list) {
+  std::vector<std::string> names;
+  for (const KString& name : list) names.push_back(name.ToUtf8());
+  return names;
+}
 
 // Something non-default in every section this product interprets.
 void Change(KStatePlugin& plugin) {
@@ -238,4 +256,92 @@ TEST_F(PluginState, RenamingAndDeletingPresetsKeepTheCurrentPresetInStep) {
   EXPECT_THROW(plugin.LoadPreset("C"), KException);
   plugin.SetIdentifier({});  // made without the registry and never named: no folder to use
   EXPECT_THROW(plugin.SavePreset("D"), KException);
+}
+
+// The factory's sounds come first, by name and by place, and the current preset follows
+// whichever kind was loaded last.
+TEST_F(PluginState, FactoryPresetsAreListedFirstAndSelectedByTheirPlace) {
+  plugin.SetFactoryPresets(kFactory);
+  plugin.GetParameter(kGain).SetWorking(-20.0);
+  plugin.SavePreset("Mine");
+  EXPECT_EQ(Names(plugin.ListPresets()), (std::vector<std::string>{"Bright", "Dark", "Mine"}));
+  EXPECT_EQ(Names(plugin.FactoryPresetNames()), (std::vector<std::string>{"Bright", "Dark"}));
+  const KGlobalSettings& g = plugin.GlobalSettings();
+  EXPECT_EQ(std::pair(g.presetIndex, plugin.IsActivePresetFactory()), std::pair(2, false));
+
+  plugin.SelectPreset(1);
+  EXPECT_EQ(std::tuple(Rounded(plugin.Working(kGain)), Rounded(plugin.Working(kFrequency)), plugin.Working(kMode)), std::tuple(0.0, 200.0, 2.0));
+  EXPECT_EQ(std::tuple(plugin.ActivePresetName().ToUtf8(), plugin.IsActivePresetFactory(), plugin.IsActivePresetCurrent(), g.presetIndex, g.preset.ToUtf8()),
+            std::tuple("Dark", true, true, 1, "Dark"));
+  plugin.SelectPreset(2);
+  EXPECT_EQ(std::tuple(Rounded(plugin.Working(kGain)), plugin.ActivePresetName().ToUtf8(), plugin.IsActivePresetFactory(), g.presetIndex),
+            std::tuple(-20.0, "Mine", false, 2));
+  plugin.LoadPreset("Bright");
+  EXPECT_EQ(std::tuple(Rounded(plugin.Working(kGain)), Rounded(plugin.Working(kFrequency)), plugin.IsActivePresetFactory(), g.presetIndex),
+            std::tuple(-6.0, 4000.0, true, 0));
+  for (const int32_t beyond : {-1, 3}) EXPECT_THROW(plugin.SelectPreset(beyond), KException) << beyond;
+  EXPECT_EQ(plugin.ActivePresetName().ToUtf8(), "Bright");  // a refused choice changes nothing
+
+  // Undo returns to the user's preset, and with it to its kind and place.
+  plugin.Undo();
+  EXPECT_EQ(std::tuple(plugin.ActivePresetName().ToUtf8(), plugin.IsActivePresetFactory(), g.presetIndex), std::tuple("Mine", false, 2));
+}
+
+// Nothing the user does with presets changes or hides a factory one; a user preset that bears a
+// factory name from before is still reached by its place, and removed by its name.
+TEST_F(PluginState, FactoryPresetsAreReadOnlyAndNeverShadowed) {
+  plugin.SetFactoryPresets(kFactory);
+  plugin.SavePreset("Mine");
+  const std::string saved = plugin.WriteState();
+  struct Refusal { std::function<void()> action; const char* message; };
+  const Refusal refusals[] = {
+      {[&] { plugin.SavePreset("Bright"); }, "'Bright' is the name of a factory preset; please choose another name."},
+      {[&] { plugin.RenamePreset("Mine", "Dark"); }, "'Dark' is the name of a factory preset; please choose another name."},
+      {[&] { plugin.RenamePreset("Dark", "Darker"); }, "'Dark' is a factory preset, which cannot be renamed."},
+      {[&] { plugin.DeletePreset("Bright"); }, "'Bright' is a factory preset, which cannot be deleted."},
+  };
+  for (const Refusal& refusal : refusals) {
+    try {
+      refusal.action();
+      ADD_FAILURE() << refusal.message;
+    } catch (const KException& e) {
+      EXPECT_EQ(e.Message().ToUtf8(), refusal.message);
+    }
+    EXPECT_EQ(Names(plugin.ListPresets()), (std::vector<std::string>{"Bright", "Dark", "Mine"})) << refusal.message;
+  }
+  EXPECT_EQ(plugin.WriteState(), saved);
+
+  // Written by an older version: a user preset named like a factory one, with its own sound.
+  Element legacy;
+  plugin.GetParameter(kGain).SetWorking(-30.0);
+  plugin.StoreState(legacy);
+  KPresetStore(plugin.Module()).Store("Bright", legacy);
+  EXPECT_EQ(Names(plugin.ListPresets()), (std::vector<std::string>{"Bright", "Dark", "Mine", "Bright"}));
+  plugin.LoadPreset("Bright");
+  EXPECT_EQ(std::pair(Rounded(plugin.Working(kGain)), plugin.IsActivePresetFactory()), std::pair(-6.0, true));
+  plugin.SelectPreset(3);
+  EXPECT_EQ(std::tuple(Rounded(plugin.Working(kGain)), plugin.IsActivePresetFactory(), plugin.GlobalSettings().presetIndex), std::tuple(-30.0, false, 3));
+  plugin.SelectPreset(0);
+  plugin.DeletePreset("Bright");  // the user's: the factory's stays, and stays current
+  EXPECT_EQ(Names(plugin.ListPresets()), (std::vector<std::string>{"Bright", "Dark", "Mine"}));
+  EXPECT_EQ(std::tuple(plugin.ActivePresetName().ToUtf8(), plugin.IsActivePresetFactory(), plugin.GlobalSettings().presetIndex), std::tuple("Bright", true, 0));
+}
+
+// The state remembers that the current preset is a factory one, so that a host project reopens
+// with it named and in its place.
+TEST_F(PluginState, AFactoryPresetSurvivesAStateRoundTripAsTheCurrentPreset) {
+  plugin.SetFactoryPresets(kFactory);
+  plugin.SelectPreset(1);
+  const std::string text = plugin.WriteState();
+  EXPECT_NE(text.find("Factory=\"1\""), std::string::npos) << text;
+  KStatePlugin copy;
+  copy.SetFactoryPresets(kFactory);
+  copy.ReadState(text);
+  EXPECT_EQ(std::tuple(copy.ActivePresetName().ToUtf8(), copy.IsActivePresetFactory(), copy.IsActivePresetCurrent(), copy.GlobalSettings().presetIndex),
+            std::tuple("Dark", true, true, 1));
+  EXPECT_EQ(copy.WriteState(), text);
+  copy.UndoStore(kGain, copy.GetParameter(kGain).Normalized());  // an edit: still Dark's, no longer its sound
+  EXPECT_EQ(std::pair(copy.IsActivePresetFactory(), copy.IsActivePresetCurrent()), std::pair(true, false));
+  copy.ReadState("<TorvaneState/>");
+  EXPECT_EQ(std::pair(copy.ActivePresetName().IsEmpty(), copy.IsActivePresetFactory()), std::pair(true, false));
 }

@@ -8,6 +8,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
+#include <map>
 #include <fstream>
 #include <sstream>
 #include <string>
@@ -18,6 +19,7 @@
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
 #include "hosts/lv2/KLV2Dispatch.h"
+#include "kernel/KCatalogue.h"
 #include "kernel/KPluginIdentifiers.h"
 #include "kernel/KEntryPoints.h"
 
@@ -117,6 +119,35 @@ void ExpectSameAfterLatency(const KAudio& reference, const KAudio& lv2, int64_t 
   for (size_t i = 0; i < length; ++i) differ += std::memcmp(&lv2.samples[skip + i], &reference.samples[i], sizeof(float)) != 0;
   EXPECT_EQ(differ, 0u) << what << ": samples that differ from torvane render";
 }
+
+// The triples of a Turtle file as sordi writes them in N-Triples: subject, predicate, object;
+// a literal object as its unescaped text.
+struct KTriple {
+  std::string subject, predicate, object;
+};
+std::vector<KTriple> Triples(const std::string& ntriples) {
+  std::vector<KTriple> triples;
+  std::istringstream lines(ntriples);
+  for (std::string line; std::getline(lines, line);) {
+    const size_t first = line.find(' '), second = line.find(' ', first + 1);
+    if (second == std::string::npos || !line.ends_with(" .")) continue;
+    std::string object = line.substr(second + 1, line.size() - second - 3);
+    if (object.starts_with('"')) {
+      const std::string quoted = object.substr(1, object.rfind('"') - 1);
+      object.clear();
+      for (size_t i = 0; i < quoted.size(); ++i) {
+        if (quoted[i] != '\\' || i + 1 == quoted.size()) {
+          object += quoted[i];
+          continue;
+        }
+        const char escaped = quoted[++i];
+        object += escaped == 'n' ? '\n' : escaped == 't' ? '\t' : escaped == 'r' ? '\r' : escaped;
+      }
+    }
+    triples.push_back({line.substr(0, first), line.substr(first + 1, second - first - 1), object});
+  }
+  return triples;
+}
 }  // namespace
 
 TEST_F(LV2Tools, TheValidatorFindsNoErrorInAnyBundle) {
@@ -187,6 +218,58 @@ TEST_F(LV2Tools, RendersEqualTorvaneRenderBitForBit) {
     ExpectSameAfterLatency(expected, Read(output), latency, std::string(test.key) + " lv2apply");
     if (std::string(test.key) == "KSampleWarmer") {
       EXPECT_GT(latency, 0);
+    }
+  }
+}
+
+// Hosts list each factory preset by its name; its resource holds every control port's value as
+// the preset loads it, and a preset with settings beyond the ports the state that brings them.
+TEST_F(LV2Tools, FactoryPresetsAreListedAndHoldWhatTheyLoad) {
+  const std::string lv2 = "<http://lv2plug.in/ns/lv2core#", pset = "<http://lv2plug.in/ns/ext/presets#";
+  const std::string label = "<http://www.w3.org/2000/01/rdf-schema#label>", state = "<urn:torvane:state>";
+  for (const char* key : {"KGatePlugin", "KCompressorPlugin", "KEffectPipeline"}) {
+    const KPluginDescription* description = KFindDescription(KProductCatalogue(), key);
+    ASSERT_NE(description, nullptr);
+    const std::string uri = KPluginIds::LV2URI(description->identity);
+    const auto [listed, info] = RunTool(kLV2Path + "lv2info " + uri);
+    ASSERT_TRUE(listed) << info;
+    const fs::path file = fs::path(TORVANE_LV2_DIR) / (KPluginIds::BundleName(key) + ".lv2") / "presets.ttl";
+    const auto [read, ntriples] = RunTool("sordi -o ntriples '" + file.string() + "' file://" + file.string());
+    ASSERT_TRUE(read) << ntriples;
+    const std::vector<KTriple> triples = Triples(ntriples);
+    for (const KFactoryPreset& preset : description->presets) {
+      EXPECT_NE(info.find(preset.name), std::string::npos) << key << ": lv2info lists no " << preset.name;
+      std::unique_ptr<KAudioPlugin> plugin(CreateTorvanePlugin(KString::Static(key)));
+      plugin->LoadFactoryPreset(preset);
+      std::string subject;
+      for (const KTriple& t : triples)
+        if (t.predicate == label && t.object == preset.name) subject = t.subject;
+      ASSERT_FALSE(subject.empty()) << key << " " << preset.name;
+      std::map<std::string, std::pair<std::string, std::string>> ports;  // node: symbol, value
+      std::string stateNode;
+      for (const KTriple& t : triples) {
+        if (t.subject == subject && t.predicate == lv2 + "port>") ports[t.object];
+        if (t.subject == subject && t.predicate == "<http://lv2plug.in/ns/ext/state#state>") stateNode = t.object;
+      }
+      for (const KTriple& t : triples) {
+        if (!ports.contains(t.subject)) continue;
+        if (t.predicate == lv2 + "symbol>") ports[t.subject].first = t.object;
+        if (t.predicate == pset + "value>") ports[t.subject].second = t.object;
+      }
+      EXPECT_EQ(ports.size(), static_cast<size_t>(plugin->ParameterCount())) << key << " " << preset.name;
+      for (const auto& [node, port] : ports) {
+        const KAudioPluginBase::Parameter* parameter = plugin->FindParameter(KString::FromUtf8(port.first));
+        ASSERT_NE(parameter, nullptr) << port.first;
+        EXPECT_EQ(std::strtod(port.second.c_str(), nullptr), parameter->Working()) << key << " " << preset.name << " " << port.first;
+      }
+      std::string text;
+      for (const KTriple& t : triples)
+        if (t.subject == stateNode && t.predicate == state) text = t.object;
+      EXPECT_EQ(text.empty(), preset.settings == nullptr) << key << " " << preset.name;
+      if (text.empty()) continue;
+      std::unique_ptr<KAudioPlugin> restored(CreateTorvanePlugin(KString::Static(key)));
+      restored->ReadState(text);
+      EXPECT_EQ(std::pair(restored->ActivePresetName().ToUtf8(), restored->WriteState()), std::pair(std::string(preset.name), plugin->WriteState()));
     }
   }
 }

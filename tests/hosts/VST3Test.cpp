@@ -8,6 +8,7 @@
 #include "plugins/utility/KUtilityPlugin.h"
 #include "tests/core/AllocationCounter.h"
 #include "tests/core/RecordingPlugin.h"
+#include "tests/core/UserDataFolder.h"
 #include "tests/hosts/VST3Host.h"
 
 #include <filesystem>
@@ -100,12 +101,14 @@ TEST(VST3Bundles, TwoBundlesAtOnceCompressorBusesParametersStateTextsAndAudio) {
     ASSERT_EQ(source.component->GetBusInfo(kAudio, bus.direction, bus.index, info), kResultTrue);
     EXPECT_EQ(std::tuple(std::u16string(info.name), info.busType, info.flags, info.channelCount), std::tuple(bus.name, bus.type, bus.flags, 2));
   }
-  // An effect: its own parameters, bypass, program, then 130 controllers of channel 0.
+  // An effect: its own parameters, bypass, program (a step per preset), then 130 controllers of channel 0.
   const ParamID n = Parameters("KCompressorPlugin");
   const int32_t count = source.controller->GetParameterCount();
   ASSERT_EQ(count, static_cast<int32_t>(n) + 2 + 130);
+  const int32_t programs = std::unique_ptr<KAudioPlugin>(CreateTorvanePlugin(KString::Static("KCompressorPlugin")))->ListPresets().Count();
+  ASSERT_GE(programs, 3);
   struct Row { int32_t index; ParamID id; std::u16string title; int32_t steps, flags; };
-  for (const Row& row : {Row{count - 132, 32767, u"Bypass", 1, 0x10001}, Row{count - 131, 32766, u"Program", 128, 0x8001}, Row{count - 1, 10129, u"MIDI CC 129", 0, 0}}) {
+  for (const Row& row : {Row{count - 132, 32767, u"Bypass", 1, 0x10001}, Row{count - 131, 32766, u"Program", programs - 1, 0x8001}, Row{count - 1, 10129, u"MIDI CC 129", 0, 0}}) {
     ParameterInfo info{};
     ASSERT_EQ(source.controller->GetParameterInfo(row.index, info), kResultOk);
     EXPECT_EQ(std::tuple(info.id, std::u16string(info.title), info.stepCount, info.flags), std::tuple(row.id, row.title, row.steps, row.flags));
@@ -125,7 +128,7 @@ TEST(VST3Bundles, TwoBundlesAtOnceCompressorBusesParametersStateTextsAndAudio) {
   EXPECT_EQ((std::pair{target.component->SetState(&whole), target.State()}), std::pair(kResultOk, state));
   EXPECT_EQ((std::pair{target.component->SetState(&broken), target.State()}), std::pair(kResultFalse, state));
   struct Text { ParamID id; double normalized; std::u16string text; };
-  std::vector<Text> texts = {{32767, 1.0, u"On"}, {32767, 0.2, u"Off"}, {32766, 5 / 128.0, u"5"}, {10007, 1.0, u"127"}, {10129, 0.5, u"8192"}};
+  std::vector<Text> texts = {{32767, 1.0, u"On"}, {32767, 0.2, u"Off"}, {32766, 1.0 / (programs - 1), u"Vocal leveler"}, {10007, 1.0, u"127"}, {10129, 0.5, u"8192"}};
   for (ParamID id = 0; id < n; ++id) texts.push_back({id, target.controller->GetParamNormalized(id), source.Text(id, source.controller->GetParamNormalized(id))});
   for (double value = 0.0; Text& t : texts) {
     EXPECT_EQ(target.Text(t.id, t.normalized), t.text);
@@ -141,6 +144,107 @@ TEST(VST3Bundles, TwoBundlesAtOnceCompressorBusesParametersStateTextsAndAudio) {
   EXPECT_EQ(std::pair(bypassed.buses[2].silenceFlags, silent.buses[2].silenceFlags), std::pair(uint64_t{0}, uint64_t{3}));
   EXPECT_GT(*std::max_element(filtered.Out(0).begin(), filtered.Out(0).end()), 0.1f);
   for (KInstance* instance : {&source, &target, &filter}) instance->Stop();
+}
+
+// The program list names the plug-in's presets in order, as the program parameter's texts do;
+// the parameter chooses among them from the controller at once and from the audio thread at the
+// next idle, reads back as the current preset wherever it was chosen, and survives the state.
+// A host that writes back the program it read reloads nothing.
+TEST(VST3Adapter, TheProgramListAndParameterChooseTheFactoryPresets) {
+  const auto presets = kUtilityDescription.presets;
+  auto make = [&] {
+    auto* plugin = new KUtilityPlugin;  // never named: no folder for the user's presets, the factory's only
+    plugin->SetFactoryPresets(presets);
+    return plugin;
+  };
+  KUtilityPlugin* plugin = make();
+  KHost host;
+  KInstance instance(Adapt(plugin));
+  instance.Start(host);
+  IUnitInfo* units = Query<IUnitInfo>(instance.component);
+  ASSERT_NE(units, nullptr);
+  UnitInfo unit{};
+  ProgramListInfo list{};
+  ASSERT_EQ(units->GetUnitInfo(0, unit) | units->GetProgramListInfo(0, list), kResultOk);
+  const int32_t last = static_cast<int32_t>(presets.size()) - 1;
+  EXPECT_EQ(std::tuple(std::u16string(unit.name), unit.programListId, std::u16string(list.name), list.id, list.programCount, units->GetProgramListCount()),
+            std::tuple(u"Root", list.id, u"Presets", 1, last + 1, 1));
+  ParameterInfo info{};
+  ASSERT_EQ(instance.controller->GetParameterInfo(KUtilityPlugin::kParameterCount + 1, info), kResultOk);
+  EXPECT_EQ(std::tuple(info.id, info.stepCount, info.flags), std::tuple(32766u, last, 0x8001));
+  for (int32_t i = 0; i <= last; ++i) {
+    String128 name = {}, named = {};
+    ASSERT_EQ(units->GetProgramName(list.id, i, name) | units->GetProgramInfo(list.id, i, "Name", named), kResultOk);
+    const std::string ascii = presets[static_cast<size_t>(i)].name;  // the names are plain ASCII
+    const std::u16string expected(ascii.begin(), ascii.end());
+    EXPECT_EQ(std::tuple(std::u16string(name), std::u16string(named), instance.Text(32766, static_cast<double>(i) / last)), std::tuple(expected, expected, expected));
+    double value = -1.0;
+    ASSERT_EQ(instance.controller->GetParamValueByString(32766, name, value), kResultOk);
+    EXPECT_EQ(value, static_cast<double>(i) / last);
+  }
+  String128 none = {};
+  EXPECT_EQ((std::pair{units->GetProgramName(list.id, last + 1, none), units->GetProgramName(7, 0, none)}), std::pair(kInvalidArgument, kInvalidArgument));
+
+  // From the controller: loaded at once, and the host is told the values changed.
+  ASSERT_EQ(instance.controller->SetParamNormalized(32766, 1.0 / last), kResultOk);
+  EXPECT_EQ(std::tuple(plugin->ActivePresetName().ToUtf8(), plugin->IsActivePresetFactory(), instance.controller->GetParamNormalized(32766)),
+            std::tuple(std::string(presets[1].name), true, 1.0 / last));
+  EXPECT_NE(std::find(host.restarts.begin(), host.restarts.end(), kParamValuesChanged), host.restarts.end());
+  // The user edits; a host that writes the same program back keeps the edit.
+  instance.controller->SetParamNormalized(KUtilityPlugin::kGain, 0.9);
+  instance.controller->SetParamNormalized(32766, instance.controller->GetParamNormalized(32766));
+  EXPECT_EQ(plugin->GetParameter(KUtilityPlugin::kGain).Normalized(), 0.9);
+  // From the audio thread: noted while processing, loaded at the next idle.
+  KBlock block(1, 1);
+  block.Change(32766, {{0, 1.0}});
+  ASSERT_EQ(instance.processor->Process(block.data), kResultOk);
+  EXPECT_EQ(plugin->ActivePresetName().ToUtf8(), presets[1].name);
+  static_cast<KAudioPluginVST3Adapter*>(instance.component)->Idle();
+  EXPECT_EQ(std::pair(plugin->ActivePresetName().ToUtf8(), instance.controller->GetParamNormalized(32766)), std::pair(std::string(presets[static_cast<size_t>(last)].name), 1.0));
+  // Chosen in the plug-in (its editor): the program follows.
+  plugin->SelectPreset(0);
+  EXPECT_EQ(instance.controller->GetParamNormalized(32766), 0.0);
+
+  // A project reopened: the current preset and the program come back.
+  plugin->SelectPreset(1);
+  KStream saved;
+  saved.bytes = instance.State();
+  KUtilityPlugin* other = make();
+  KInstance reopened(Adapt(other));
+  reopened.Start(host);
+  ASSERT_EQ(reopened.component->SetState(&saved), kResultOk);
+  EXPECT_EQ(std::tuple(other->ActivePresetName().ToUtf8(), other->IsActivePresetFactory(), reopened.controller->GetParamNormalized(32766)),
+            std::tuple(std::string(presets[1].name), true, 1.0 / last));
+  units->Release();
+  reopened.Stop();
+  instance.Stop();
+}
+
+// A preset the user saves joins the list after the factory's: the list, the program's step count
+// and its texts grow together, and the host is told to read the parameters again.
+TEST(VST3Adapter, ASavedPresetJoinsTheProgramListAfterTheFactoryPresets) {
+  const KUserDataFolder data;  // the user's presets go to a fresh folder
+  {
+    auto* plugin = new KUtilityPlugin;
+    plugin->SetIdentifier("KUtilityPlugin");
+    plugin->SetFactoryPresets(kUtilityDescription.presets);
+    KHost host;
+    KInstance instance(Adapt(plugin));
+    instance.Start(host);
+    const int32_t factory = plugin->FactoryPresetCount();
+    plugin->SavePreset("Mine");
+    ParameterInfo info{};
+    ASSERT_EQ(instance.controller->GetParameterInfo(KUtilityPlugin::kParameterCount + 1, info), kResultOk);
+    EXPECT_EQ(info.stepCount, factory);
+    EXPECT_NE(std::find(host.restarts.begin(), host.restarts.end(), kParamValuesChanged | kParamTitlesChanged), host.restarts.end());
+    EXPECT_EQ(std::pair(instance.Text(32766, 1.0), instance.controller->GetParamNormalized(32766)), std::pair(std::u16string(u"Mine"), 1.0));
+    IUnitInfo* units = Query<IUnitInfo>(instance.component);
+    ProgramListInfo list{};
+    ASSERT_EQ(units->GetProgramListInfo(0, list), kResultOk);
+    EXPECT_EQ(list.programCount, factory + 1);
+    units->Release();
+    instance.Stop();
+  }
 }
 
 TEST(VST3Adapter, AnInstrumentHas2080ControllersAnEffect130And10267IsController7OnChannel3) {

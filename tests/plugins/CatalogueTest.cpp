@@ -246,6 +246,28 @@ TEST_P(Catalogue, EveryFactoryPresetLoads) {
   }
 }
 
+// Created by name, a plug-in knows its factory presets in the description's order; choosing one by
+// its place loads what loading it directly loads, and the state keeps it as the current preset.
+TEST_P(Catalogue, FactoryPresetsAreListedInOrderAndChosenByTheirPlace) {
+  const auto presets = Description().presets;
+  const auto plugin = Make();
+  ASSERT_NE(plugin, nullptr);
+  const KStringList names = plugin->FactoryPresetNames();
+  ASSERT_EQ(names.Count(), static_cast<int32_t>(presets.size()));
+  for (int32_t i = 0; i < names.Count(); ++i) {
+    EXPECT_EQ(names[i].ToUtf8(), presets[static_cast<size_t>(i)].name);
+    plugin->SelectPreset(i);
+    const auto direct = Make();
+    direct->LoadFactoryPreset(presets[static_cast<size_t>(i)]);
+    for (int32_t p = 0; p < plugin->ParameterCount(); ++p)
+      EXPECT_EQ(plugin->GetParameter(p).Working(), direct->GetParameter(p).Working()) << names[i].ToUtf8() << " " << p;
+    const auto reopened = Make();
+    reopened->ReadState(plugin->WriteState());
+    EXPECT_EQ(std::tuple(reopened->ActivePresetName().ToUtf8(), reopened->IsActivePresetFactory(), reopened->GlobalSettings().presetIndex),
+              std::tuple(std::string(presets[static_cast<size_t>(i)].name), true, i));
+  }
+}
+
 // An impulse after rest: its response reaches half its peak no sooner than the reported latency
 // (a linear-phase filter may ring a little ahead of it, and an effect may delay on purpose), and
 // once the latency and the reported tail have passed it has fallen below −100 dB.

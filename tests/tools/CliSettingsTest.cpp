@@ -68,7 +68,7 @@ TEST_F(CliTest, PresetsAreFoundByNameAndMustBelongToThePlugin) {
   EXPECT_TRUE(Same(Render({"KCompressorPlugin", "in.wav", "--preset", "Hard hitter"}), direct));
   EXPECT_TRUE(Same(Render({"KCompressorPlugin", "in.wav", "--preset", "hard HITTER"}), direct));
   const CliRun list = Run({"presets", "KCompressorPlugin", "list"});
-  EXPECT_EQ(list.out, "Hard hitter\n");
+  EXPECT_EQ(list.out, "Gentle bus\nVocal leveler\nDrum punch\nHard hitter\n");
   EXPECT_THAT(list.err, testing::HasSubstr("Presets of KCompressorPlugin are kept in " + (root_ / "data").string()));
   EXPECT_THAT(list.err, testing::HasSubstr("presets.xml"));
 
@@ -77,7 +77,7 @@ TEST_F(CliTest, PresetsAreFoundByNameAndMustBelongToThePlugin) {
       {{"render", "KCompressorPlugin", "in.wav", "out.wav", "--preset", "utility.xml"},
        "The preset file 'utility.xml' holds the state of KUtilityPlugin, not of KCompressorPlugin."},
       {{"render", "KCompressorPlugin", "in.wav", "out.wav", "--preset", "Hard hiter"},
-       "There is no preset file or saved preset 'Hard hiter' of KCompressorPlugin. Did you mean Hard hitter?"},
+       "There is no preset file, factory preset or saved preset 'Hard hiter' of KCompressorPlugin. Did you mean Hard hitter?"},
   };
   for (const auto& [words, message] : failures) {
     const CliRun run = Run(words);

@@ -81,11 +81,35 @@ TEST_F(CliTest, SavedStateAndPresetsRenderLikeTheSettingsGiven) {
   EXPECT_TRUE(Same(Render({"KCompressorPlugin", "in.wav", "--preset", "state.xml"}), direct));
   EXPECT_EQ(Run(Sets({"presets", "KCompressorPlugin", "save", "Hard hitter"}, settings)).exit, 0);
   EXPECT_EQ(Run({"presets", "KCompressorPlugin", "save", "Gentle", "--set", "ratio=1.5"}).exit, 0);
-  EXPECT_EQ(Run({"presets", "KCompressorPlugin", "list"}).out, "Hard hitter\nGentle\n");  // in saving order
+  const std::string factory = "Gentle bus\nVocal leveler\nDrum punch\n";  // the plug-in's own, first
+  EXPECT_EQ(Run({"presets", "KCompressorPlugin", "list"}).out, factory + "Hard hitter\nGentle\n");  // then in saving order
   std::ofstream(Work() / "loaded.xml") << Run({"presets", "KCompressorPlugin", "load", "Hard hitter"}).out;
   EXPECT_TRUE(Same(Render({"KCompressorPlugin", "in.wav", "--preset", "loaded.xml"}), direct));
   EXPECT_EQ(Run({"presets", "KCompressorPlugin", "delete", "Hard hitter"}).exit, 0);
-  EXPECT_EQ(Run({"presets", "KCompressorPlugin"}).out, "Gentle\n");
+  EXPECT_EQ(Run({"presets", "KCompressorPlugin"}).out, factory + "Gentle\n");
+}
+
+// A factory preset by name, in any case, renders as its values set one by one; its state names it
+// as the current factory preset; it is never deleted nor shadowed by a saved preset.
+TEST_F(CliTest, FactoryPresetsLoadByNameAndCannotBeChanged) {
+  const Audio direct = Render({"KCompressorPlugin", "in.wav", "--set", "threshold=0.3", "--set", "ratio=6", "--set", "attack=0.02",
+                               "--set", "release=0.06", "--set", "kneemode=1"});
+  EXPECT_TRUE(Same(Render({"KCompressorPlugin", "in.wav", "--preset", "Drum punch"}), direct));
+  EXPECT_TRUE(Same(Render({"KCompressorPlugin", "in.wav", "--preset", "drum PUNCH"}), direct));
+  const CliRun loaded = Run({"presets", "KCompressorPlugin", "load", "Drum punch"});
+  EXPECT_THAT(loaded.out, testing::HasSubstr("<ActivePreset Current=\"1\" Factory=\"1\" Name=\"Drum punch\""));
+  const std::pair<Words, std::string> refusals[] = {
+      {{"presets", "KCompressorPlugin", "delete", "Drum punch"}, "'Drum punch' is a factory preset, which cannot be deleted."},
+      {{"presets", "KCompressorPlugin", "save", "Drum punch"}, "'Drum punch' is the name of a factory preset; please choose another name."},
+  };
+  for (const auto& [words, message] : refusals) {
+    const CliRun run = Run(words);
+    EXPECT_EQ(run.exit, 1);
+    EXPECT_THAT(run.err, testing::HasSubstr(message));
+  }
+  const CliRun list = Run({"presets", "KCompressorPlugin", "list"});
+  EXPECT_EQ(list.out, "Gentle bus\nVocal leveler\nDrum punch\n");
+  EXPECT_THAT(list.err, testing::HasSubstr("The first 3 are factory presets"));
 }
 
 // Gain automated from -60 to 0 dB over the demo: the gain heard per tenth rises from about -57 to -3 dB.

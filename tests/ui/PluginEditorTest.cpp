@@ -10,15 +10,18 @@
 
 #include "kernel/KCatalogue.h"
 #include "plugins/KPluginEditors.h"
+#include "tests/core/UserDataFolder.h"
 #include "tests/ui/DrawerTestSupport.h"
 #include "tests/ui/EditorTestSupport.h"
 #include "ui/KHelpTexts.h"
 #include "ui/controls/KButtons.h"
+#include "ui/controls/KPopups.h"
 #include "ui/controls/KGraphs.h"
 #include "ui/controls/KValueControl.h"
 #include "ui/editor/KHelpPanel.h"
 #include "plugins/compressor/KCompressorPlugin.h"
 #include "plugins/pipeline/KEffectPipeline.h"
+#include "plugins/utility/KUtilityPlugin.h"
 
 namespace {
 
@@ -167,6 +170,62 @@ TEST(PluginEditor, CtrlZAndCtrlYUndoAndRedoAndTellTheHostWhatMoved) {
   editor->Undo();
   editor->Tree().Tick();
   EXPECT_TRUE(redo->IsEnabled());
+}
+
+// The preset menu, driven as a user does: the factory presets under their heading and the
+// user's under theirs, the current one highlighted; a heading is never chosen, the keys step over
+// it, and a factory preset loads and tells the host what moved but offers no renaming or deleting.
+TEST(PluginEditor, ThePresetMenuOffersTheFactoryPresetsUnderTheirOwnHeading) {
+  const KUserDataFolder data;  // the user's presets go to a fresh folder
+  {
+    const std::unique_ptr<KAudioPlugin> plugin = KMakeCataloguePlugin("KUtilityPlugin");
+    ASSERT_EQ(plugin->FactoryPresetCount(), 3);
+    plugin->SavePreset("Mine");
+    KRecordingEditorHost host;
+    const std::unique_ptr<KEditor> editor = KMakePluginEditor(*plugin, &host);
+    KButton* button = KFindControl<KButton>(editor->Tree().Root(), [](KButton& b) { return b.HelpKey() == KString("presets"); });
+    ASSERT_NE(button, nullptr);
+    const auto open = [&] {
+      editor->Tree().MouseDown({KCentreOf(*button)}, 1000);
+      editor->Tree().MouseUp({KCentreOf(*button)});
+      return dynamic_cast<KPopupMenu*>(editor->Tree().Focused());
+    };
+    const auto click = [&](KPopupMenu& menu, int32_t item) {
+      const KPoint at{KCentreOf(menu.ListArea()).x, menu.ListArea().top + 3 + item * KPopupMenu::kItemHeight + KPopupMenu::kItemHeight / 2};
+      editor->Tree().MouseDown({at}, 2000);
+      editor->Tree().MouseUp({at});
+    };
+    // Factory presets, 3 of them, My presets, Mine, Save, Rename, Delete.
+    KPopupMenu* menu = open();
+    ASSERT_NE(menu, nullptr);
+    ASSERT_EQ(menu->ItemCount(), 9);
+    std::vector<int32_t> headings;
+    for (int32_t i = 0; i < menu->ItemCount(); ++i)
+      if (menu->IsHeading(i)) headings.push_back(i);
+    EXPECT_EQ(headings, (std::vector<int32_t>{0, 4}));
+    EXPECT_EQ(menu->Highlighted(), 5);
+    click(*menu, 0);  // a heading: the menu closes, nothing loads
+    EXPECT_EQ(std::pair(editor->Tree().Focused(), plugin->ActivePresetName().ToUtf8()), std::pair(static_cast<KControl*>(nullptr), std::string("Mine")));
+
+    const int32_t width = plugin->FindParameter(KString("width"))->Index();
+    menu = open();
+    ASSERT_NE(menu, nullptr);
+    click(*menu, 2);  // the second factory preset
+    EXPECT_EQ(std::tuple(plugin->ActivePresetName().ToUtf8(), plugin->IsActivePresetFactory(), std::round(plugin->GetParameter(width).Working() * 1e6) / 1e6),
+              std::tuple(std::string(kUtilityDescription.presets[1].name), true, 150.0));
+    EXPECT_EQ(host.KindsOf(width), "bve");
+    editor->Tree().Tick();
+    EXPECT_EQ(button->Caption().ToUtf8(), kUtilityDescription.presets[1].name);
+
+    menu = open();  // a factory preset is current: nothing to rename or delete
+    ASSERT_NE(menu, nullptr);
+    EXPECT_EQ(std::pair(menu->ItemCount(), menu->Highlighted()), std::pair(7, 2));
+    editor->Tree().Key({kKeyDown, 0});
+    editor->Tree().Key({kKeyDown, 0});  // over the heading of the user's presets
+    EXPECT_EQ(menu->Highlighted(), 5);
+    editor->Tree().Key({kKeyReturn, 0});
+    EXPECT_EQ(std::pair(plugin->ActivePresetName().ToUtf8(), plugin->IsActivePresetFactory()), std::pair(std::string("Mine"), false));
+  }
 }
 
 TEST(PluginEditor, AHostThatRefusesASizeKeepsTheEditorAsItWas) {

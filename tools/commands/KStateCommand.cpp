@@ -28,7 +28,10 @@ int KRunPresets(std::span<char* const> words) {
   try {
     if (action == "list") {
       for (const KString& name : plugin.ListPresets()) std::printf("%s\n", name.ToUtf8().c_str());
-      // The names alone on standard output, for scripts; where they live for the user.
+      // The names alone on standard output, for scripts; which are whose, and where the user's
+      // live, for the user.
+      std::fprintf(stderr, "The first %d are factory presets, which load like the others but cannot be changed.\n",
+                   static_cast<int>(plugin.FactoryPresetCount()));
       std::fprintf(stderr, "Presets of %s are kept in %s\n", plugin.Identifier().ToUtf8().c_str(),
                    KPresetStore(plugin.Module()).PresetsPath().c_str());
     } else if (action == "save") {

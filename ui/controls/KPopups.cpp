@@ -57,10 +57,21 @@ KPopupMenu::KPopupMenu(const KRect& window, const KRect& anchor, std::vector<KSt
   list_ = {left, top, left + width - 1, top + height - 1};
 }
 
+void KPopupMenu::MarkHeading(int32_t index) {
+  if (index < 0 || index >= ItemCount()) return;
+  headings_.resize(items_.size());
+  headings_[static_cast<size_t>(index)] = true;
+  if (highlighted_ == index) highlighted_ = -1;
+}
+
+bool KPopupMenu::IsHeading(int32_t index) const noexcept {
+  return index >= 0 && static_cast<size_t>(index) < headings_.size() && headings_[static_cast<size_t>(index)];
+}
+
 int32_t KPopupMenu::ItemAt(KPoint at) const noexcept {
   if (!KContains(list_, at)) return -1;
   const int32_t index = (at.y - list_.top - 3) / kItemHeight;
-  return index >= 0 && index < ItemCount() ? index : -1;
+  return index >= 0 && index < ItemCount() && !IsHeading(index) ? index : -1;
 }
 
 void KPopupMenu::Paint(KDrawer& drawer, const KStyle& style) {
@@ -70,9 +81,12 @@ void KPopupMenu::Paint(KDrawer& drawer, const KStyle& style) {
   for (int32_t i = 0; i < ItemCount(); ++i) {
     const KRect row{list_.left + 3, list_.top + 3 + i * kItemHeight, list_.right - 3, list_.top + 2 + (i + 1) * kItemHeight};
     if (i == highlighted_) drawer.FillRoundRectangle(row, 3, style.Get(KStyle::kAccent), 255, kDrawBlend);
-    drawer.AlignedTextOut({row.left + 8, row.top, row.right - 8, row.bottom}, items_[static_cast<size_t>(i)],
-                          style.LabelFont(), i == highlighted_ ? style.Get(KStyle::kHeader) : style.Get(KStyle::kText),
-                          kAlignLeft | kAlignMiddle, 255, kDrawBlend);
+    // A heading sits at the left edge, dim, with a rule above it unless it opens the list.
+    const bool heading = IsHeading(i);
+    if (heading && i > 0) drawer.FillRectangle({row.left + 4, row.top, row.right - 4, row.top}, style.Get(KStyle::kPanelBorder), 255, kDrawBlend);
+    const uint32_t ink = heading ? style.Get(KStyle::kTextDim) : i == highlighted_ ? style.Get(KStyle::kHeader) : style.Get(KStyle::kText);
+    drawer.AlignedTextOut({row.left + (heading ? 4 : 14), row.top, row.right - 8, row.bottom}, items_[static_cast<size_t>(i)],
+                          style.LabelFont(), ink, kAlignLeft | kAlignMiddle, 255, kDrawBlend);
   }
 }
 
@@ -93,7 +107,13 @@ bool KPopupMenu::OnKey(const KKeyEvent& event) {
   if (event.key == kKeyEscape) Close(-1);
   else if (event.key == kKeyReturn) Close(highlighted_);
   else if (event.key == kKeyUp || event.key == kKeyDown) {
-    highlighted_ = std::clamp(highlighted_ + (event.key == kKeyUp ? -1 : 1), 0, ItemCount() - 1);
+    // Steps over headings; stays put at either end.
+    const int32_t step = event.key == kKeyUp ? -1 : 1;
+    for (int32_t next = highlighted_ + step; next >= 0 && next < ItemCount(); next += step) {
+      if (IsHeading(next)) continue;
+      highlighted_ = next;
+      break;
+    }
     Invalidate();
   }
   return true;

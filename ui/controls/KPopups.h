@@ -28,7 +28,8 @@ private:
 
 // A list of choices over the whole window, opened below (or above) an anchor: a click on an
 // item hands its index to `choose`; a click anywhere else, or Escape, closes it. Up, Down and
-// Return choose with the keyboard.
+// Return choose with the keyboard. Items marked as headings title the items below them: drawn
+// dim, never highlighted, never chosen.
 class KPopupMenu final : public KControl {
 public:
   using Choose = std::function<void(int32_t index)>;
@@ -37,6 +38,9 @@ public:
   KPopupMenu(const KRect& window, const KRect& anchor, std::vector<KString> items, int32_t current, Choose choose);
   const KRect& ListArea() const noexcept { return list_; }
   int32_t ItemCount() const noexcept { return static_cast<int32_t>(items_.size()); }
+  void MarkHeading(int32_t index);
+  bool IsHeading(int32_t index) const noexcept;
+  int32_t Highlighted() const noexcept { return highlighted_; }
 
   void Paint(KDrawer& drawer, const KStyle& style) override;
   bool OnMouseDown(const KMouseEvent& event) override;
@@ -48,6 +52,7 @@ private:
   int32_t ItemAt(KPoint at) const noexcept;
   void Close(int32_t chosen);
   std::vector<KString> items_;
+  std::vector<bool> headings_;
   KRect list_;
   int32_t highlighted_;
   Choose choose_;

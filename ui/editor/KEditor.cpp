@@ -278,9 +278,12 @@ void KEditor::Build(const KEditorDescription& description, const KString& title)
   meter("Out", KLevelMeterControl::kLevel, levels(KAudioPlugin::kOutputLeft, KAudioPlugin::kOutputRight));
 }
 
-void KEditor::OpenMenu(const KRect& anchor, std::vector<KString> items, int32_t current, std::function<void(int32_t)> choose) {
-  KControl& menu = tree_->Root().Add(std::make_unique<KPopupMenu>(tree_->Root().Bounds(), anchor, std::move(items), current, std::move(choose)));
-  tree_->SetFocus(&menu);
+KPopupMenu& KEditor::OpenMenu(const KRect& anchor, std::vector<KString> items, int32_t current, std::function<void(int32_t)> choose) {
+  auto menu = std::make_unique<KPopupMenu>(tree_->Root().Bounds(), anchor, std::move(items), current, std::move(choose));
+  KPopupMenu& opened = *menu;
+  tree_->Root().Add(std::move(menu));
+  tree_->SetFocus(&opened);
+  return opened;
 }
 
 void KEditor::OpenSizeMenu() {
@@ -293,27 +296,44 @@ void KEditor::OpenSizeMenu() {
   OpenMenu(sizeButton_->Bounds(), items, current, [this](int32_t i) { SetScale(kScales[i]); });
 }
 
+// The factory presets under a heading of their own, then the user's, then what can be done
+// with the user's: the factory's are only loaded, never renamed or deleted.
 void KEditor::OpenPresetMenu() {
-  KStringList names;
+  KStringList names = plugin_.FactoryPresetNames();
+  const int32_t factory = names.Count();
   try {
     names = plugin_.ListPresets();
   } catch (const KException& e) {
     KShowUserMessage(e.Message());
   }
   std::vector<KString> items;
-  for (int32_t i = 0; i < names.Count(); ++i) items.push_back(names[i]);
-  const int32_t count = static_cast<int32_t>(items.size());
+  std::vector<int32_t> presetOf;  // per item: its place in the preset list, or -1
+  std::vector<int32_t> headings;
+  for (int32_t i = 0; i < names.Count(); ++i) {
+    if (i == 0 || i == factory) {
+      headings.push_back(static_cast<int32_t>(items.size()));
+      items.push_back(KString::Static(i < factory ? "Factory presets" : "My presets"));
+      presetOf.push_back(-1);
+    }
+    items.push_back(names[i]);
+    presetOf.push_back(i);
+  }
+  const int32_t save = static_cast<int32_t>(items.size());
   items.push_back(KString("Save preset..."));
-  if (!plugin_.ActivePresetName().IsEmpty()) {
+  const bool userActive = !plugin_.ActivePresetName().IsEmpty() && !plugin_.IsActivePresetFactory();
+  if (userActive) {
     items.push_back(KString("Rename preset..."));
     items.push_back(KString("Delete preset"));
   }
-  OpenMenu(presetButton_->Bounds(), items, -1, [this, items, count](int32_t i) {
+  const int32_t currentPreset = plugin_.GlobalSettings().presetIndex;
+  const auto current = std::find(presetOf.begin(), presetOf.end(), currentPreset);
+  const int32_t highlighted = currentPreset >= 0 && current != presetOf.end() ? static_cast<int32_t>(current - presetOf.begin()) : -1;
+  KPopupMenu& menu = OpenMenu(presetButton_->Bounds(), items, highlighted, [this, presetOf, save](int32_t i) {
+    if (i < save) return Guarded([&] { SelectPreset(presetOf[static_cast<size_t>(i)]); });
     const KString active = plugin_.ActivePresetName();
-    if (i < count) return Guarded([&] { LoadPreset(items[static_cast<size_t>(i)]); });
-    if (i > count + 1) return Guarded([&] { plugin_.DeletePreset(active); });
+    if (i > save + 1) return Guarded([&] { plugin_.DeletePreset(active); });
     // Save and rename ask for the name in a field over the button.
-    const bool rename = i == count + 1;
+    const bool rename = i == save + 1;
     KControl& field = tree_->Root().Add(std::make_unique<KTextField>(presetButton_->Bounds(), active, [this, rename, active](const KString& name) {
       Guarded([&] {
         if (rename) plugin_.RenamePreset(active, name);
@@ -322,6 +342,7 @@ void KEditor::OpenPresetMenu() {
     }));
     tree_->SetFocus(&field);
   });
+  for (int32_t heading : headings) menu.MarkHeading(heading);
 }
 
 template <class F>
@@ -355,8 +376,8 @@ void KEditor::Redo() {
   ChangeAll([this] { plugin_.Redo(); });
 }
 
-void KEditor::LoadPreset(const KString& name) {
-  ChangeAll([this, &name] { plugin_.LoadPreset(name); });
+void KEditor::SelectPreset(int32_t index) {
+  ChangeAll([this, index] { plugin_.SelectPreset(index); });
 }
 
 void KEditor::ShowHelpAt(KPoint at) {

@@ -14,6 +14,7 @@
 
 class KButton;
 class KEditorHost;
+class KPopupMenu;
 
 // A plug-in's editor, generated from its parameter table and its description: a title bar with
 // the preset menu, undo and redo, the size and the help button; the sections of knobs, lists
@@ -51,7 +52,8 @@ public:
   // The help window for the control under `at` (its help key, or the nearest parent's).
   void ShowHelpAt(KPoint at);
   void ShowHelp(const KString& key);
-  void LoadPreset(const KString& name);
+  // Loads the preset at `index` of KAudioPlugin::ListPresets() (factory presets first).
+  void SelectPreset(int32_t index);
 
   // Paints what changed since the last paint through a drawer at the present scale; answers the
   // logical area painted. PaintAll paints everything.
@@ -70,7 +72,7 @@ private:
   // Runs a user's action; a KException becomes a message to the user.
   template <class F>
   void Guarded(F&& action);
-  void OpenMenu(const KRect& anchor, std::vector<KString> items, int32_t current, std::function<void(int32_t)> choose);
+  KPopupMenu& OpenMenu(const KRect& anchor, std::vector<KString> items, int32_t current, std::function<void(int32_t)> choose);
   void OpenSizeMenu();
   void OpenPresetMenu();
 

@@ -1,6 +1,7 @@
 // Lays out one LV2 bundle per plug-in of the kernel's catalogue, from the plug-ins themselves:
-//   <dir>/<Name>.lv2/manifest.ttl    the plug-in's URI and binary
+//   <dir>/<Name>.lv2/manifest.ttl    the plug-in's URI and binary, and its factory presets' URIs
 //   <dir>/<Name>.lv2/<Name>.ttl      its ports, ranges, units and features
+//   <dir>/<Name>.lv2/presets.ttl     its factory presets' port values (and state where needed)
 //   <dir>/<Name>.lv2/<Name>.so       the loader, named after the bundle (no plug-in code)
 //   <dir>/<Name>.lv2/libtorvane.so   a copy of the kernel
 //   <dir>/<Name>.lv2/<font>          a copy of each font file, for the UI
@@ -57,8 +58,9 @@ int main(int argc, char** argv) {
       const std::string name = KPluginIds::BundleName(entry.key), uri = KPluginIds::LV2URI(entry.identity);
       const fs::path bundle = dir / (name + ".lv2");
       fs::create_directories(bundle);
-      WriteIfChanged(bundle / "manifest.ttl", KLV2::KManifestTurtle(uri, name));
+      WriteIfChanged(bundle / "manifest.ttl", KLV2::KManifestTurtle(*plugin, uri, name));
       WriteIfChanged(bundle / (name + ".ttl"), KLV2::KPluginTurtle(*plugin, uri, entry.name));
+      WriteIfChanged(bundle / KLV2::kPresetsFile, KLV2::KPresetsTurtle(*plugin, uri));  // last: it changes the plug-in's values
       CopyIfChanged(loader, bundle / (name + ".so"));
       CopyIfChanged(kernel, bundle / kernel.filename());
       for (int font = 5; font < argc; ++font) CopyIfChanged(argv[font], bundle / fs::path(argv[font]).filename());

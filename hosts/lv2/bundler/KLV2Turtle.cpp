@@ -1,11 +1,14 @@
 #include "hosts/lv2/bundler/KLV2Turtle.h"
 
+#include <algorithm>
+#include <cctype>
 #include <charconv>
 #include <cmath>
 #include <string_view>
 
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
+#include "hosts/lv2/KAudioPluginLV2Adapter.h"
 #include "hosts/lv2/KLV2Ports.h"
 #include "hosts/lv2/KLV2UI.h"
 
@@ -17,6 +20,7 @@ constexpr const char* kPrefixes =
     "@prefix lv2: <http://lv2plug.in/ns/lv2core#> .\n"
     "@prefix midi: <http://lv2plug.in/ns/ext/midi#> .\n"
     "@prefix pprops: <http://lv2plug.in/ns/ext/port-props#> .\n"
+    "@prefix pset: <http://lv2plug.in/ns/ext/presets#> .\n"
     "@prefix rdf: <http://www.w3.org/1999/02/22-rdf-syntax-ns#> .\n"
     "@prefix rdfs: <http://www.w3.org/2000/01/rdf-schema#> .\n"
     "@prefix state: <http://lv2plug.in/ns/ext/state#> .\n"
@@ -35,11 +39,27 @@ std::string Number(double value) {
   return number;
 }
 
+// A preset's port value as a plain decimal, never with an exponent: Turtle reads it as
+// xsd:decimal, which hosts hand to a control port as the float it expects (an exponent would
+// make it xsd:double).
+std::string Decimal(double value) {
+  char text[400];
+  const auto end = std::to_chars(text, text + sizeof text, value, std::chars_format::fixed).ptr;
+  std::string number(text, end);
+  if (number.find('.') == std::string::npos) number += ".0";
+  return number;
+}
+
 std::string Quoted(std::string_view text) {
   std::string quoted = "\"";
   for (const char c : text) {
-    if (c == '"' || c == '\\') quoted += '\\';
-    quoted += c;
+    if (c == '\n') quoted += "\\n";
+    else if (c == '\r') quoted += "\\r";
+    else if (c == '\t') quoted += "\\t";
+    else {
+      if (c == '"' || c == '\\') quoted += '\\';
+      quoted += c;
+    }
   }
   return quoted + "\"";
 }
@@ -86,9 +106,46 @@ void ControlPort(std::string& out, const KAudioPluginBase::Parameter& parameter)
 }
 }  // namespace
 
-std::string KManifestTurtle(const std::string& uri, const std::string& name) {
-  return std::string(kPrefixes) + "<" + uri + ">\n  a lv2:Plugin ;\n  lv2:binary <" + name + ".so> ;\n  rdfs:seeAlso <" + name + ".ttl> .\n\n<" +
-         UIURI(uri) + ">\n  a ui:X11UI ;\n  ui:binary <" + name + ".so> ;\n  rdfs:seeAlso <" + name + ".ttl> .\n";
+std::string KManifestTurtle(const KAudioPlugin& plugin, const std::string& uri, const std::string& name) {
+  std::string out = std::string(kPrefixes) + "<" + uri + ">\n  a lv2:Plugin ;\n  lv2:binary <" + name + ".so> ;\n  rdfs:seeAlso <" + name +
+                    ".ttl> .\n\n<" + UIURI(uri) + ">\n  a ui:X11UI ;\n  ui:binary <" + name + ".so> ;\n  rdfs:seeAlso <" + name + ".ttl> .\n";
+  for (const KFactoryPreset& preset : plugin.FactoryPresets())
+    out += "\n<" + KPresetURI(uri, preset.name) + ">\n  a pset:Preset ;\n  lv2:appliesTo <" + uri + "> ;\n  rdfs:seeAlso <" + kPresetsFile + "> .\n";
+  return out;
+}
+
+std::string KPresetURI(const std::string& uri, const char* presetName) {
+  std::string slug;
+  for (const char* c = presetName; *c; ++c) {
+    const auto byte = static_cast<unsigned char>(*c);
+    if (std::isalnum(byte)) slug += static_cast<char>(std::tolower(byte));
+    else if (!slug.empty() && slug.back() != '-') slug += '-';
+  }
+  while (!slug.empty() && slug.back() == '-') slug.pop_back();
+  return uri + "#" + slug;
+}
+
+std::string KPresetsTurtle(KAudioPlugin& plugin, const std::string& uri) {
+  std::string out = kPrefixes;
+  const KPortLayout layout(plugin);
+  const int32_t first = layout.First(KPort::Kind::kParameter);
+  const auto presets = plugin.FactoryPresets();
+  // The state's one property, described for the validators wherever a preset uses it.
+  if (std::any_of(presets.begin(), presets.end(), [](const KFactoryPreset& preset) { return preset.settings != nullptr; }))
+    out += std::string("<") + KAudioPluginLV2Adapter::kStateKey + ">\n  a rdf:Property ;\n  rdfs:label \"Torvane plug-in state\" ;\n"
+           "  rdfs:range atom:String .\n\n";
+  for (const KFactoryPreset& preset : presets) {
+    plugin.LoadFactoryPreset(preset);
+    out += "<" + KPresetURI(uri, preset.name) + ">\n  a pset:Preset ;\n  lv2:appliesTo <" + uri + "> ;\n  rdfs:label " + Quoted(preset.name);
+    for (int32_t p = 0; p < plugin.ParameterCount(); ++p) {
+      out += std::string(p == 0 ? " ;\n  lv2:port " : " ,\n    ") + "[ lv2:symbol " + Quoted(layout.Ports()[static_cast<size_t>(first + p)].symbol) +
+             " ; pset:value " + Decimal(plugin.GetParameter(p).Working()) + " ]";
+    }
+    // Settings beyond the ports reach the plug-in only through its state.
+    if (preset.settings) out += std::string(" ;\n  state:state [ <") + KAudioPluginLV2Adapter::kStateKey + "> " + Quoted(plugin.WriteState()) + " ]";
+    out += " .\n\n";
+  }
+  return out;
 }
 
 std::string KPluginTurtle(const KAudioPlugin& plugin, const std::string& uri, const std::string& name) {

@@ -1,0 +1,27 @@
+#pragma once
+
+#include <cstdlib>
+#include <optional>
+#include <string>
+
+#include "kernel/platform/KPlatform.h"
+
+// While it lives, the user's data (presets among it) goes to a fresh folder of its own
+// (XDG_DATA_HOME), which it removes, with the setting it replaced restored, when it goes.
+class KUserDataFolder {
+public:
+  KUserDataFolder() {
+    if (const char* old = std::getenv("XDG_DATA_HOME")) saved_ = old;
+    setenv("XDG_DATA_HOME", folder_.c_str(), 1);
+  }
+  KUserDataFolder(const KUserDataFolder&) = delete;
+  KUserDataFolder& operator=(const KUserDataFolder&) = delete;
+  ~KUserDataFolder() {
+    saved_ ? setenv("XDG_DATA_HOME", saved_->c_str(), 1) : unsetenv("XDG_DATA_HOME");
+    KPlatform::RemoveFolderTree(folder_);
+  }
+
+private:
+  const std::string folder_ = KPlatform::CreateTemporaryFolder();
+  std::optional<std::string> saved_;
+};

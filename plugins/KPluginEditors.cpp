@@ -75,7 +75,7 @@ std::unique_ptr<KEditor> KMakePluginEditor(KAudioPlugin& plugin, KEditorHost* ho
   const std::string key = plugin.Identifier().ToUtf8();
   for (const EditorEntry& entry : kEditors)
     if (key == entry.plugin) description = entry.describe();
-  description.help = &KPluginEditorHelp;
+  if (!description.help) description.help = &KPluginEditorHelp;
   return std::make_unique<KEditor>(plugin, TitleOf(plugin), description, host, std::move(style));
 }
 

@@ -1,5 +1,9 @@
 #include "plugins/KPluginHelpPage.h"
 
+#include <map>
+#include <string_view>
+#include <vector>
+
 #include "core/KParameter.h"
 #include "kernel/KException.h"
 #include "kernel/KFormat.h"
@@ -49,9 +53,33 @@ KString KPluginHelpPage::Markup() const {
   KString markup("<center><l1>");
   markup.Append(KHelpTexts::Escape(KString::FromUtf8(help_.title))).Append(KString("</l1><left><p>"));
   markup.Append(KString::FromUtf8(help_.overview)).Append(KString("<p>"));
+  // A numbered entry whose text takes no value of its parameter ({0} to {2}) reads the same for
+  // every parameter it serves but for their number (the many slots of a plug-in that hosts
+  // others): the page gives it once, titled with the first and the last of their names.
+  struct Section {
+    int32_t first, last;
+  };
+  std::vector<Section> sections;
+  std::map<const KParameterHelp*, size_t> shared;
   for (int32_t i = 0; i < plugin_.ParameterCount(); ++i) {
-    markup.Append(KHelpTexts::Section(plugin_.GetParameter(i).Name())).Append(KString("<p>"));
-    const KString text = ParameterText(i);
+    int32_t number = 0;
+    const KParameterHelp* entry = help_.Find(plugin_.GetParameter(i).Key().ToUtf8(), number);
+    const std::string_view text = entry ? entry->text : "";
+    const bool numbered = entry && std::string_view(entry->key).find('#') != std::string_view::npos &&
+                          text.find("{0}") == text.npos && text.find("{1}") == text.npos && text.find("{2}") == text.npos;
+    if (!numbered) {
+      sections.push_back({i, i});
+      continue;
+    }
+    const auto [found, added] = shared.try_emplace(entry, sections.size());
+    if (added) sections.push_back({i, i});
+    else sections[found->second].last = i;
+  }
+  for (const Section& section : sections) {
+    KString title = plugin_.GetParameter(section.first).Name();
+    if (section.last != section.first) title.Append(KString(" to ")).Append(plugin_.GetParameter(section.last).Name());
+    markup.Append(KHelpTexts::Section(title)).Append(KString("<p>"));
+    const KString text = ParameterText(section.first);
     markup.Append(text.IsEmpty() ? KString::Static(KHelpTexts::kNoHelp) : text).Append(KString("<p>"));
   }
   for (const KButtonHelp& button : help_.buttons)

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <string>
 
+#include "core/KAudioPluginHost.h"
 #include "core/KParameter.h"
 #include "kernel/KException.h"
 #include "kernel/KFormat.h"
@@ -13,18 +14,18 @@ constexpr KAudioPlugin::Shape kShape{1, 1, false, false, false};
 const KSwitchKind kBypassKind{};
 const KString kSettings = KString::Static(KPipelineFile::kRoot);
 
-// Keys and names of the slot parameters, the same for every instance and kept for the life of
-// the library, since tables refer to them without copying.
+// Keys and names of the slot parameters by index, the same for every instance and kept for the
+// life of the library, since tables refer to them without copying.
 struct SlotTexts {
   std::vector<std::string> keys, names;
-  SlotTexts() {
-    for (int32_t slot = 1; slot <= KPipelineTable::kSlots; ++slot) {
-      const std::string number = std::to_string(slot);
-      keys.push_back("slot" + number + "bypass");
-      names.push_back("Slot " + number + " bypass");
-      for (int32_t p = 1; p <= KPipelineTable::kSlotParameters; ++p) {
-        keys.push_back("slot" + number + "param" + std::to_string(p));
-        names.push_back("Slot " + number + " parameter " + std::to_string(p));
+  SlotTexts() : keys(KPipelineTable::kParameterCount), names(KPipelineTable::kParameterCount) {
+    for (int32_t slot = 0; slot < KPipelineTable::kSlots; ++slot) {
+      const std::string number = std::to_string(slot + 1);
+      keys[KPipelineTable::BypassIndex(slot)] = "slot" + number + "bypass";
+      names[KPipelineTable::BypassIndex(slot)] = "Slot " + number + " bypass";
+      for (int32_t p = 0; p < KPipelineTable::kModuleParameters; ++p) {
+        keys[KPipelineTable::ParameterIndex(slot, p)] = "slot" + number + "param" + std::to_string(p + 1);
+        names[KPipelineTable::ParameterIndex(slot, p)] = "Slot " + number + " parameter " + std::to_string(p + 1);
       }
     }
   }
@@ -39,8 +40,7 @@ uint32_t SaturatingSum(uint32_t a, uint32_t b) noexcept {
 }
 }  // namespace
 
-const KAudioPluginBase::Parameter* KSlotKind::Carried() const noexcept {
-  const KModuleChain& chain = *chains_.Latest();
+const KAudioPluginBase::Parameter* KSlotKind::Carried(const KModuleChain& chain) const noexcept {
   const int32_t position = chain.PositionOfSlot(slot_);
   if (position < 0) return nullptr;
   const KAudioPlugin& module = *chain.stages[position].module;
@@ -48,7 +48,8 @@ const KAudioPluginBase::Parameter* KSlotKind::Carried() const noexcept {
 }
 
 KString KSlotKind::ToText(double working) const {
-  const KAudioPluginBase::Parameter* carried = Carried();
+  const std::shared_ptr<const KModuleChain> chain = view_.Load();
+  const KAudioPluginBase::Parameter* carried = Carried(*chain);
   if (!carried) return KString::Static("-");
   const KString unit = carried->Unit();
   const KString text = carried->TextForNormalized(working);
@@ -56,20 +57,22 @@ KString KSlotKind::ToText(double working) const {
 }
 
 bool KSlotKind::FromText(const KString& text, double& working) const {
-  const KAudioPluginBase::Parameter* carried = Carried();
+  const std::shared_ptr<const KModuleChain> chain = view_.Load();
+  const KAudioPluginBase::Parameter* carried = Carried(*chain);
   return carried && carried->NormalizedFromText(text, working);
 }
 
 KPipelineTable::KPipelineTable() {
   const SlotTexts& texts = Texts();
-  kinds.reserve(kSlots * kSlotParameters);
-  rows.reserve(kParameterCount);
-  for (int32_t slot = 0, row = 0; slot < kSlots; ++slot) {
-    rows.push_back({texts.keys[row].c_str(), texts.names[row].c_str(), &kBypassKind, 0.0, KParameterInfo::kAutomatable});
-    ++row;
-    for (int32_t p = 0; p < kSlotParameters; ++p, ++row) {
-      kinds.push_back(std::make_unique<KSlotKind>(chains, slot, p));
-      rows.push_back({texts.keys[row].c_str(), texts.names[row].c_str(), kinds.back().get(), 0.0, KParameterInfo::kAutomatable});
+  kinds.resize(kParameterCount);
+  rows.resize(kParameterCount);
+  for (int32_t slot = 0; slot < kSlots; ++slot) {
+    const int32_t bypass = BypassIndex(slot);
+    rows[bypass] = {texts.keys[bypass].c_str(), texts.names[bypass].c_str(), &kBypassKind, 0.0, KParameterInfo::kAutomatable};
+    for (int32_t p = 0; p < kModuleParameters; ++p) {
+      const int32_t row = ParameterIndex(slot, p);
+      kinds[row] = std::make_unique<KSlotKind>(view, slot, p);
+      rows[row] = {texts.keys[row].c_str(), texts.names[row].c_str(), kinds[row].get(), 0.0, KParameterInfo::kAutomatable};
     }
   }
 }
@@ -134,8 +137,8 @@ KAudioPlugin* KEffectPipeline::ModuleInSlot(int32_t slot) const noexcept {
 
 void KEffectPipeline::ShowInSlot(int32_t slot, const KAudioPlugin* module, bool bypass) {
   GetParameter(BypassIndex(slot)).SetNormalized(bypass ? 1.0 : 0.0);
-  const int32_t carried = module ? std::min(module->ParameterCount(), kSlotParameters) : 0;
-  for (int32_t p = 0; p < kSlotParameters; ++p)
+  const int32_t carried = module ? std::min(module->ParameterCount(), kModuleParameters) : 0;
+  for (int32_t p = 0; p < kModuleParameters; ++p)
     GetParameter(ParameterIndex(slot, p)).SetNormalized(p < carried ? module->GetParameter(p).Normalized() : 0.0);
 }
 
@@ -176,9 +179,12 @@ void KEffectPipeline::SetModuleBypass(int32_t slot, bool bypass) {
 }
 
 void KEffectPipeline::Publish(std::unique_ptr<KModuleChain> chain) {
+  // Readers on other threads get a copy of their own, whatever the hand-over frees.
+  view.Store(std::make_shared<const KModuleChain>(*chain));
   chains.Publish(std::move(chain));
   MarkUpdatePending();
   ReportLatency(LatencyOf(Chain()));
+  if (KAudioPluginHost* host = Interface()) host->UpdateParameterNames();
 }
 
 Element KEffectPipeline::WritePipeline() const {
@@ -270,7 +276,7 @@ void KEffectPipeline::Forward(const KModuleChain& chain) noexcept {
 
 void KEffectPipeline::PassValues(const KModuleChain::Stage& stage) const noexcept {
   KAudioPlugin& module = *stage.module;
-  const int32_t carried = std::min(module.ParameterCount(), kSlotParameters);
+  const int32_t carried = std::min(module.ParameterCount(), kModuleParameters);
   for (int32_t p = 0; p < carried; ++p) module.GetParameter(p).SetNormalized(GetParameter(ParameterIndex(stage.slot, p)).Normalized());
 }
 

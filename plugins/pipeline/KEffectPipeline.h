@@ -12,19 +12,20 @@
 
 // A parameter of a slot: its value is the normalised value of the module parameter it carries,
 // and its text is that parameter's text, so hosts show "4.0 : 1" rather than 0.43. A slot
-// parameter without a module parameter behind it reads "-".
+// parameter without a module parameter behind it reads "-". Hosts ask from threads of their
+// own, so it reads the chain through the shared view, never the hand-over.
 class KSlotKind final : public KValueKind {
 public:
-  KSlotKind(const KChainExchange& chains, int32_t slot, int32_t parameter)
-      : KValueKind(0.0, 1.0, "", KValueCurve::kLinear), chains_(chains), slot_(slot), parameter_(parameter) {}
+  KSlotKind(const KChainView& view, int32_t slot, int32_t parameter)
+      : KValueKind(0.0, 1.0, "", KValueCurve::kLinear), view_(view), slot_(slot), parameter_(parameter) {}
   KString ToText(double working) const override;
   bool FromText(const KString& text, double& working) const override;
 
 private:
-  // The module parameter behind this one in the newest chain, or null.
-  const KAudioPluginBase::Parameter* Carried() const noexcept;
+  // The module parameter behind this one in `chain`, or null.
+  const KAudioPluginBase::Parameter* Carried(const KModuleChain& chain) const noexcept;
 
-  const KChainExchange& chains_;
+  const KChainView& view_;
   int32_t slot_;
   int32_t parameter_;
 };
@@ -33,13 +34,25 @@ private:
 // it: slot kinds look modules up in the instance's own chains.
 struct KPipelineTable {
   static constexpr int32_t kSlots = KModuleChain::kSlots;
+  // Host parameters of a slot: its first twelve module parameters sit in a block after its
+  // bypass; the rest, up to the largest module's count, follow all six such blocks, slot by
+  // slot, so that no index released before them moved.
   static constexpr int32_t kSlotParameters = 12;
+  static constexpr int32_t kModuleParameters = 41;
   static constexpr int32_t kSlotStride = 1 + kSlotParameters;
-  static constexpr int32_t kParameterCount = kSlots * kSlotStride;
+  static constexpr int32_t kExtraParameters = kModuleParameters - kSlotParameters;
+  static constexpr int32_t kFirstExtra = kSlots * kSlotStride;
+  static constexpr int32_t kParameterCount = kFirstExtra + kSlots * kExtraParameters;
+  static constexpr int32_t BypassIndex(int32_t slot) noexcept { return slot * kSlotStride; }
+  static constexpr int32_t ParameterIndex(int32_t slot, int32_t parameter) noexcept {
+    return parameter < kSlotParameters ? slot * kSlotStride + 1 + parameter
+                                       : kFirstExtra + slot * kExtraParameters + parameter - kSlotParameters;
+  }
 
   KPipelineTable();
 
   KChainExchange chains{std::make_unique<KModuleChain>()};
+  KChainView view{std::make_shared<const KModuleChain>()};
   std::vector<std::unique_ptr<KSlotKind>> kinds;
   std::vector<KParameterInfo> rows;
 };
@@ -48,23 +61,26 @@ struct KPipelineTable {
 // moved and bypassed on its own, stored with the plug-in's state and as an "Effect pipeline
 // file" (core/KPipelineFile.h).
 //
-// Host parameters: six fixed slots of 13 parameters each. Slot s (from 0) owns the indices
-// s·13 ("slot<s+1>bypass") and s·13 + 1 + p ("slot<s+1>param<p+1>", the module's parameter p,
-// up to 12; a module's later parameters live in its state only). A module keeps the slot it was given from being added until it is removed; moving
-// it changes only the processing order, so automation stays with its module whatever the
-// order. Parameters past a module's own count, and those of free slots, do nothing.
+// Host parameters: six fixed slots, each with its bypass ("slot<s+1>bypass") and one parameter
+// per module parameter p ("slot<s+1>param<p+1>", every parameter of the largest module) at
+// BypassIndex and ParameterIndex. A module keeps the slot it was given from being added until it
+// is removed; moving it changes only the processing order, so automation stays with its module
+// whatever the order. Parameters past a module's own count, and those of free slots, do nothing.
 //
 // Edits run on the user-interface thread: they build a new chain (creating and configuring new
 // modules there) and hand it over lock-free; the audio thread takes it at its next block and
-// never allocates or frees. Latency is the sum over the modules not bypassed, tail the sum over
+// never allocates or frees. Each edit tells the host that the slot parameters' texts changed.
+// Latency is the sum over the modules not bypassed, tail the sum over
 // all of them.
 class KEffectPipeline final : private KPipelineTable, public KAudioPlugin {
 public:
+  using KPipelineTable::kFirstExtra;
+  using KPipelineTable::kModuleParameters;
   using KPipelineTable::kParameterCount;
   using KPipelineTable::kSlotParameters;
   using KPipelineTable::kSlots;
-  static constexpr int32_t BypassIndex(int32_t slot) noexcept { return slot * kSlotStride; }
-  static constexpr int32_t ParameterIndex(int32_t slot, int32_t parameter) noexcept { return slot * kSlotStride + 1 + parameter; }
+  using KPipelineTable::BypassIndex;
+  using KPipelineTable::ParameterIndex;
 
   KEffectPipeline();
   ~KEffectPipeline() override;
@@ -80,6 +96,8 @@ public:
   void SetModuleBypass(int32_t slot, bool bypass);
   int32_t ModuleCount() const noexcept { return static_cast<int32_t>(Chain().stages.size()); }
   int32_t SlotAt(int32_t position) const noexcept { return Chain().stages[position].slot; }
+  // The position of the module in `slot`, -1 for a free slot.
+  int32_t PositionOfSlot(int32_t slot) const noexcept { return Chain().PositionOfSlot(slot); }
   const KString& KeyAt(int32_t position) const noexcept { return Chain().stages[position].key; }
   // The module in `slot`, or null.
   KAudioPlugin* ModuleInSlot(int32_t slot) const noexcept;
@@ -116,3 +134,5 @@ private:
 
 extern const KPluginDescription kEffectPipelineDescription;
 const KPluginHelp& KEffectPipelineHelp();
+// The help-window mark-up of the editor's chain buttons by help key; empty for other keys.
+KString KEffectPipelineButtonHelp(const KString& key);

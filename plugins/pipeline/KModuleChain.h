@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <mutex>
 #include <vector>
 
 #include "core/KAudioPlugin.h"
@@ -27,3 +28,25 @@ struct KModuleChain {
 };
 
 using KChainExchange = KHandOver<KModuleChain>;
+
+// The newest chain as threads other than the audio thread read it (a host asking a slot
+// parameter's text while the user-interface thread edits): shared, so that a reader keeps the
+// chain it holds, and its modules, alive however soon the hand-over lets that chain go. The lock
+// covers the copy of one pointer and nothing else; the audio thread never takes it.
+class KChainView {
+public:
+  explicit KChainView(std::shared_ptr<const KModuleChain> chain) : chain_(std::move(chain)) {}
+  std::shared_ptr<const KModuleChain> Load() const {
+    std::lock_guard lock(mutex_);
+    return chain_;
+  }
+  // The chain replaced is let go after the lock, where freeing it (and modules) costs readers nothing.
+  void Store(std::shared_ptr<const KModuleChain> chain) {
+    std::lock_guard lock(mutex_);
+    chain_.swap(chain);
+  }
+
+private:
+  mutable std::mutex mutex_;
+  std::shared_ptr<const KModuleChain> chain_;
+};

@@ -4,6 +4,7 @@
 
 #include <cmath>
 #include <memory>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -11,7 +12,9 @@
 #include "core/KPipelineFile.h"
 #include "core/KXMLReader.h"
 #include "kernel/KException.h"
+#include "kernel/KRegistries.h"
 #include "plugins/compressor/KCompressorPlugin.h"
+#include "plugins/equalizer/KEqualizerPlugin.h"
 #include "plugins/pipeline/KEffectPipeline.h"
 #include "plugins/utility/KUtilityPlugin.h"
 #include "plugins/warmer/KSampleWarmer.h"
@@ -226,4 +229,75 @@ TEST(KEffectPipeline, FactoryPresetsBringTheirChains) {
   EXPECT_EQ(pipeline->KeyAt(1).ToUtf8(), "Compressor");
   EXPECT_EQ(pipeline->KeyAt(2).ToUtf8(), "Equalizer");
   for (int32_t slot = 0; slot < 3; ++slot) EXPECT_EQ(pipeline->GetParameter(P::BypassIndex(slot)).Normalized(), 0.0);
+}
+
+// Every parameter of every module has a host parameter: the slots reach exactly as far as the
+// largest module. The identifiers hosts saved stay where they were (each slot's bypass and first
+// twelve in a block of 13), and the rest follow them, slot by slot, each key once.
+TEST(KEffectPipeline, EveryModuleParameterHasAStableHostParameter) {
+  KRegistries& registries = KRegistries::Instance();
+  registries.EnsureBuilt();
+  int32_t largest = 0;
+  for (int32_t i = 0; i < registries.Modules().Count(); ++i) {
+    const std::unique_ptr<KAudioPlugin> module(registries.Modules().Create(registries.Modules().Record(i).key, nullptr));
+    largest = std::max(largest, module->ParameterCount());
+  }
+  EXPECT_EQ(largest, P::kModuleParameters);
+
+  const auto pipeline = Pipeline();
+  ASSERT_EQ(pipeline->ParameterCount(), P::kParameterCount);
+  EXPECT_EQ(pipeline->GetParameter(0).Key().ToUtf8(), "slot1bypass");
+  EXPECT_EQ(pipeline->GetParameter(12).Key().ToUtf8(), "slot1param12");
+  EXPECT_EQ(pipeline->GetParameter(13).Key().ToUtf8(), "slot2bypass");
+  EXPECT_EQ(pipeline->GetParameter(77).Key().ToUtf8(), "slot6param12");
+  EXPECT_EQ(pipeline->GetParameter(78).Key().ToUtf8(), "slot1param13");
+  EXPECT_EQ(pipeline->GetParameter(78 + P::kModuleParameters - 12).Key().ToUtf8(), "slot2param13");
+  EXPECT_EQ(pipeline->GetParameter(P::kParameterCount - 1).Key().ToUtf8(), "slot6param" + std::to_string(P::kModuleParameters));
+  std::set<std::string> keys;
+  for (int32_t slot = 0; slot < P::kSlots; ++slot)
+    for (int32_t p = 0; p < P::kModuleParameters; ++p) {
+      const KAudioPluginBase::Parameter& parameter = pipeline->GetParameter(P::ParameterIndex(slot, p));
+      EXPECT_EQ(parameter.Key().ToUtf8(), "slot" + std::to_string(slot + 1) + "param" + std::to_string(p + 1));
+      EXPECT_TRUE(parameter.IsAutomatable());
+      keys.insert(parameter.Key().ToUtf8());
+    }
+  EXPECT_EQ(keys.size(), size_t(P::kSlots * P::kModuleParameters));
+}
+
+// Automating the last parameter of the largest module through its host parameter moves it: the
+// module takes the value at the next block, the host reads it in the module's units, the state
+// keeps it, and the chain sounds as the plug-in set the same way.
+TEST(KEffectPipeline, AutomatingAModulesLastParameterMovesIt) {
+  auto pipeline = Pipeline();
+  pipeline->AddModule(KString::Static("Utility"));
+  const int32_t slot = pipeline->AddModule(KString::Static("Equalizer"));
+  const int32_t last = KEqualizerPlugin::kParameterCount - 1;
+  ASSERT_GE(last, P::kSlotParameters);
+  pipeline->RemoveModule(0);  // the equalizer alone, in slot 1
+  const KAudioPluginBase::Parameter& carried = pipeline->ModuleInSlot(slot)->GetParameter(last);
+  const double target = carried.Kind().ToNormalized(-6.0);
+  const int32_t host = P::ParameterIndex(slot, last);
+  EXPECT_EQ(host, P::kFirstExtra + slot * (P::kModuleParameters - P::kSlotParameters) + last - P::kSlotParameters);
+  KEqualizerPlugin equalizer;
+  ASSERT_TRUE(equalizer.SetSampleRate(kRate));
+  // Both run a block first, so that the value arrives at a running module and glides alike.
+  std::vector<Signal> viaPipeline = Program(4800), viaPlugin = viaPipeline;
+  std::vector<Signal> first = Program(480), second = first;
+  Play(*pipeline, first, 480);
+  Play(equalizer, second, 480);
+  pipeline->GetParameter(host).SetNormalized(target);  // as a host sets it between blocks
+  Play(*pipeline, viaPipeline, 480);
+  EXPECT_EQ(carried.Normalized(), target);
+  const std::string unit = carried.Unit().ToUtf8();
+  EXPECT_EQ(pipeline->GetParameter(host).Text().ToUtf8(), carried.Text().ToUtf8() + (unit.empty() ? "" : " " + unit));
+  EXPECT_NE(pipeline->GetParameter(host).Text().ToUtf8(), "-");
+
+  equalizer.GetParameter(last).SetNormalized(target);
+  Play(equalizer, viaPlugin, 480);
+  EXPECT_EQ(viaPipeline, viaPlugin);
+
+  auto restored = Pipeline();
+  restored->ReadState(pipeline->WriteState());
+  EXPECT_EQ(restored->GetParameter(host).Normalized(), target);
+  EXPECT_EQ(restored->ModuleInSlot(slot)->GetParameter(last).Normalized(), target);
 }

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <vector>
 
 #include "ui/controls/KEditorHost.h"
 
@@ -42,4 +43,18 @@ bool KParameterLink::TakeOutsideChange() noexcept {
   if (value == shown_) return false;
   shown_ = value;
   return true;
+}
+
+void KChangeParameters(KAudioPlugin& plugin, KEditorHost* host, const std::function<void()>& change) {
+  std::vector<double> before(static_cast<size_t>(plugin.ParameterCount()));
+  for (int32_t i = 0; i < plugin.ParameterCount(); ++i) before[static_cast<size_t>(i)] = plugin.GetParameter(i).Normalized();
+  change();
+  if (!host) return;
+  for (int32_t i = 0; i < plugin.ParameterCount(); ++i) {
+    const double now = plugin.GetParameter(i).Normalized();
+    if (now == before[static_cast<size_t>(i)]) continue;
+    host->BeginEdit(i);
+    host->PerformEdit(i, now);
+    host->EndEdit(i);
+  }
 }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 
 #include "core/KAudioPlugin.h"
 #include "core/KParameter.h"
@@ -42,3 +43,7 @@ private:
   double shown_;
   int32_t depth_ = 0;
 };
+
+// Runs a change of many parameters at once (undo, a preset, a new arrangement of a plug-in) and
+// tells the host every parameter it moved, each in a gesture of its own. `host` may be null.
+void KChangeParameters(KAudioPlugin& plugin, KEditorHost* host, const std::function<void()>& change);

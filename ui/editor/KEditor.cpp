@@ -16,6 +16,7 @@
 #include "ui/controls/KEditorHost.h"
 #include "ui/controls/KLabels.h"
 #include "ui/controls/KLevelMeterControl.h"
+#include "ui/controls/KParameterLink.h"
 #include "ui/controls/KPopups.h"
 #include "ui/controls/KValueControl.h"
 #include "ui/editor/KEditorPanels.h"
@@ -364,17 +365,7 @@ bool KEditor::SetScale(double scale) {
 
 template <class F>
 void KEditor::ChangeAll(F&& change) {
-  std::vector<double> before(static_cast<size_t>(plugin_.ParameterCount()));
-  for (int32_t i = 0; i < plugin_.ParameterCount(); ++i) before[static_cast<size_t>(i)] = plugin_.GetParameter(i).Normalized();
-  change();
-  if (!host_) return;
-  for (int32_t i = 0; i < plugin_.ParameterCount(); ++i) {
-    const double now = plugin_.GetParameter(i).Normalized();
-    if (now == before[static_cast<size_t>(i)]) continue;
-    host_->BeginEdit(i);
-    host_->PerformEdit(i, now);
-    host_->EndEdit(i);
-  }
+  KChangeParameters(plugin_, host_, change);
 }
 
 void KEditor::Undo() {

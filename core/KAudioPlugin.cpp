@@ -152,6 +152,7 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
   if (KChannelMode::SwapsOutputs(mode))
     for (int32_t c = 0; c + 1 < outputCount; c += 2) std::swap(out[c], out[c + 1]);
 
+  pieceStart_ = start;
   Modulate(length);
   int32_t cap = subBlockCap_;
   int32_t next = std::max(1, InterpolationPrepare(length, cap, fineSubBlockCap_));
@@ -171,6 +172,7 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
         ProcessMIDIQueue(midi_, start + done + 1);
         if (midi_.NextTimeStamp(stamp) && stamp - start - done < piece) piece = std::max(1, stamp - start - done);
       }
+      pieceStart_ = start + done;
       ProcessAudio(in, out, piece);
       next = InterpolationProcess(piece, length - done - piece);
       done += piece;

@@ -127,6 +127,9 @@ public:
   // Queues one MIDI message of the current host block at `sampleOffset`.
   void ScheduleMIDIEvent(int32_t sampleOffset, KMIDIBytes bytes) noexcept;
   KTransport& Transport() noexcept { return transport_; }
+  // The host's song position in quarter notes at the start of the piece of audio now being
+  // processed, while the transport plays; -1 when it is stopped or the host tells no position.
+  double SongPosition() const noexcept { return transport_.PlayingPositionAt(pieceStart_, sampleRate_); }
   // One host block: `inputs` may be null (silence); `outputs` must hold OutputChannelCount()
   // channels. Host buffers are read only; inputs and outputs may be the same buffers. Without
   // output buffers or samples nothing is processed, but the block's MIDI messages still arrive.
@@ -284,6 +287,7 @@ private:
   Shape shape_;
   KString identifier_;
   KTransport transport_;
+  int32_t pieceStart_ = 0;  // samples from the host block's start to the piece being processed
   KMIDIQueue midi_;
   KLevelMeter meters_[kMeterCount];
   int32_t channelsPerBus_ = kChannelCounts[0];

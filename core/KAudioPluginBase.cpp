@@ -120,9 +120,23 @@ void KAudioPluginBase::ResolveBlockEnd(int32_t blockLength) noexcept {
 
 int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept {
   int32_t limit = blockLength < subBlockCap ? blockLength : subBlockCap;
-  const bool jump = (stateFlags_.load(std::memory_order_acquire) & kJump) != 0;
   grid_ = fineCap > 0 ? fineCap : 1;
-  if (!jump && !active_.IsEmpty()) {
+  // Values must land at once: every ramp jumps to its end and retires. Modulation moves on from
+  // here, as it would have from the start of the stream. Both pools belong to the audio thread,
+  // so this needs no lock; most blocks come here with no jump asked and make no locked write.
+  if ((stateFlags_.load(std::memory_order_acquire) & kJump) != 0) {
+    stateFlags_.fetch_and(~kJump, std::memory_order_acq_rel);
+    for (ParameterRamp* ramp = active_.Head(); ramp;) {
+      ParameterRamp* next = ramp->next;
+      if (!ramp->modulation) {
+        ApplyLast(*ramp);
+        Retire(ramp);
+      }
+      ramp = next;
+    }
+    position_ = 0;  // the grid starts again where values landed at once
+  }
+  if (!active_.IsEmpty()) {
     ResolveBlockEnd(blockLength);
     rampsAdded_ = false;
     bool anyFine = false;
@@ -141,15 +155,6 @@ int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& sub
     remaining_ = limit < blockLength ? blockLength : 0;
     return limit;
   }
-  // Values must land at once: every ramp jumps to its end and retires. Both pools belong to
-  // the audio thread, so this needs no lock. Most blocks come here with no jump asked and no
-  // ramp: they make no locked write.
-  if (jump) stateFlags_.fetch_and(~kJump, std::memory_order_acq_rel);
-  while (ParameterRamp* ramp = active_.Head()) {
-    ApplyLast(*ramp);
-    Retire(ramp);
-  }
-  if (jump) position_ = 0;  // the grid starts again where values landed at once
   remaining_ = 0;
   rampsAdded_ = false;
   return limit;

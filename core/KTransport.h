@@ -20,4 +20,10 @@ struct KTransport {
 
   void Reset() noexcept { *this = KTransport{}; }
   bool IsPlaying() const noexcept { return (flags & kPlaying) != 0; }
+  // The song position `offset` samples into the block while the transport plays with a known
+  // position and tempo, else -1.
+  double PlayingPositionAt(int32_t offset, double sampleRate) const noexcept {
+    if (!IsPlaying() || !(songPosition >= 0.0) || !(tempo > 0.0) || !(sampleRate > 0.0)) return -1.0;
+    return songPosition + offset * tempo / (sampleRate * 60.0);
+  }
 };

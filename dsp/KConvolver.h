@@ -8,17 +8,20 @@
 
 // Convolution of one channel with a long impulse response, with no added latency: the first
 // `partition` taps run as a direct-form filter inside the block, and the rest as uniformly
-// partitioned overlap-save convolutions in levels of growing block size (each level N starts at
-// tap N, so its result for a block is ready when the block before it is complete). All work
-// happens at fixed sample positions, so the output does not depend on how a host cuts its blocks.
+// partitioned overlap-save convolutions in levels of growing block size. Each smaller level N
+// starts at tap N, so its result for a block is computed when the block before it is complete.
+// The largest level starts at twice its block size: its result for a block may take the whole
+// block before, and its transforms and products are spread over that block's partitions, so that
+// no host block carries its work at once. All work happens at fixed sample positions, so the
+// output does not depend on how a host cuts its blocks.
 //
 // Load allocates and belongs off the audio thread; Process and Reset never allocate.
 class KConvolver {
 public:
   static constexpr int32_t kDefaultPartition = 64;
   static constexpr int32_t kMaxPartition = 1024;
-  // Each level's block is this many times the one before it, and the largest is this long: the
-  // largest level's work lands in one block, so it bounds the worst block's cost.
+  // Each level's block is this many times the one before it, up to the largest level, whose block
+  // is at most half this long (its transforms are this long).
   static constexpr int32_t kLevelGrowth = 4;
   static constexpr int32_t kLargestBlock = 8192;
 

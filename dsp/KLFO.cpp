@@ -15,6 +15,7 @@ constexpr uint32_t kSeed = 0x9E3779B9u;
 // A cycle no shorter than two samples, no longer than about six hours at 48 kHz.
 constexpr double kShortestCycle = 2.0;
 constexpr double kLongestCycle = 1e9;
+constexpr double kFollowSteps = 1024.0;  // steps per sample of a cycle taken from the song position
 
 // For x in [0, 1): a quarter cycle ahead of a tent that peaks in the middle.
 double Triangle(double x) noexcept {
@@ -76,12 +77,16 @@ void KLFO::Reset() noexcept {
   }
 }
 
-void KLFO::Follow(double quarterNotes) noexcept {
-  if (quarters_ <= 0.0 || !(quarterNotes >= 0.0)) return;
+bool KLFO::Follow(double quarterNotes) noexcept {
+  if (quarters_ <= 0.0 || !(quarterNotes >= 0.0)) return false;
   const double cycles = quarterNotes / quarters_ + start_;
-  const double wanted = (cycles - std::floor(cycles)) * length_;
+  // To a 1024th of a sample: the host's position reaches here through sums that round
+  // differently with the way the blocks are cut, and must land the cycle in the same place.
+  const double wanted = std::round((cycles - std::floor(cycles)) * length_ * kFollowSteps) / kFollowSteps;
   const double off = std::abs(wanted - position_);
-  if (std::min(off, length_ - off) > 0.5) SetPhase(cycles);
+  if (std::min(off, length_ - off) <= 0.5) return false;
+  position_ = wanted < length_ ? wanted : 0.0;
+  return true;
 }
 
 void KLFO::SetPhase(double cycles) noexcept {

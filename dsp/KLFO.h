@@ -42,8 +42,8 @@ public:
   void Reset() noexcept;
   // For a synced LFO: puts the cycle where the host's song position (in quarter notes) says it
   // should be, when it is more than half a sample away; a host that plays on steadily never moves
-  // it, so the output does not depend on how the host cuts its blocks.
-  void Follow(double quarterNotes) noexcept;
+  // it, so the output does not depend on how the host cuts its blocks. Answers whether it moved.
+  bool Follow(double quarterNotes) noexcept;
   // Puts the cycle at a phase (in cycles, wrapped), without touching the random values or the
   // smoothing; for LFOs that must keep a set distance from another one.
   void SetPhase(double cycles) noexcept;

@@ -29,11 +29,14 @@ void KPluginLFOs::Apply() noexcept {
   for (KLFO& lfo : lfos_) lfo.Update(settings_);
 }
 
-void KPluginLFOs::FollowTempo(KAudioPlugin& plugin) noexcept {
+void KPluginLFOs::FollowHost(KAudioPlugin& plugin) noexcept {
   const double tempo = KHostTempo(plugin);
-  if (tempo == settings_.tempo) return;
-  settings_.tempo = tempo;
-  if (settings_.note >= 0) Apply();
+  if (tempo != settings_.tempo) {
+    settings_.tempo = tempo;
+    if (settings_.note >= 0) Apply();
+  }
+  // The second channel keeps its distance behind the first.
+  if (lfos_[0].Follow(plugin.SongPosition())) lfos_[1].SetPhase(lfos_[0].Phase() - offset_);
 }
 
 void KPluginLFOs::Reset() noexcept {

@@ -45,8 +45,9 @@ public:
 
   // Takes the controls' values (from ProcessUpdate); the LFOs go on from where they are.
   void Update(KAudioPlugin& plugin, const KLFOControls& controls) noexcept;
-  // Picks up a change of the host's tempo (from Process, before Fill).
-  void FollowTempo(KAudioPlugin& plugin) noexcept;
+  // Picks up a change of the host's tempo and, for a synced LFO while the transport plays, takes
+  // the cycle from the song position (from Process, before Fill).
+  void FollowHost(KAudioPlugin& plugin) noexcept;
   // Back to the start of the cycle, the channels their set distance apart.
   void Reset() noexcept;
   // The next n values of channel c's LFO, in [-1, 1].

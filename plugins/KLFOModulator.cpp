@@ -7,10 +7,9 @@
 #include "core/KParameter.h"
 #include "core/KStateSection.h"
 #include "dsp/KNoteValues.h"
+#include "plugins/KLFOControls.h"
 
 namespace {
-constexpr double kDefaultTempo = 120.0;
-
 double NumberOf(const Element& element, const char* name, double fallback) {
   return KStateSection::ReadNumber(element, KString::Static(name), fallback);
 }
@@ -48,7 +47,7 @@ std::unique_ptr<KModulator> KLFOModulator::Make(KAudioPlugin& plugin, const Elem
     s.shape = IndexOf(entry, "Shape", KLFO::kShapeNames, KLFO::kSine);
     s.rate = std::max(NumberOf(entry, "Rate", 1.0), 0.0);
     s.note = IndexOf(entry, "Note", noteNames, -1);
-    s.tempo = kDefaultTempo;
+    s.tempo = KLFOControls::kTempoUnknown;
     s.phase = NumberOf(entry, "Phase", 0.0);
     s.smoothing = std::max(NumberOf(entry, "Smoothing", 0.0), 0.0);
     s.sampleRate = plugin.SampleRate();
@@ -60,15 +59,20 @@ std::unique_ptr<KModulator> KLFOModulator::Make(KAudioPlugin& plugin, const Elem
 }
 
 void KLFOModulator::Reset() noexcept {
+  clock_ = 0;
   for (Oscillator& oscillator : oscillators_) oscillator.lfo.Reset();
 }
 
 void KLFOModulator::Modulate(KAudioPlugin& plugin, int32_t length) noexcept {
   length = std::clamp(length, 1, KAudioPlugin::kMaxChunk);
-  const double hostTempo = plugin.Transport().tempo;
-  const double tempo = hostTempo > 0.0 ? hostTempo : kDefaultTempo;
-  // Corners spread evenly enough that a whole piece fits one ramp, the last at its end.
-  const int32_t spacing = std::max(kCornerSpacing, (length + ParameterRamp::kMaxPoints - 2) / (ParameterRamp::kMaxPoints - 1));
+  const double tempo = KHostTempo(plugin), song = plugin.SongPosition();
+  // Corners on the stream's grid: the one before the piece (when it starts between two), those
+  // within it, and the first after its end, which the ramp heads for; so a ramp never ends
+  // inside a piece and the value on a corner is the corner's own.
+  const auto into = static_cast<int32_t>(clock_ % kCornerSpacing);
+  const int32_t first = into == 0 ? 0 : kCornerSpacing - into;
+  const int32_t last = length < first ? first : first + ((length - first) / kCornerSpacing + 1) * kCornerSpacing;
+  const auto intoNext = static_cast<int32_t>((clock_ + length) % kCornerSpacing);
   KAudioPluginBase::RampPoint points[ParameterRamp::kMaxPoints];
   for (Oscillator& oscillator : oscillators_) {
     KLFOSettings& s = oscillator.settings;
@@ -77,12 +81,19 @@ void KLFOModulator::Modulate(KAudioPlugin& plugin, int32_t length) noexcept {
       s.sampleRate = plugin.SampleRate();
       oscillator.lfo.Update(s);
     }
+    oscillator.lfo.Follow(song);
     oscillator.lfo.Fill(values_.data(), length);
+    // The values past the piece come from a copy: the oscillator itself stays at the piece's end,
+    // where the next piece may move it to a new song position.
+    KLFO ahead = oscillator.lfo;
+    ahead.Fill(values_.data() + length, last - length + 1);
     for (const Target& target : oscillator.targets) {
       int32_t count = 0;
-      for (int32_t t = 0; t < length; t += spacing) points[count++] = {t, target.depth * values_[t]};
-      points[count++] = {length, target.depth * values_[length - 1]};
-      plugin.AddRamp(target.parameter, std::span(points, static_cast<size_t>(count)), false, true);
+      if (into != 0) points[count++] = {-into, target.depth * oscillator.corner};
+      for (int32_t t = first; t <= last; t += kCornerSpacing) points[count++] = {t, target.depth * values_[t]};
+      plugin.AddRamp(target.parameter, std::span(points, static_cast<size_t>(count)), true, true);
     }
+    if (intoNext != 0 && length >= intoNext) oscillator.corner = values_[length - intoNext];
   }
+  clock_ += length;
 }

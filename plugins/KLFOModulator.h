@@ -27,9 +27,12 @@ public:
   void Modulate(KAudioPlugin& plugin, int32_t length) noexcept override;
   void Reset() noexcept override;
 
-  // Ramp corners are this far apart at least; a piece of a host block takes at most a ramp's
-  // worth of them.
-  static constexpr int32_t kCornerSpacing = 32;
+  // Ramp corners lie this many samples apart, counted from the start of the stream (the last
+  // reset) rather than from the host's block, and the ramps move their parameters only on the
+  // plug-in's fine grid: the same LFOs sound the same whatever block sizes the host uses.
+  static constexpr int32_t kCornerSpacing = 128;
+  // A piece of a host block (at most kMaxChunk) with the corners on either side fits one ramp.
+  static_assert(KAudioPlugin::kMaxChunk / kCornerSpacing + 2 <= ParameterRamp::kMaxPoints);
 
 private:
   struct Target {
@@ -40,8 +43,11 @@ private:
     KLFO lfo;
     KLFOSettings settings;
     std::vector<Target> targets;
+    double corner = 0.0;  // the value at the latest corner passed
   };
 
   std::vector<Oscillator> oscillators_;
-  std::vector<double> values_ = std::vector<double>(KAudioPlugin::kMaxChunk);
+  int64_t clock_ = 0;  // samples since the last reset
+  // A piece's values, then those up to the first corner at or after its end.
+  std::vector<double> values_ = std::vector<double>(KAudioPlugin::kMaxChunk + kCornerSpacing + 1);
 };

@@ -11,7 +11,7 @@ void KLFOPlugin::ProcessUpdate() {
 }
 
 void KLFOPlugin::Process(const float* const* inputs, float* const* outputs, int32_t sampleCount) {
-  lfos_.FollowTempo(*this);
+  lfos_.FollowHost(*this);
   ProcessEffect(inputs, outputs, std::min(ChannelsPerBus(), KPluginLFOs::kChannels), sampleCount);
 }
 

@@ -67,8 +67,8 @@ struct MakerScope {
 };
 }  // namespace
 
-// The modulator's corner splits the block; the working value moves, the set value and the
-// state do not; automation of the same parameter runs beside it. An empty section stops it and
+// The modulator's corner splits the block, even the first after a reset; the working value moves,
+// the set value and the state do not; automation of the same parameter runs beside it. An empty section stops it and
 // takes the offset back.
 TEST(Modulation, ModulatorRampsMoveTheWorkingValueOnly) {
   MakerScope scope(&MakeStep);
@@ -84,6 +84,9 @@ TEST(Modulation, ModulatorRampsMoveTheWorkingValueOnly) {
     EXPECT_EQ(counter.Count(), 0);
   }
   EXPECT_EQ(plugin.Log(), "16@5 48@7");
+  // A reset lands automation at once, but the modulation of its first block still moves.
+  plugin.Reset();
+  EXPECT_EQ(plugin.Run(64), "16@5 48@7");
   EXPECT_EQ(plugin.GetParameter(0).Normalized(), 0.5);
   EXPECT_EQ(plugin.GetParameter(0).Text().ToUtf8(), plugin.GetParameter(0).TextForNormalized(0.5).ToUtf8());
   EXPECT_NE(plugin.WriteState().find("<LFOs><LFO/></LFOs>"), std::string::npos);

@@ -35,6 +35,16 @@ std::vector<double> DirectConvolution(const std::vector<float>& x, const std::ve
   return y;
 }
 
+// The largest difference between `y` and `expected`, relative to the largest magnitude expected.
+double RelativeError(const std::vector<float>& y, const std::vector<double>& expected) {
+  double worst = 0.0, peak = 0.0;
+  for (size_t i = 0; i < y.size(); ++i) {
+    worst = std::max(worst, std::abs(y[i] - expected[i]));
+    peak = std::max(peak, std::abs(expected[i]));
+  }
+  return worst / peak;
+}
+
 // Runs `x` through the convolver in host blocks cycling through `blocks`.
 std::vector<float> Convolve(KConvolver& convolver, const std::vector<float>& x, const std::vector<int32_t>& blocks) {
   std::vector<float> y(x.size());
@@ -57,10 +67,26 @@ TEST(KConvolver, EqualsDirectConvolutionFromTheFirstSample) {
   for (int32_t partition : {16, 64, 256}) {
     KConvolver convolver;
     convolver.Load(h, partition);
-    const std::vector<float> y = Convolve(convolver, x, {37, 64, 1, 500});
-    double worst = 0.0;
-    for (size_t i = 0; i < y.size(); ++i) worst = std::max(worst, std::abs(y[i] - expected[i]));
-    EXPECT_LT(worst, 1e-6 * peak) << "partition " << partition;
+    EXPECT_LT(RelativeError(Convolve(convolver, x, {37, 64, 1, 500}), expected), 1e-6) << "partition " << partition;
+  }
+}
+
+// A response long enough for the largest level, which spreads its work over the block before the
+// one it plays in: with strong taps in its first and last partitions, the sum still agrees from
+// the first sample at every partition size and however the host cuts its blocks.
+TEST(KConvolver, SpreadLargestLevelEqualsDirectConvolution) {
+  std::vector<float> h = DecayingNoise(12800, 8);
+  h[8192] = 0.7f;   // the largest level's first tap
+  h[8200] = -0.5f;
+  h[12799] = 0.6f;  // its last
+  const std::vector<float> x = Noise(22000, 9);
+  const std::vector<double> expected = DirectConvolution(x, h);
+  for (int32_t partition : {16, 64, 1024}) {
+    for (const std::vector<int32_t>& blocks : std::vector<std::vector<int32_t>>{{64}, {37, 4096, 1, 500}}) {
+      KConvolver convolver;
+      convolver.Load(h, partition);
+      EXPECT_LT(RelativeError(Convolve(convolver, x, blocks), expected), 1e-6) << "partition " << partition << ", first block " << blocks.front();
+    }
   }
 }
 

@@ -127,13 +127,15 @@ TEST(KLFO, RateChangesKeepThePhaseAndLongRunsDoNotDrift) {
 }
 
 // A synced LFO takes its place from the song position; a host that plays on steadily, however it
-// cuts its blocks, leaves the output exactly as without following; a jump is followed at once.
+// cuts its blocks, never moves it and leaves the output exactly as without following; a jump is
+// followed at once, and Follow says when it moved.
 TEST(KLFO, FollowsTheSongPositionOnlyWhenItJumps) {
   KLFO lfo;
   lfo.Update(Synced(KLFO::kSawUp, kNoteValueQuarter, 120.0));
   lfo.Reset();
-  lfo.Follow(2.5);
+  EXPECT_TRUE(lfo.Follow(2.5));
   EXPECT_DOUBLE_EQ(lfo.Phase(), 0.5);
+  EXPECT_FALSE(lfo.Follow(2.5));  // already there
   lfo.Update(Synced(KLFO::kSawUp, NoteIndex("1/1"), 120.0));
   lfo.Reset();
   lfo.Follow(2.5);
@@ -150,7 +152,7 @@ TEST(KLFO, FollowsTheSongPositionOnlyWhenItJumps) {
   const int32_t blocks[] = {1, 77, 500, 4096, 13, 999};
   for (int32_t at = 0, k = 0; at < 20000; k = (k + 1) % 6) {
     const int32_t block = std::min(blocks[k], 20000 - at);
-    steady.Follow(at / samplesPerQuarter);
+    EXPECT_FALSE(steady.Follow(at / samplesPerQuarter)) << at;
     steady.Fill(a.data() + at, block);
     at += block;
   }
@@ -161,7 +163,7 @@ TEST(KLFO, FollowsTheSongPositionOnlyWhenItJumps) {
   KLFO free;  // a free LFO ignores the song position
   free.Update(Free(KLFO::kSine, 1.0));
   free.Reset();
-  free.Follow(3.3);
+  EXPECT_FALSE(free.Follow(3.3));
   EXPECT_EQ(free.Phase(), 0.0);
 }
 

@@ -4,7 +4,9 @@
 
 #include <algorithm>
 #include <cmath>
+#include <functional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "core/KParameter.h"
@@ -15,13 +17,16 @@
 namespace {
 constexpr double kRate = 48000.0;
 
-// A constant 0.5 through the utility in blocks of 512: the left output.
-std::vector<float> Through(KUtilityPlugin& plugin, size_t length) {
+// A constant 0.5 through the utility in blocks of 512 (or `block`), `beforeBlock(at)` called
+// ahead of the block starting at `at`: the left output.
+std::vector<float> Through(KUtilityPlugin& plugin, size_t length, size_t block = 512,
+                           const std::function<void(size_t)>& beforeBlock = [](size_t) {}) {
   std::vector<float> in(length, 0.5f), left(length), right(length);
-  for (size_t at = 0; at < length; at += 512) {
+  for (size_t at = 0; at < length; at += block) {
     const float* i[] = {in.data() + at, in.data() + at};
     float* o[] = {left.data() + at, right.data() + at};
-    plugin.ProcessHostBlock(i, o, static_cast<int32_t>(std::min<size_t>(512, length - at)));
+    beforeBlock(at);
+    plugin.ProcessHostBlock(i, o, static_cast<int32_t>(std::min(block, length - at)));
   }
   return left;
 }
@@ -51,11 +56,35 @@ TEST(KLFOModulator, SyncedSquareMutesHalfOfEachBeat) {
     const std::vector<float> out = Through(plugin, 2 * beat);
     for (size_t cycle = 0; cycle < 2; ++cycle) {
       const size_t start = cycle * beat, settled = 1000;  // past the utility's 5 ms glide
-      EXPECT_LT(Loudest(out, start + settled, start + beat / 2), 1e-6f) << tempo << " BPM, cycle " << cycle;
+      // The ramp between the corners either side of the switch leaves the mute a corner early.
+      EXPECT_LT(Loudest(out, start + settled, start + beat / 2 - KLFOModulator::kCornerSpacing), 1e-6f) << tempo << " BPM, cycle " << cycle;
       EXPECT_GT(Loudest(out, start + beat / 2 + settled, start + beat), 0.49f) << tempo << " BPM, cycle " << cycle;
       EXPECT_LT(Loudest(out, start + beat / 2 + settled, start + beat), 0.51f);
     }
     EXPECT_EQ(plugin.GetParameter(KUtilityPlugin::kMute).Normalized(), 0.0);
+  }
+}
+
+// While the host plays (120 BPM, 24000 samples a beat) the quarter-note square takes its cycle
+// from the song position: from 2.75 the mute holds from the beat at 6000 to 18000 and from 30000;
+// looped back to 1.1 at sample 36000 it holds on until 45600 and comes again at 57600.
+TEST(KLFOModulator, SyncedLFOFollowsTheSongPositionWhilePlaying) {
+  KUtilityPlugin plugin;
+  ASSERT_TRUE(plugin.SetSampleRate(kRate));
+  plugin.ReadState(kSquareOnMute);
+  KTransport& transport = plugin.Transport();
+  transport.tempo = 120.0;
+  transport.flags = KTransport::kPlaying;
+  const std::vector<float> out = Through(plugin, 66000, 500, [&](size_t at) {
+    transport.songPosition = at < 36000 ? 2.75 + at / 24000.0 : 1.1 + (at - 36000) / 24000.0;
+  });
+  // Each stretch from its start (plus the corners' spacing and the utility's glide) to shortly
+  // before the next: muted or sounding.
+  const std::pair<size_t, bool> stretches[] = {{0, false}, {6000, true}, {18000, false}, {30000, true}, {45600, false}, {57600, true}, {66000, false}};
+  for (size_t k = 0; k + 1 < std::size(stretches); ++k) {
+    const size_t from = stretches[k].first + 500, to = stretches[k + 1].first - 200;
+    if (stretches[k].second) EXPECT_LT(Loudest(out, from, to), 1e-6f) << "muted from " << stretches[k].first;
+    else EXPECT_GT(*std::min_element(out.begin() + from, out.begin() + to), 0.49f) << "sounding from " << stretches[k].first;
   }
 }
 

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
 #include <vector>
 
 #include "dsp/KSectionState.h"
@@ -55,6 +56,41 @@ TEST(KTremoloPlugin, DepthShapeAndSync) {
   for (size_t i = 0; i < half.first.size(); ++i) {
     const float x = std::abs(in.first[i]), y = std::abs(half.first[i]);
     ASSERT_TRUE(y <= x && y >= 0.5f * x - 1e-7f) << i;
+  }
+}
+
+// Synced to a quarter note while the host plays at 120 BPM (24000 samples a beat), a full square
+// passes the first half of every beat: from a start a quarter of a beat before a beat (song
+// position 2.75), the sound comes at 6000 samples, goes at 18000 and comes again at 30000. When
+// the host loops back to 1.1 at sample 36000, the cycle goes on from there, a tenth into a beat:
+// silent 9600 samples later, sounding again 12000 after that. A stopped transport moves nothing:
+// the LFO runs on from its start.
+TEST(KTremoloPlugin, SyncedCycleFollowsTheSongPosition) {
+  using T = KTremoloPlugin;
+  const KStereo in = Noise(66000);
+  for (const bool playing : {true, false}) {
+    T plugin;
+    KRenderStereo(plugin, KStereo{}, {{T::kDepth, 100.0}, {T::kLFO.sync, kNoteValueQuarter + 1.0}, {T::kLFO.shape, KLFO::kSquare}, {T::kLFO.smoothing, 0.0}});
+    KTransport& transport = plugin.Transport();
+    transport.tempo = 120.0;
+    transport.flags = playing ? KTransport::kPlaying : 0;
+    KStereo out{std::vector<float>(in.first.size()), std::vector<float>(in.first.size())};
+    for (size_t at = 0; at < in.first.size(); at += 500) {
+      transport.songPosition = at < 36000 ? 2.75 + at / 24000.0 : 1.1 + (at - 36000) / 24000.0;
+      const float* i[] = {in.first.data() + at, in.second.data() + at};
+      float* o[] = {out.first.data() + at, out.second.data() + at};
+      plugin.ProcessHostBlock(i, o, 500);
+    }
+    // Where each stretch of sound begins, as the song position has it (or, stopped, as cycles
+    // from the start have it); silence until the next.
+    const std::vector<std::pair<size_t, bool>> stretches =
+        playing ? std::vector<std::pair<size_t, bool>>{{0, false}, {6000, true}, {18000, false}, {30000, true}, {45600, false}, {57600, true}}
+                : std::vector<std::pair<size_t, bool>>{{0, true}, {12000, false}, {24000, true}, {36000, false}, {48000, true}, {60000, false}};
+    for (size_t k = 0; k < stretches.size(); ++k) {
+      const size_t end = k + 1 < stretches.size() ? stretches[k + 1].first : in.first.size();
+      for (size_t i = stretches[k].first; i < end; ++i)
+        ASSERT_EQ(out.first[i], stretches[k].second ? in.first[i] : 0.0f) << (playing ? "playing, " : "stopped, ") << i;
+    }
   }
 }
 

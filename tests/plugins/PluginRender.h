@@ -5,6 +5,7 @@
 #include <complex>
 #include <numbers>
 #include <initializer_list>
+#include <span>
 #include <vector>
 
 #include "core/KAudioPlugin.h"
@@ -12,20 +13,27 @@
 using Channels = std::vector<std::vector<float>>;
 
 // Plays `in` (one row per input channel) through `plugin` in host blocks whose sizes cycle
-// through `sizes`; one row per output channel comes back.
-inline Channels Render(KAudioPlugin& plugin, const Channels& in, std::initializer_list<int32_t> sizes) {
+// through `sizes`, calling `beforeBlock(at)` ahead of the block that starts at sample `at`; one
+// row per output channel comes back.
+template <class BeforeBlock>
+Channels RenderWith(KAudioPlugin& plugin, const Channels& in, std::span<const int32_t> sizes, BeforeBlock beforeBlock) {
   const size_t length = in.empty() ? 0 : in[0].size();
   Channels out(static_cast<size_t>(plugin.OutputChannelCount()), std::vector<float>(length));
   std::vector<const float*> x(in.size());
   std::vector<float*> y(out.size());
   for (size_t at = 0, k = 0; at < length; ++k) {
-    const auto n = std::min<size_t>(static_cast<size_t>(sizes.begin()[k % sizes.size()]), length - at);
+    const auto n = std::min<size_t>(static_cast<size_t>(sizes[k % sizes.size()]), length - at);
     for (size_t c = 0; c < in.size(); ++c) x[c] = in[c].data() + at;
     for (size_t c = 0; c < out.size(); ++c) y[c] = out[c].data() + at;
+    beforeBlock(at);
     plugin.ProcessHostBlock(x.data(), y.data(), static_cast<int32_t>(n));
     at += n;
   }
   return out;
+}
+
+inline Channels Render(KAudioPlugin& plugin, const Channels& in, std::initializer_list<int32_t> sizes) {
+  return RenderWith(plugin, in, std::span(sizes.begin(), sizes.size()), [](size_t) {});
 }
 
 // `channels` rows of a sine of `amplitude` at `hz` (48 kHz), from sample `from` to `to`.

@@ -14,10 +14,10 @@ double RampValue(const ParameterRamp& ramp) noexcept {
   const ParameterRamp::Point& p0 = ramp.points[0];
   const ParameterRamp::Point& p1 = ramp.points[1];
   if (p0.time > 0) return p0.value;  // the segment has not begun
+  // A segment that has reached its corner lands on it exactly, not on a rounded interpolation.
+  if (p1.time <= 0) return p1.value;
   const double length = static_cast<double>(p1.time) - static_cast<double>(p0.time);
-  if (length <= 0.0) return p1.value;
-  const double elapsed = p1.time < 0 ? length : -static_cast<double>(p0.time);
-  return p0.value + (p1.value - p0.value) * elapsed / length;
+  return p0.value + (p1.value - p0.value) * -static_cast<double>(p0.time) / length;
 }
 
 void Fill(ParameterRamp& ramp, int32_t parameter, std::span<const ParameterRamp::Point> points, bool fine, bool modulation = false) noexcept {

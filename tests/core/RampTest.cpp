@@ -68,6 +68,24 @@ TEST_F(RampTest, RampsCutTheBlockAtTheirBreakPointsAndEndOnTheirLastValue) {
   }
 }
 
+// Where start + (end - start) * t / t rounds away from the end, the parameter still lands on the
+// ramp's own last value to the bit: a host that sets 0.45 reads back 0.45, coarse or fine, whether
+// a block ends on the corner or past it.
+TEST_F(RampTest, ARampLandsExactlyOnItsLastValue) {
+  struct Case { double from, to; int32_t length; bool fine; std::vector<int32_t> blocks; };
+  const Case cases[] = {
+      {0.1, 0.45, 48, false, {48}}, {0.7, 0.3, 100, false, {64, 64}}, {0.3, 0.125, 48, false, {17, 64}},
+      {0.1, 0.45, 48, true, {64}}, {0.7, 0.3, 100, true, {50, 50, 64}}, {0.3, 0.125, 48, true, {128}},
+  };
+  for (const Case& c : cases) {
+    const Point points[] = {{0, c.from}, {c.length, c.to}};
+    ASSERT_TRUE(plugin.AddRamp(0, points, c.fine));
+    for (int32_t length : c.blocks) plugin.Run(buffers, length);
+    EXPECT_EQ(Value(0), c.to) << c.from << " to " << c.to << (c.fine ? " fine" : "");
+    ExpectEveryRecordSpare();
+  }
+}
+
 TEST_F(RampTest, AnExhaustedPoolAllocatesNothingAndAppliesTheFinalValueAtOnce) {
   int32_t accepted = 0;
   {

@@ -16,6 +16,8 @@ bash scripts/windows-deps.sh
 export WINEPREFIX="$PWD/build/wine" WINEDEBUG=-all WINEDLLOVERRIDES="mscoree,mshtml=" DISPLAY=
 wineboot_done="$WINEPREFIX/.initialised"
 [ -f "$wineboot_done" ] || { /usr/lib/wine/wine64 wineboot --init >/dev/null 2>&1 || true; touch "$wineboot_done"; }
+# Every run starts with no user data, as the Linux tests do in their fresh data folders.
+rm -rf "$WINEPREFIX/drive_c/users/$(id -un)/AppData/Roaming/Torvane"
 cmake -S . -B build/windows -G Ninja --toolchain cmake/mingw-w64-x86_64.cmake -DCMAKE_BUILD_TYPE=RelWithDebInfo \
   -DTORVANE_BENCHMARKS=OFF >/dev/null
 cmake --build build/windows -j "$jobs"

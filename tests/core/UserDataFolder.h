@@ -8,7 +8,7 @@
 
 #ifdef _WIN32
 // Windows finds the user's data through the shell, which no variable redirects; the Windows tests
-// run in a Wine prefix of their own, whose roaming folder no one else writes to.
+// run in a Wine prefix of their own, whose user data the test script clears before every run.
 class KUserDataFolder {
 public:
   KUserDataFolder() {}  // user-provided: a guard that is named but never read is no unused variable

@@ -2,7 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
-#include <latch>
+#include <condition_variable>
 #include <mutex>
 #include <thread>
 
@@ -96,6 +96,28 @@ TEST_F(AutomationTest, LatencyIsReportedAtIdleWhenChangedOrWhenAskedToAlways) {
 }
 
 namespace {
+// A one-way gate on a mutex and a condition variable: a test waiting on the runtime's std::latch
+// was seen to hang under Wine, where that latch waits on atomics.
+class KGate {
+public:
+  void Open() {
+    {
+      std::lock_guard<std::mutex> lock(mutex_);
+      open_ = true;
+    }
+    changed_.notify_all();
+  }
+  void Wait() {
+    std::unique_lock<std::mutex> lock(mutex_);
+    changed_.wait(lock, [this] { return open_; });
+  }
+
+private:
+  std::mutex mutex_;
+  std::condition_variable changed_;
+  bool open_ = false;
+};
+
 // A host that takes its time over beginning the gesture of parameter 0, so that the touch lock
 // stays held meanwhile; it logs from any thread under a lock of its own.
 class KSlowBeginHost final : public KAudioPluginInterface {
@@ -103,8 +125,8 @@ public:
   using KAudioPluginInterface::KAudioPluginInterface;
   void BeginGesture(int32_t index) override {
     if (index == 0) {
-      beginning.count_down();
-      open.wait();
+      beginning.Open();
+      open.Wait();
     }
     Log("B", index);
   }
@@ -120,7 +142,7 @@ public:
     return calls_;
   }
 
-  std::latch beginning{1}, open{1};
+  KGate beginning, open;
 
 private:
   void Log(const char* call, int32_t index) {
@@ -138,10 +160,10 @@ TEST(AutomationThreads, ASendWaitsForATouchLockHeldElsewhereAndGoesOutInsideItsG
   KRecordingPlugin plugin;
   KSlowBeginHost host(plugin, "Test");
   std::thread toucher([&] { host.GestureNotice(0, Gesture::kTouch); });
-  host.beginning.wait();  // the toucher holds the lock inside the host's begin
+  host.beginning.Wait();  // the toucher holds the lock inside the host's begin
   std::thread sender([&] { host.SendAutomation(1, 0.5); });
   std::this_thread::sleep_for(std::chrono::milliseconds(50));  // time enough for a send that does not wait
-  host.open.count_down();
+  host.open.Open();
   toucher.join();
   sender.join();
   EXPECT_EQ(host.Calls(), "B0 B1 S1");

@@ -158,7 +158,7 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
     for (int32_t c = 0; c + 1 < outputCount; c += 2) std::swap(out[c], out[c + 1]);
 
   pieceStart_ = start;
-  Modulate(length);
+  if (!modulator_.IsIdle()) Modulate(length);
   int32_t cap = subBlockCap_;
   int32_t next = std::max(1, InterpolationPrepare(length, cap, fineSubBlockCap_));
   // Without event splitting every message of the chunk is handed over before its audio.
@@ -204,21 +204,32 @@ void KAudioPlugin::ProcessAudio(const float* const* inputs, float* const* output
     if (TakeUpdatePending()) ProcessUpdate();
     // The meters show the main bus only: a mono plug-in's side-chain is no right channel. The
     // input meters read what Process reads, before it may overwrite it in place.
-    const bool measured = metersInProcess_;
+    const PeakRow* measured = measuredPeaks_;
     const bool pair = channelsPerBus_ >= 2;
     if (shape_.inputBuses > 0 && !measured) MeterChannels(kInputLeft, inputs[0], pair ? inputs[1] : nullptr, sampleCount);
     Process(inputs, outputs, sampleCount);
     // `outputs` are the plug-in's pointers; where the mode exchanged a pair, the host's left
     // channel is the plug-in's second. Restored outputs are no longer what Process measured.
-    const int32_t outputCount = OutputChannelCount();
+    const bool converted = chunkMode_ != KChannelMode::kLeftRight;
+    if (measured) TakeMeasuredPeaks(measured, !converted, sampleCount);
     const int32_t swapped = KChannelMode::SwapsOutputs(chunkMode_) ? 1 : 0;
-    for (int32_t c = 0; c + 1 < outputCount && chunkMode_ != KChannelMode::kLeftRight; c += 2)
-      KChannelMode::RestoreOutputs(chunkMode_, outputs[c + swapped], outputs[c + 1 - swapped], sampleCount);
-    if (shape_.outputBuses > 0 && (!measured || chunkMode_ != KChannelMode::kLeftRight))
+    if (converted)
+      for (int32_t c = 0; c + 1 < OutputChannelCount(); c += 2)
+        KChannelMode::RestoreOutputs(chunkMode_, outputs[c + swapped], outputs[c + 1 - swapped], sampleCount);
+    if (shape_.outputBuses > 0 && (!measured || converted))
       MeterChannels(kOutputLeft, outputs[swapped], pair ? outputs[1 - swapped] : nullptr, sampleCount);
     if (meterReset_.load(std::memory_order_relaxed))
       for (KLevelMeter& meter : meters_) meter.Reset();
   });
+}
+
+void KAudioPlugin::TakeMeasuredPeaks(const PeakRow* rows, bool outputs, int32_t sampleCount) noexcept {
+  const int32_t channels = std::min(channelsPerBus_, 2);
+  const bool input = shape_.inputBuses > 0, output = outputs && shape_.outputBuses > 0;
+  for (int32_t c = 0; c < channels; ++c) {
+    if (input) meters_[kInputLeft + c].AccumulatePeak(rows[c][0], sampleCount);
+    if (output) meters_[kOutputLeft + c].AccumulatePeak(rows[c][1], sampleCount);
+  }
 }
 
 void KAudioPlugin::MeterChannels(Meter first, const float* left, const float* right, int32_t sampleCount) noexcept {

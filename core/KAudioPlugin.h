@@ -272,19 +272,13 @@ protected:
   // their defaults are not stored, and loading from an element without them restores defaults.
   virtual void StorePluginSettings(Element& /*section*/, uint32_t /*flags*/) {}
   void SetOversampling(int32_t factor) noexcept { oversampling_.store(factor > 1 ? factor : 1, std::memory_order_relaxed); }
-  // For a plug-in whose own last pass reads its main inputs and writes its outputs anyway: on
-  // (from ProcessUpdate), the cycle reads no audio for the level meters and every Process
-  // reports the peaks of its channels instead, with MeterPeaks; off, the cycle meters itself.
-  void SetMetersInProcess(bool on) noexcept { metersInProcess_ = on; }
-  // From Process, for main channel `channel` (0 or 1): the largest magnitudes of its input and
-  // of its output over the sub-block's `sampleCount` samples, NaN samples left out. Outputs that
-  // the channel mode converts after Process are the cycle's to meter.
-  void MeterPeaks(int32_t channel, float input, float output, int32_t sampleCount) noexcept {
-    if (channel < 0 || channel >= channelsPerBus_ || channel > 1) return;
-    if (shape_.inputBuses > 0) meters_[kInputLeft + channel].AccumulatePeak(input, sampleCount);
-    if (shape_.outputBuses > 0 && chunkMode_ == KChannelMode::kLeftRight)
-      meters_[kOutputLeft + channel].AccumulatePeak(output, sampleCount);
-  }
+  // For a plug-in whose own last pass reads its main inputs and writes its outputs anyway (from
+  // ProcessUpdate): the rows where every Process leaves, for main channels 0 and 1, the largest
+  // magnitudes of its input and of its output over the sub-block, NaN samples left out. With
+  // them the cycle reads no audio for the level meters; null, it meters the audio itself.
+  // Outputs that the channel mode converts after Process are the cycle's to meter all the same.
+  using PeakRow = float[2];
+  void SetMeasuredPeaks(const PeakRow* rows) noexcept { measuredPeaks_ = rows; }
 
 private:
   struct ActivePreset {
@@ -319,6 +313,7 @@ private:
   void ProcessAudio(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
   // Feeds the meter pair from `first` with a channel pair, or its left meter with one channel.
   void MeterChannels(Meter first, const float* left, const float* right, int32_t sampleCount) noexcept;
+  void TakeMeasuredPeaks(const PeakRow* rows, bool outputs, int32_t sampleCount) noexcept;
 
   Shape shape_;
   KString identifier_;
@@ -346,7 +341,7 @@ private:
   int32_t chunkMode_ = 0;
   std::atomic<bool> bypass_{false};
   bool resumeFromBypass_ = false;  // audio thread
-  bool metersInProcess_ = false;   // audio thread
+  const PeakRow* measuredPeaks_ = nullptr;  // audio thread
 
   // State beyond the parameters, user-interface thread unless noted.
   KModule* module_ = nullptr;

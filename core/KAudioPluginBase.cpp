@@ -112,18 +112,17 @@ bool KAudioPluginBase::AddRamp(int32_t parameter, std::span<const RampPoint> poi
   return true;
 }
 
-void KAudioPluginBase::ResolveBlockEnd(int32_t blockLength) noexcept {
-  if (!rampsAdded_) return;
+void KAudioPluginBase::StretchToBlockEnd(int32_t blockLength) noexcept {
   for (ParameterRamp* ramp = active_.Head(); ramp; ramp = ramp->next)
     if (ramp->points[1].time == ParameterRamp::kBlockEnd) ramp->points[1].time = blockLength;
 }
 
-int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept {
+int32_t KAudioPluginBase::PrepareRamps(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept {
   int32_t limit = blockLength < subBlockCap ? blockLength : subBlockCap;
   grid_ = fineCap > 0 ? fineCap : 1;
   // Values must land at once: every ramp jumps to its end and retires. Modulation moves on from
   // here, as it would have from the start of the stream. Both pools belong to the audio thread,
-  // so this needs no lock; most blocks come here with no jump asked and make no locked write.
+  // so this needs no lock.
   if ((stateFlags_.load(std::memory_order_acquire) & kJump) != 0) {
     stateFlags_.fetch_and(~kJump, std::memory_order_acq_rel);
     for (ParameterRamp* ramp = active_.Head(); ramp;) {
@@ -152,16 +151,13 @@ int32_t KAudioPluginBase::InterpolationPrepare(int32_t blockLength, int32_t& sub
       subBlockCap = fineCap;
       if (fineCap < limit) limit = fineCap;
     }
-    remaining_ = limit < blockLength ? blockLength : 0;
     return limit;
   }
-  remaining_ = 0;
   rampsAdded_ = false;
   return limit;
 }
 
-int32_t KAudioPluginBase::InterpolationProcess(int32_t processedLength, int32_t remainingLength) noexcept {
-  position_ += processedLength;
+int32_t KAudioPluginBase::AdvanceRamps(int32_t processedLength, int32_t remainingLength) noexcept {
   int32_t limit = remainingLength;
   for (ParameterRamp* ramp = active_.Head(); ramp;) {
     ParameterRamp* next = ramp->next;
@@ -169,17 +165,15 @@ int32_t KAudioPluginBase::InterpolationProcess(int32_t processedLength, int32_t 
     if (!Settle(ramp)) limit = std::min(limit, NextBreak(*ramp));
     ramp = next;
   }
-  remaining_ -= processedLength;
   return limit;
 }
 
-void KAudioPluginBase::InterpolationFinish() noexcept {
+void KAudioPluginBase::SettleRamps() noexcept {
   for (ParameterRamp* ramp = active_.Head(); ramp;) {
     ParameterRamp* next = ramp->next;
     Settle(ramp);
     ramp = next;
   }
-  remaining_ = 0;
 }
 
 void KAudioPluginBase::ApplyOverflowValues() noexcept {
@@ -191,10 +185,10 @@ void KAudioPluginBase::ApplyOverflowValues() noexcept {
   }
 }
 
-void KAudioPluginBase::AcceptPostedRamps() noexcept {
+void KAudioPluginBase::TakePostedRamps() noexcept {
   if (overflowPending_.load(std::memory_order_relaxed) && overflowPending_.exchange(false, std::memory_order_acq_rel))
     ApplyOverflowValues();
-  // Most blocks find nothing posted and nothing to give back: they take no lock at all.
+  // With nothing posted and nothing to give back, no lock is taken.
   if (!rampsPosted_.load(std::memory_order_acquire) && postedReturns_.IsEmpty()) return;
   if (!rampMutex_.try_lock()) return;
   rampsPosted_.store(false, std::memory_order_relaxed);

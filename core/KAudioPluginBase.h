@@ -73,12 +73,29 @@ public:
   // With `modulation` the ramp moves the parameter's modulation offset (KModulator) instead of
   // its value, and replaces only a modulation ramp: automation and modulation run side by side.
   bool AddRamp(int32_t parameter, std::span<const RampPoint> points, bool fine, bool modulation = false) noexcept;
-  int32_t InterpolationPrepare(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept;
-  int32_t InterpolationProcess(int32_t processedLength, int32_t remainingLength) noexcept;
-  void InterpolationFinish() noexcept;
+  // Most blocks have no ramp, no jump and nothing posted: for them these calls are a few
+  // inline tests, and the list walks stay out of line.
+  int32_t InterpolationPrepare(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept {
+    if (!active_.IsEmpty() || (stateFlags_.load(std::memory_order_acquire) & kJump) != 0)
+      return PrepareRamps(blockLength, subBlockCap, fineCap);
+    grid_ = fineCap > 0 ? fineCap : 1;
+    rampsAdded_ = false;
+    return blockLength < subBlockCap ? blockLength : subBlockCap;
+  }
+  int32_t InterpolationProcess(int32_t processedLength, int32_t remainingLength) noexcept {
+    position_ += processedLength;
+    return active_.IsEmpty() ? remainingLength : AdvanceRamps(processedLength, remainingLength);
+  }
+  void InterpolationFinish() noexcept {
+    if (!active_.IsEmpty()) SettleRamps();
+  }
   // Takes over what other threads posted (try-lock: when the lock is busy, the ramps wait for
   // the next block). Called at every block start.
-  void AcceptPostedRamps() noexcept;
+  void AcceptPostedRamps() noexcept {
+    if (overflowPending_.load(std::memory_order_relaxed) || rampsPosted_.load(std::memory_order_acquire) ||
+        !postedReturns_.IsEmpty())
+      TakePostedRamps();
+  }
   int32_t ActiveRampCount() const noexcept { return active_.Count(); }
   int32_t SpareRampCount() const noexcept { return spare_.Count(); }
 
@@ -98,11 +115,12 @@ public:
   std::atomic<int32_t>& AutomationSending() noexcept { return automationSending_; }
 
 protected:
-  int32_t Remaining() const noexcept { return remaining_; }
   // Gives the ramps added since the last block that end "at the block end" the host block's
   // length. The processing cycle calls it before it takes a long block in pieces, so that such
   // a ramp spans the whole host block rather than its first piece.
-  void ResolveBlockEnd(int32_t blockLength) noexcept;
+  void ResolveBlockEnd(int32_t blockLength) noexcept {
+    if (rampsAdded_) StretchToBlockEnd(blockLength);
+  }
 
 private:
   void ApplyCurrent(ParameterRamp& ramp) noexcept;
@@ -115,6 +133,11 @@ private:
   int32_t NextBreak(const ParameterRamp& ramp) const noexcept;
   // Brings a ramp to the present position and applies its value; answers whether it retired.
   bool Settle(ParameterRamp* ramp) noexcept;
+  int32_t PrepareRamps(int32_t blockLength, int32_t& subBlockCap, int32_t fineCap) noexcept;
+  int32_t AdvanceRamps(int32_t processedLength, int32_t remainingLength) noexcept;
+  void SettleRamps() noexcept;
+  void TakePostedRamps() noexcept;
+  void StretchToBlockEnd(int32_t blockLength) noexcept;
   bool OnGrid() const noexcept { return position_ % grid_ == 0; }
   int32_t ToGrid() const noexcept { return grid_ - static_cast<int32_t>(position_ % grid_); }
 
@@ -125,7 +148,6 @@ private:
   KRampList active_;
   KRampList spare_;
   KRampList postedReturns_;  // retired posted records, given back at the next accept
-  int32_t remaining_ = 0;
   bool rampsAdded_ = false;
   int64_t position_ = 0;  // samples processed since the last jump
   int32_t grid_ = kDefaultFineSubBlockCap;
@@ -134,7 +156,8 @@ private:
   std::mutex rampMutex_;
   KRampList postedFree_;
   KRampList posted_;
-  std::atomic<bool> rampsPosted_{false};  // posted_ may hold records: set after a push  // Final values that found no free posted record, one slot per parameter.
+  std::atomic<bool> rampsPosted_{false};  // posted_ may hold records: set after a push
+  // Final values that found no free posted record, one slot per parameter.
   std::unique_ptr<std::atomic<double>[]> overflowValues_;
   std::atomic<bool> overflowPending_{false};
 

@@ -46,6 +46,8 @@ public:
   }
 
   // ---- audio thread
+  // No object in use and none on its way: the common case, answered without taking anything.
+  bool IsIdle() const noexcept { return !current_ && !pending_.load(std::memory_order_acquire); }
   // The object to use; `changed` tells whether it was taken over just now.
   T* Acquire(bool& changed) noexcept {
     changed = false;

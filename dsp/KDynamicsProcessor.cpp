@@ -117,6 +117,9 @@ void KDynamicsProcessor::Process(int32_t n, const float* const* in, float* const
       bands_.Process(pieceDetect_.data(), filteredRows_.data(), filtered, frames);
       std::copy_n(filteredRows_.begin(), filtered, pieceDetect_.begin());
     }
+    // Ahead of the detector, whose envelope runs sample after sample and leaves the processor
+    // room for independent work beside it.
+    if (measureInputs_) measureInputs_(pieceIn_.data(), std::min(channels, kMeasuredChannels), frames, peaks_);
     detector_(*this, channels, frames);
     Settle(linked_ ? 1 : channels);
   }
@@ -195,30 +198,37 @@ float StoreGains(const double* gains, float* stored, int32_t frames, float lowes
 float Larger(float magnitude, float peak) noexcept { return magnitude > peak ? magnitude : peak; }
 
 // out = gain · in, in double, two samples per instruction. kMeasure also keeps the largest
-// magnitudes of in and out in peaks[0] and peaks[1], from the same registers.
+// magnitude of out in `peak`.
 template <bool kMeasure>
-void ApplyGains(const double* gains, const float* in, float* out, int32_t frames, float* peaks) noexcept {
+void ApplyGains(const double* gains, const float* in, float* out, int32_t frames, float* peak) noexcept {
   const __m128 sign = _mm_set1_ps(-0.0f);
-  __m128 top = _mm_setr_ps(peaks[0], peaks[0], peaks[1], peaks[1]);  // input in the low lanes, output in the high
+  __m128 top = _mm_set1_ps(*peak);
   int32_t i = 0;
   for (; i + 2 <= frames; i += 2) {
-    const __m128 x = LoadTwo(in + i);
-    const __m128 y = _mm_cvtpd_ps(_mm_mul_pd(_mm_loadu_pd(gains + i), _mm_cvtps_pd(x)));
+    // The upper lanes of y are zero, below every magnitude's maximum.
+    const __m128 y = _mm_cvtpd_ps(_mm_mul_pd(_mm_loadu_pd(gains + i), _mm_cvtps_pd(LoadTwo(in + i))));
     _mm_storel_epi64(reinterpret_cast<__m128i*>(out + i), _mm_castps_si128(y));
-    if constexpr (kMeasure) top = _mm_max_ps(_mm_andnot_ps(sign, _mm_movelh_ps(x, y)), top);
+    if constexpr (kMeasure) top = _mm_max_ps(_mm_andnot_ps(sign, y), top);
   }
-  if constexpr (kMeasure) {
-    top = _mm_max_ps(top, _mm_shuffle_ps(top, top, _MM_SHUFFLE(2, 3, 0, 1)));
-    peaks[0] = _mm_cvtss_f32(top);
-    peaks[1] = _mm_cvtss_f32(_mm_movehl_ps(top, top));
-  }
+  if constexpr (kMeasure) *peak = _mm_cvtss_f32(_mm_max_ss(top, _mm_shuffle_ps(top, top, 1)));
   for (; i < frames; ++i) {
-    const float x = in[i];  // before the store: `out` may be `in`
-    out[i] = static_cast<float>(gains[i] * x);
-    if constexpr (kMeasure) {
-      peaks[0] = Larger(std::fabs(x), peaks[0]);
-      peaks[1] = Larger(std::fabs(out[i]), peaks[1]);
-    }
+    out[i] = static_cast<float>(gains[i] * in[i]);
+    if constexpr (kMeasure) *peak = Larger(std::fabs(out[i]), *peak);
+  }
+}
+
+// The largest magnitude of each measured input channel (the first kMeasuredChannels) into its
+// row's first entry, two samples per instruction.
+void MeasureInputs(const float* const* in, int32_t channels, int32_t frames, float (*peaks)[2]) noexcept {
+  const __m128 sign = _mm_set1_ps(-0.0f);
+  for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) {
+    const float* x = in[ch];
+    __m128 top = _mm_set1_ps(peaks[ch][0]);
+    int32_t i = 0;
+    for (; i + 2 <= frames; i += 2) top = _mm_max_ps(_mm_andnot_ps(sign, LoadTwo(x + i)), top);
+    float peak = _mm_cvtss_f32(_mm_max_ss(top, _mm_shuffle_ps(top, top, 1)));
+    for (; i < frames; ++i) peak = Larger(std::fabs(x[i]), peak);
+    peaks[ch][0] = peak;
   }
 }
 
@@ -264,44 +274,110 @@ void ApplyGains(const double* gains, const float* in, float* out, int32_t frames
   return y;
 }
 
-// Eight samples a turn. Measuring, the inputs are compared eight at a time as read, and the
-// outputs before they are rounded: rounding keeps their order, so the largest product rounds to
-// the largest output, and the comparisons stay off the unit that the conversions keep busy.
+// Eight samples a turn. Measuring, the outputs are compared before they are rounded: rounding
+// keeps their order, so the largest product rounds to the largest output, and the comparisons
+// stay off the unit that the conversions keep busy.
 template <bool kMeasure>
-[[gnu::target("avx")]] void ApplyGainsWide(const double* gains, const float* in, float* out, int32_t frames, float* peaks) noexcept {
-  const __m256 signs = _mm256_set1_ps(-0.0f);
+[[gnu::target("avx")]] void ApplyGainsWide(const double* gains, const float* in, float* out, int32_t frames, float* peak) noexcept {
   const __m256d sign = _mm256_set1_pd(-0.0);
-  __m256 read = _mm256_set1_ps(peaks[0]);
-  __m256d written = _mm256_set1_pd(peaks[1]), other = written;
+  __m256d written = _mm256_set1_pd(*peak), other = written;
   int32_t i = 0;
   for (; i + 8 <= frames; i += 8) {
-    const __m256 x = _mm256_loadu_ps(in + i);  // before the stores: `out` may be `in`
     const __m256d a = ApplyFour(gains + i, in + i, out + i), b = ApplyFour(gains + i + 4, in + i + 4, out + i + 4);
     if constexpr (kMeasure) {
-      read = _mm256_max_ps(_mm256_andnot_ps(signs, x), read);
       written = _mm256_max_pd(_mm256_andnot_pd(sign, a), written);
       other = _mm256_max_pd(_mm256_andnot_pd(sign, b), other);
     }
   }
   if (i + 4 <= frames) {
-    const __m128 x = _mm_loadu_ps(in + i);
     const __m256d a = ApplyFour(gains + i, in + i, out + i);
-    if constexpr (kMeasure) {
-      read = _mm256_max_ps(_mm256_andnot_ps(signs, _mm256_set_m128(x, x)), read);
-      written = _mm256_max_pd(_mm256_andnot_pd(sign, a), written);
-    }
+    if constexpr (kMeasure) written = _mm256_max_pd(_mm256_andnot_pd(sign, a), written);
     i += 4;
   }
   if constexpr (kMeasure) {
-    __m128 x = _mm_max_ps(_mm256_castps256_ps128(read), _mm256_extractf128_ps(read, 1));
-    x = _mm_max_ps(x, _mm_movehl_ps(x, x));
-    peaks[0] = _mm_cvtss_f32(_mm_max_ss(x, _mm_shuffle_ps(x, x, 1)));
     written = _mm256_max_pd(written, other);
     __m128d y = _mm_max_pd(_mm256_castpd256_pd128(written), _mm256_extractf128_pd(written, 1));
-    peaks[1] = static_cast<float>(_mm_cvtsd_f64(_mm_max_sd(y, _mm_unpackhi_pd(y, y))));
+    *peak = static_cast<float>(_mm_cvtsd_f64(_mm_max_sd(y, _mm_unpackhi_pd(y, y))));
   }
   _mm256_zeroupper();
-  if (i < frames) ApplyGains<kMeasure>(gains + i, in + i, out + i, frames - i, peaks);
+  if (i < frames) ApplyGains<kMeasure>(gains + i, in + i, out + i, frames - i, peak);
+}
+
+// The inputs' peaks eight samples at a time.
+[[gnu::target("avx")]] void MeasureInputsWide(const float* const* in, int32_t channels, int32_t frames,
+                                              float (*peaks)[2]) noexcept {
+  const __m256 signs = _mm256_set1_ps(-0.0f);
+  int32_t i = 0;
+  for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) {
+    const float* x = in[ch];
+    __m256 top = _mm256_set1_ps(peaks[ch][0]);
+    for (i = 0; i + 8 <= frames; i += 8) top = _mm256_max_ps(_mm256_andnot_ps(signs, _mm256_loadu_ps(x + i)), top);
+    __m128 folded = _mm_max_ps(_mm256_castps256_ps128(top), _mm256_extractf128_ps(top, 1));
+    folded = _mm_max_ps(folded, _mm_movehl_ps(folded, folded));
+    peaks[ch][0] = _mm_cvtss_f32(_mm_max_ss(folded, _mm_shuffle_ps(folded, folded, 1)));
+  }
+  _mm256_zeroupper();
+  if (i < frames) {
+    const float* rest[KDynamicsProcessor::kMeasuredChannels];
+    for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) rest[ch] = in[ch] + i;
+    MeasureInputs(rest, channels, frames - i, peaks);
+  }
+}
+
+// Eight samples of a channel, written with one store; answers them as written.
+[[gnu::target("avx"), gnu::always_inline]] inline __m256 ApplyEight(const double* gains, const float* in,
+                                                                     float* out) noexcept {
+  const __m128 low = _mm256_cvtpd_ps(_mm256_mul_pd(_mm256_loadu_pd(gains), _mm256_cvtps_pd(_mm_loadu_ps(in))));
+  const __m128 high = _mm256_cvtpd_ps(_mm256_mul_pd(_mm256_loadu_pd(gains + 4), _mm256_cvtps_pd(_mm_loadu_ps(in + 4))));
+  const __m256 y = _mm256_set_m128(high, low);
+  _mm256_storeu_ps(out, y);
+  return y;
+}
+
+// The larger of each lane of the two halves.
+[[gnu::target("avx"), gnu::always_inline]] inline __m128 FoldHalves(__m256 v) noexcept {
+  return _mm_max_ps(_mm256_castps256_ps128(v), _mm256_extractf128_ps(v, 1));
+}
+
+// Two channels with the same gains (a linked stereo pair), eight samples a turn. Measuring, the
+// outputs are compared as written, eight to a register, and both running peaks are reduced
+// together at the end: with blocks of a few dozen samples the reduction is a good part of the
+// measuring's cost.
+template <bool kMeasure>
+[[gnu::target("avx")]] void ApplyGainsPairWide(const double* gains, const float* const* in, float* const* out,
+                                               int32_t frames, float (*peaks)[2]) noexcept {
+  const __m256 signs = _mm256_set1_ps(-0.0f);
+  const float *left = in[0], *right = in[1];
+  float *leftOut = out[0], *rightOut = out[1];
+  __m256 wroteLeft = _mm256_set1_ps(peaks[0][1]), wroteRight = _mm256_set1_ps(peaks[1][1]);
+  int32_t i = 0;
+  for (; i + 8 <= frames; i += 8) {
+    // The right input is read before the left output is stored: an output may be its input.
+    const __m256 y = ApplyEight(gains + i, left + i, leftOut + i);
+    const __m256 w = ApplyEight(gains + i, right + i, rightOut + i);
+    if constexpr (kMeasure) {
+      wroteLeft = _mm256_max_ps(_mm256_andnot_ps(signs, y), wroteLeft);
+      wroteRight = _mm256_max_ps(_mm256_andnot_ps(signs, w), wroteRight);
+    }
+  }
+  if constexpr (kMeasure) {
+    // Lane by lane [left, right, left, right], then the two halves of that folded.
+    const __m128 a = FoldHalves(wroteLeft), b = FoldHalves(wroteRight);
+    const __m128 both = _mm_max_ps(_mm_unpacklo_ps(a, b), _mm_unpackhi_ps(a, b));
+    const __m128 peak = _mm_max_ps(both, _mm_movehl_ps(both, both));
+    peaks[0][1] = _mm_cvtss_f32(peak);
+    peaks[1][1] = _mm_cvtss_f32(_mm_shuffle_ps(peak, peak, 1));
+  }
+  _mm256_zeroupper();
+  if (i < frames)
+    for (size_t ch = 0; ch < 2; ++ch) ApplyGainsWide<kMeasure>(gains + i, in[ch] + i, out[ch] + i, frames - i, &peaks[ch][1]);
+}
+
+// Without AVX a pair is each channel in turn.
+template <bool kMeasure>
+void ApplyGainsPair(const double* gains, const float* const* in, float* const* out, int32_t frames,
+                    float (*peaks)[2]) noexcept {
+  for (size_t ch = 0; ch < 2; ++ch) ApplyGains<kMeasure>(gains, in[ch], out[ch], frames, &peaks[ch][1]);
 }
 
 bool HasAVX() noexcept {
@@ -320,8 +396,15 @@ KDynamicsProcessor::KDynamicsProcessor() noexcept {
 
 void KDynamicsProcessor::MeasurePeaks(bool on) noexcept {
   measuring_ = on;
-  if (HasAVX()) applyGains_ = on ? ApplyGainsWide<true> : ApplyGainsWide<false>;
-  else applyGains_ = on ? ApplyGains<true> : ApplyGains<false>;
+  if (HasAVX()) {
+    measureInputs_ = on ? MeasureInputsWide : nullptr;
+    applyGains_ = on ? ApplyGainsWide<true> : ApplyGainsWide<false>;
+    applyPair_ = on ? ApplyGainsPairWide<true> : ApplyGainsPairWide<false>;
+  } else {
+    measureInputs_ = on ? MeasureInputs : nullptr;
+    applyGains_ = on ? ApplyGains<true> : ApplyGains<false>;
+    applyPair_ = on ? ApplyGainsPair<true> : ApplyGainsPair<false>;
+  }
 }
 
 // One detector fed by the mean square of all channels; every channel gets its gain. The work
@@ -335,8 +418,12 @@ void KDynamicsProcessor::DetectLinked(KDynamicsProcessor& self, int32_t channels
            self.e_[0]);
   self.curve_.Gains(work, work, frames);
   self.lowestGain_ = self.storeGains_(work, self.gains_.data(), frames, self.lowestGain_);
+  if (channels == 2) {
+    self.applyPair_(work, self.pieceIn_.data(), self.pieceOut_.data(), frames, self.peaks_);
+    return;
+  }
   for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch)
-    self.applyGains_(work, self.pieceIn_[ch], self.pieceOut_[ch], frames, self.PeaksOf(ch));
+    self.applyGains_(work, self.pieceIn_[ch], self.pieceOut_[ch], frames, &self.PeaksOf(ch)[1]);
 }
 
 // A detector, an envelope row and a gain row per channel.
@@ -349,7 +436,7 @@ void KDynamicsProcessor::DetectUnlinked(KDynamicsProcessor& self, int32_t channe
              self.p_[ch], self.e_[ch]);
     self.curve_.Gains(work, work, frames);
     self.lowestGain_ = self.storeGains_(work, self.gains_.data() + row, frames, self.lowestGain_);
-    self.applyGains_(work, self.pieceIn_[ch], self.pieceOut_[ch], frames, self.PeaksOf(ch));
+    self.applyGains_(work, self.pieceIn_[ch], self.pieceOut_[ch], frames, &self.PeaksOf(ch)[1]);
   }
 }
 

@@ -103,6 +103,8 @@ public:
   static constexpr int32_t kMeasuredChannels = 2;
   float InputPeak(int32_t channel) const noexcept { return peaks_[channel][0]; }
   float OutputPeak(int32_t channel) const noexcept { return peaks_[channel][1]; }
+  // Both, row by row: [channel][0] the input, [channel][1] the output.
+  const float (*Peaks() const noexcept)[2] { return peaks_; }
 
 private:
   using Detector = void (*)(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
@@ -111,9 +113,14 @@ private:
   using SquareSumPass = void (*)(const float* const* x, int32_t channels, int32_t from, int32_t frames, double gIn,
                                  double share, double* sums) noexcept;
   using StoreGainsPass = float (*)(const double* gains, float* stored, int32_t frames, float lowest) noexcept;
-  // `peaks` holds the input's and the output's largest magnitudes so far; a variant that does
-  // not measure leaves them alone.
-  using ApplyGainsPass = void (*)(const double* gains, const float* in, float* out, int32_t frames, float* peaks) noexcept;
+  // `peak` holds the output's largest magnitude so far; a variant that does not measure leaves
+  // it alone.
+  using ApplyGainsPass = void (*)(const double* gains, const float* in, float* out, int32_t frames, float* peak) noexcept;
+  // The same for a linked pair of channels, into the second entry of each channel's row.
+  using ApplyPairPass = void (*)(const double* gains, const float* const* in, float* const* out, int32_t frames,
+                                 float (*peaks)[2]) noexcept;
+  // The inputs' largest magnitudes, into the first entry of each channel's row.
+  using MeasureInputsPass = void (*)(const float* const* in, int32_t channels, int32_t frames, float (*peaks)[2]) noexcept;
 
   static void DetectLinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
   static void DetectUnlinked(KDynamicsProcessor& self, int32_t channels, int32_t frames) noexcept;
@@ -134,6 +141,8 @@ private:
   SquareSumPass squareSum_;
   StoreGainsPass storeGains_;
   ApplyGainsPass applyGains_;
+  ApplyPairPass applyPair_;
+  MeasureInputsPass measureInputs_ = nullptr;
   bool measuring_ = false;
   bool idle_ = false;
   bool linked_ = true;

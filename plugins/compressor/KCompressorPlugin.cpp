@@ -177,7 +177,7 @@ void KCompressorPlugin::ProcessUpdate() {
   // Compressing, the engine's last pass writes each output from its input: it meters both on
   // the way, and the cycle need not read them again.
   engine_.MeasurePeaks(!audition);
-  SetMetersInProcess(!audition);
+  SetMeasuredPeaks(audition ? nullptr : engine_.Peaks());
 }
 
 void KCompressorPlugin::ResetState() {
@@ -195,8 +195,6 @@ void KCompressorPlugin::Process(const float* const* inputs, float* const* output
 void KCompressorPlugin::Compress(const float* const* inputs, float* const* outputs, int32_t n) noexcept {
   const int32_t channels = ChannelsPerBus();
   engine_.Process(n, inputs, outputs, inputs + channels, channels);
-  for (int32_t c = 0; c < std::min(channels, KDynamicsProcessor::kMeasuredChannels); ++c)
-    MeterPeaks(c, engine_.InputPeak(c), engine_.OutputPeak(c), n);
 }
 
 // The output carries what the detector hears (its source after the band limits and the input

@@ -155,39 +155,46 @@ TEST(DynamicsProcessor, LowestGainIsTheLeastOfTheGainRows) {
 
 // Measuring, every path meters channels 0 and 1 as it writes them: the largest magnitude of the
 // input and of the output over the whole call (all pieces, a NaN left out), in place or not; the
-// output is the same as without measuring.
+// output is the same as without measuring. A linked stereo pair takes a path of its own.
 TEST(DynamicsProcessor, MeasuredPeaksAreTheLargestMagnitudesOfEachChannelsInputAndOutput) {
   const auto peak = [](const std::vector<float>& row) {
     float top = 0.0f;
     for (float v : row) top = std::fabs(v) > top ? std::fabs(v) : top;
     return top;
   };
-  for (int32_t variant = 0; variant < 6; ++variant) {
-    KDynamicsSettings s;
-    s.linkChannels = variant % 2 == 0, s.threshold = 0.2, s.ratio = variant < 4 ? 6.0 : 1.0, s.sampleRate = kRate;
-    s.attack = 1.0;  // slow, so that the loud samples below come out loudest too
-    Engine measuring(s, 3, 256), plain(s, 3, 256);  // 999 frames: three whole pieces and an odd end
-    measuring.MeasurePeaks(true);
-    Channels x = Noise(3, 999, 8 + variant);
-    x[0][993] = -8.0f;                         // the loudest sample in the last four-sample step
-    x[1][998] = variant < 2 ? 1.5f : -1.25f;  // and at the scalar end
-    if (variant == 2) x[0][17] = NAN;
-    const Channels y = measuring.Run(x), expected = plain.Run(x);
-    for (size_t c = 0; c < 3; ++c)
-      for (size_t i = 0; i < 999; ++i) ASSERT_TRUE(y[c][i] == expected[c][i] || (std::isnan(y[c][i]) && std::isnan(expected[c][i]))) << variant;
-    for (int32_t c = 0; c < KDynamicsProcessor::kMeasuredChannels; ++c) {
-      EXPECT_EQ(measuring.InputPeak(c), peak(x[size_t(c)])) << variant << " " << c;
-      EXPECT_EQ(measuring.OutputPeak(c), peak(y[size_t(c)])) << variant << " " << c;
-    }
-    EXPECT_EQ(measuring.InputPeak(1), variant < 2 ? 1.5f : 1.25f);
-    EXPECT_EQ(measuring.OutputPeak(0), std::fabs(y[0][993]));
-    if (variant == 3) {  // in place: the input is read before its sample is overwritten
-      Channels z = Noise(3, 999, 20);
-      const float inputPeak = peak(z[0]);
-      std::vector<float*> rows = {z[0].data(), z[1].data(), z[2].data()};
-      measuring.Process(999, rows.data(), rows.data(), nullptr, 3);
-      EXPECT_EQ(measuring.InputPeak(0), inputPeak);
-      EXPECT_EQ(measuring.OutputPeak(0), peak(z[0]));
+  for (const int32_t channels : {2, 3}) {
+    const auto rowCount = static_cast<size_t>(channels);
+    for (int32_t variant = 0; variant < 6; ++variant) {
+      KDynamicsSettings s;
+      s.linkChannels = variant % 2 == 0, s.threshold = 0.2, s.ratio = variant < 4 ? 6.0 : 1.0, s.sampleRate = kRate;
+      s.attack = 1.0;  // slow, so that the loud samples below come out loudest too
+      Engine measuring(s, channels, 256), plain(s, channels, 256);  // 999 frames: three whole pieces and an odd end
+      measuring.MeasurePeaks(true);
+      Channels x = Noise(channels, 999, 8 + variant);
+      x[0][993] = -8.0f;                         // the loudest sample in the last four-sample step
+      x[1][998] = variant < 2 ? 1.5f : -1.25f;  // and at the scalar end
+      if (variant == 2) x[0][17] = NAN;
+      const Channels y = measuring.Run(x), expected = plain.Run(x);
+      for (size_t c = 0; c < rowCount; ++c)
+        for (size_t i = 0; i < 999; ++i)
+          ASSERT_TRUE(y[c][i] == expected[c][i] || (std::isnan(y[c][i]) && std::isnan(expected[c][i]))) << variant;
+      for (int32_t c = 0; c < KDynamicsProcessor::kMeasuredChannels; ++c) {
+        EXPECT_EQ(measuring.InputPeak(c), peak(x[size_t(c)])) << channels << " " << variant << " " << c;
+        EXPECT_EQ(measuring.OutputPeak(c), peak(y[size_t(c)])) << channels << " " << variant << " " << c;
+      }
+      EXPECT_EQ(measuring.InputPeak(1), variant < 2 ? 1.5f : 1.25f);
+      EXPECT_EQ(measuring.OutputPeak(0), std::fabs(y[0][993]));
+      if (variant % 2 == 0) {  // in place: each input is read before its sample is overwritten
+        Channels z = Noise(channels, 999, 20);
+        const float inputPeaks[2] = {peak(z[0]), peak(z[1])};
+        std::vector<float*> rows;
+        for (std::vector<float>& row : z) rows.push_back(row.data());
+        measuring.Process(999, rows.data(), rows.data(), nullptr, channels);
+        for (int32_t c = 0; c < KDynamicsProcessor::kMeasuredChannels; ++c) {
+          EXPECT_EQ(measuring.InputPeak(c), inputPeaks[c]) << channels << " " << variant << " " << c;
+          EXPECT_EQ(measuring.OutputPeak(c), peak(z[size_t(c)])) << channels << " " << variant << " " << c;
+        }
+      }
     }
   }
 }

@@ -23,6 +23,15 @@ alignas(16) const float kSilence[KAudioPlugin::kMaxChunk] = {};
 int32_t ChunkLengthFor(int32_t inputCount, int32_t scratch) noexcept {
   return inputCount <= 2 ? KAudioPlugin::kMaxChunk : scratch / inputCount / 4 * 4;
 }
+
+// Whether a host's array of channel buffers is there and holds every buffer.
+template <class Sample>
+bool AllPresent(Sample* const* buffers, int32_t count) noexcept {
+  if (!buffers) return false;
+  for (int32_t c = 0; c < count; ++c)
+    if (!buffers[c]) return false;
+  return true;
+}
 }  // namespace
 
 KAudioPlugin::KAudioPlugin(std::span<const KParameterInfo> parameters, const Shape& shape)
@@ -99,9 +108,7 @@ void KAudioPlugin::ProcessHostBlock(const float* const* inputs, float* const* ou
   }
   sinceStamp_ += std::clamp(sampleCount, 1, kStampSamples);
   AcceptPostedRamps();
-  const int32_t outputCount = OutputChannelCount();
-  bool hasOutputs = outputs != nullptr;
-  for (int32_t c = 0; hasOutputs && c < outputCount; ++c) hasOutputs = outputs[c] != nullptr;
+  const bool hasOutputs = AllPresent(outputs, OutputChannelCount());
   // A host that hands no buffer (or no samples) gets nothing written.
   if (hasOutputs && sampleCount > 0 && IsBypassed()) {
     PassThrough(inputs, outputs, sampleCount);
@@ -110,8 +117,9 @@ void KAudioPlugin::ProcessHostBlock(const float* const* inputs, float* const* ou
     // Ramps waited while the plug-in rested: their values land at once rather than late.
     if (std::exchange(resumeFromBypass_, false)) RequestJump();
     ResolveBlockEnd(sampleCount);
+    const bool allInputs = AllPresent(inputs, InputChannelCount());
     for (int32_t start = 0; start < sampleCount; start += chunkLength_)
-      ProcessChunk(inputs, outputs, start, std::min(chunkLength_, sampleCount - start));
+      ProcessChunk(inputs, outputs, start, std::min(chunkLength_, sampleCount - start), allInputs);
   }
   // Every message of the block arrives within it, even when there was no audio to cut or it is
   // stamped past the block's end (a host's mistake): no note hangs, none is carried over.
@@ -139,24 +147,9 @@ void KAudioPlugin::ProcessMIDIController(const KMIDIEvent& event) {
   });
 }
 
-void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* outputs, int32_t start, int32_t length) noexcept {
-  const int32_t inputCount = InputChannelCount();
-  const int32_t outputCount = OutputChannelCount();
-  const float* in[kMaxChannels];
-  float* out[kMaxChannels];
-  for (int32_t c = 0; c < inputCount; ++c) in[c] = inputs && inputs[c] ? inputs[c] + start : kSilence;
-  for (int32_t c = 0; c < outputCount; ++c) out[c] = outputs[c] + start;
-
-  // The channel mode acts on every channel pair alike and works on copies: the host's buffers
-  // are never written.
+void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* outputs, int32_t start, int32_t length,
+                                bool allInputs) noexcept {
   const int32_t mode = chunkMode_ = channelsPerBus_ == 2 ? ChannelMode() : KChannelMode::kLeftRight;
-  alignas(16) float scratch[kScratchSamples];
-  const int32_t stride = chunkLength_;
-  for (int32_t c = 0; c + 1 < inputCount && mode != KChannelMode::kLeftRight; c += 2)
-    KChannelMode::RouteInputs(mode, in[c], in[c + 1], scratch + c * stride, scratch + (c + 1) * stride, length);
-  if (KChannelMode::SwapsOutputs(mode))
-    for (int32_t c = 0; c + 1 < outputCount; c += 2) std::swap(out[c], out[c + 1]);
-
   pieceStart_ = start;
   if (!modulator_.IsIdle()) Modulate(length);
   int32_t cap = subBlockCap_;
@@ -167,25 +160,55 @@ void KAudioPlugin::ProcessChunk(const float* const* inputs, float* const* output
   int32_t stamp;
   if (shape_.splitsAtEvents && midi_.NextTimeStamp(stamp) && stamp - start < next) next = std::max(1, stamp - start);
 
+  // Most blocks are one piece that needs neither offsets, nor silence for a missing input, nor
+  // the channel mode's copies: the host's own arrays serve.
+  if (next >= length && start == 0 && allInputs && mode == KChannelMode::kLeftRight) {
+    ProcessAudio(inputs, outputs, length);
+    InterpolationProcess(length, 0);
+  } else {
+    ProcessPieces(inputs, outputs, start, length, next, cap);
+  }
+  InterpolationFinish();
+}
+
+void KAudioPlugin::ProcessPieces(const float* const* inputs, float* const* outputs, int32_t start, int32_t length,
+                                 int32_t next, int32_t cap) noexcept {
+  const int32_t inputCount = InputChannelCount();
+  const int32_t outputCount = OutputChannelCount();
+  const float* in[kMaxChannels];
+  float* out[kMaxChannels];
+  for (int32_t c = 0; c < inputCount; ++c) in[c] = inputs && inputs[c] ? inputs[c] + start : kSilence;
+  for (int32_t c = 0; c < outputCount; ++c) out[c] = outputs[c] + start;
+
+  // The channel mode acts on every channel pair alike and works on copies: the host's buffers
+  // are never written.
+  const int32_t mode = chunkMode_;
+  alignas(16) float scratch[kScratchSamples];
+  const int32_t stride = chunkLength_;
+  for (int32_t c = 0; c + 1 < inputCount && mode != KChannelMode::kLeftRight; c += 2)
+    KChannelMode::RouteInputs(mode, in[c], in[c + 1], scratch + c * stride, scratch + (c + 1) * stride, length);
+  if (KChannelMode::SwapsOutputs(mode))
+    for (int32_t c = 0; c + 1 < outputCount; c += 2) std::swap(out[c], out[c + 1]);
+
   if (next >= length) {
     ProcessAudio(in, out, length);
     InterpolationProcess(length, 0);
-  } else {
-    for (int32_t done = 0; done < length;) {
-      int32_t piece = std::max(1, std::min({next, cap, length - done}));
-      if (shape_.splitsAtEvents) {
-        ProcessMIDIQueue(midi_, start + done + 1);
-        if (midi_.NextTimeStamp(stamp) && stamp - start - done < piece) piece = std::max(1, stamp - start - done);
-      }
-      pieceStart_ = start + done;
-      ProcessAudio(in, out, piece);
-      next = InterpolationProcess(piece, length - done - piece);
-      done += piece;
-      for (int32_t c = 0; c < inputCount; ++c) in[c] += piece;
-      for (int32_t c = 0; c < outputCount; ++c) out[c] += piece;
-    }
+    return;
   }
-  InterpolationFinish();
+  for (int32_t done = 0; done < length;) {
+    int32_t piece = std::max(1, std::min({next, cap, length - done}));
+    if (shape_.splitsAtEvents) {
+      int32_t stamp;
+      ProcessMIDIQueue(midi_, start + done + 1);
+      if (midi_.NextTimeStamp(stamp) && stamp - start - done < piece) piece = std::max(1, stamp - start - done);
+    }
+    pieceStart_ = start + done;
+    ProcessAudio(in, out, piece);
+    next = InterpolationProcess(piece, length - done - piece);
+    done += piece;
+    for (int32_t c = 0; c < inputCount; ++c) in[c] += piece;
+    for (int32_t c = 0; c < outputCount; ++c) out[c] += piece;
+  }
 }
 
 void KAudioPlugin::Modulate(int32_t length) noexcept {

@@ -309,7 +309,12 @@ private:
 
   // Samples of the channel mode's input copies, which live on the stack of the processing call.
   static constexpr int32_t kScratchSamples = 2 * kMaxChunk;
-  void ProcessChunk(const float* const* inputs, float* const* outputs, int32_t start, int32_t length) noexcept;
+  // `allInputs`: the host handed every input buffer.
+  void ProcessChunk(const float* const* inputs, float* const* outputs, int32_t start, int32_t length, bool allInputs) noexcept;
+  // The chunk on copies of the host's arrays, cut into pieces at `next` and then at the ramps'
+  // and events' break points, at most `cap` long.
+  void ProcessPieces(const float* const* inputs, float* const* outputs, int32_t start, int32_t length, int32_t next,
+                     int32_t cap) noexcept;
   void ProcessAudio(const float* const* inputs, float* const* outputs, int32_t sampleCount) noexcept;
   // Feeds the meter pair from `first` with a channel pair, or its left meter with one channel.
   void MeterChannels(Meter first, const float* left, const float* right, int32_t sampleCount) noexcept;

@@ -303,27 +303,6 @@ template <bool kMeasure>
   if (i < frames) ApplyGains<kMeasure>(gains + i, in + i, out + i, frames - i, peak);
 }
 
-// The inputs' peaks eight samples at a time.
-[[gnu::target("avx")]] void MeasureInputsWide(const float* const* in, int32_t channels, int32_t frames,
-                                              float (*peaks)[2]) noexcept {
-  const __m256 signs = _mm256_set1_ps(-0.0f);
-  int32_t i = 0;
-  for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) {
-    const float* x = in[ch];
-    __m256 top = _mm256_set1_ps(peaks[ch][0]);
-    for (i = 0; i + 8 <= frames; i += 8) top = _mm256_max_ps(_mm256_andnot_ps(signs, _mm256_loadu_ps(x + i)), top);
-    __m128 folded = _mm_max_ps(_mm256_castps256_ps128(top), _mm256_extractf128_ps(top, 1));
-    folded = _mm_max_ps(folded, _mm_movehl_ps(folded, folded));
-    peaks[ch][0] = _mm_cvtss_f32(_mm_max_ss(folded, _mm_shuffle_ps(folded, folded, 1)));
-  }
-  _mm256_zeroupper();
-  if (i < frames) {
-    const float* rest[KDynamicsProcessor::kMeasuredChannels];
-    for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) rest[ch] = in[ch] + i;
-    MeasureInputs(rest, channels, frames - i, peaks);
-  }
-}
-
 // Eight samples of a channel, written with one store; answers them as written.
 [[gnu::target("avx"), gnu::always_inline]] inline __m256 ApplyEight(const double* gains, const float* in,
                                                                      float* out) noexcept {
@@ -337,6 +316,37 @@ template <bool kMeasure>
 // The larger of each lane of the two halves.
 [[gnu::target("avx"), gnu::always_inline]] inline __m128 FoldHalves(__m256 v) noexcept {
   return _mm_max_ps(_mm256_castps256_ps128(v), _mm256_extractf128_ps(v, 1));
+}
+
+// The largest lane of each of two running peaks, folded together: lane by lane [first, second,
+// first, second], then the two halves of that.
+[[gnu::target("avx"), gnu::always_inline]] inline void FoldPair(__m256 first, __m256 second, float& a, float& b) noexcept {
+  const __m128 x = FoldHalves(first), y = FoldHalves(second);
+  const __m128 both = _mm_max_ps(_mm_unpacklo_ps(x, y), _mm_unpackhi_ps(x, y));
+  const __m128 peak = _mm_max_ps(both, _mm_movehl_ps(both, both));
+  a = _mm_cvtss_f32(peak);
+  b = _mm_cvtss_f32(_mm_shuffle_ps(peak, peak, 1));
+}
+
+// The inputs' peaks eight samples at a time, both channels in one loop (a single channel is read
+// as both), reduced together: at short blocks the reductions cost as much as the loop.
+[[gnu::target("avx")]] void MeasureInputsWide(const float* const* in, int32_t channels, int32_t frames,
+                                              float (*peaks)[2]) noexcept {
+  const __m256 signs = _mm256_set1_ps(-0.0f);
+  const float *first = in[0], *second = in[channels - 1];
+  __m256 a = _mm256_set1_ps(peaks[0][0]), b = _mm256_set1_ps(peaks[channels - 1][0]);
+  int32_t i = 0;
+  for (; i + 8 <= frames; i += 8) {
+    a = _mm256_max_ps(_mm256_andnot_ps(signs, _mm256_loadu_ps(first + i)), a);
+    b = _mm256_max_ps(_mm256_andnot_ps(signs, _mm256_loadu_ps(second + i)), b);
+  }
+  FoldPair(a, b, peaks[0][0], peaks[channels - 1][0]);
+  _mm256_zeroupper();
+  if (i < frames) {
+    const float* rest[KDynamicsProcessor::kMeasuredChannels];
+    for (size_t ch = 0; ch < static_cast<size_t>(channels); ++ch) rest[ch] = in[ch] + i;
+    MeasureInputs(rest, channels, frames - i, peaks);
+  }
 }
 
 // Two channels with the same gains (a linked stereo pair), eight samples a turn. Measuring, the
@@ -360,14 +370,7 @@ template <bool kMeasure>
       wroteRight = _mm256_max_ps(_mm256_andnot_ps(signs, w), wroteRight);
     }
   }
-  if constexpr (kMeasure) {
-    // Lane by lane [left, right, left, right], then the two halves of that folded.
-    const __m128 a = FoldHalves(wroteLeft), b = FoldHalves(wroteRight);
-    const __m128 both = _mm_max_ps(_mm_unpacklo_ps(a, b), _mm_unpackhi_ps(a, b));
-    const __m128 peak = _mm_max_ps(both, _mm_movehl_ps(both, both));
-    peaks[0][1] = _mm_cvtss_f32(peak);
-    peaks[1][1] = _mm_cvtss_f32(_mm_shuffle_ps(peak, peak, 1));
-  }
+  if constexpr (kMeasure) FoldPair(wroteLeft, wroteRight, peaks[0][1], peaks[1][1]);
   _mm256_zeroupper();
   if (i < frames)
     for (size_t ch = 0; ch < 2; ++ch) ApplyGainsWide<kMeasure>(gains + i, in[ch] + i, out[ch] + i, frames - i, &peaks[ch][1]);

@@ -19,7 +19,7 @@ public:
   }
   // A peak magnitude that the processing found over n samples as it went (never NaN), taken as
   // Accumulate would take the samples themselves.
-  void AccumulatePeak(float peak, int32_t n) noexcept { Take(Larger(peak, Level()), n); }
+  void AccumulatePeak(float peak, int32_t n) noexcept { Take(peak > Level() ? peak : Level(), n); }
   void Reset() noexcept {
     if (count_ < limit_) hold_ = false;
     level_.store(resetValue_, std::memory_order_relaxed);
@@ -39,12 +39,10 @@ public:
   static void PeakPair(const float* l, const float* r, int32_t n, float (&peaks)[2]) noexcept;
 
 private:
-  // Without branches: whether a block's peak tops the level depends on the audio.
-  static float Larger(float a, float b) noexcept { return a > b ? a : b; }
   void Take(float peak, int32_t n) noexcept {
     level_.store(peak, std::memory_order_relaxed);
     // A reader's take between this load and store is lost, and it sees this peak once more.
-    unread_.store(Larger(peak, unread_.load(std::memory_order_relaxed)), std::memory_order_relaxed);
+    if (peak > unread_.load(std::memory_order_relaxed)) unread_.store(peak, std::memory_order_relaxed);
     count_ += n;
     hold_ = true;
   }

@@ -6,6 +6,7 @@
 #include "kernel/KPluginRegistry.h"
 
 struct KPluginHelp;
+struct KEditorDescription;
 
 // Everything hosts and the catalogue know of one plug-in, kept beside its class as data. The
 // identifiers host formats save projects under are derived from `identity` and `vst2Id` by the
@@ -23,6 +24,8 @@ struct KPluginDescription {
   const char* vst2Id = nullptr;             // four printable ASCII characters, unique in the catalogue
   const char* identity = nullptr;           // the key at first release; stays when the key is renamed
   const KPluginHelp& (*help)() = nullptr;   // what the plug-in and each parameter are for (plugins/KPluginHelp.h)
+  KEditorDescription (*editor)() = nullptr;  // its editor's sections and graph (ui/editor/KEditorDescription.h);
+                                             // null: every parameter in one generated section
   std::span<const KFactoryPreset> presets = {};  // the sounds it ships with, in the order offered
   const char* vendor = kVendor;
   const char* version = TORVANE_VERSION;

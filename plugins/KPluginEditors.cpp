@@ -13,39 +13,6 @@
 
 namespace {
 
-struct EditorEntry {
-  const char* plugin;
-  KEditorDescription (*describe)();
-};
-constexpr EditorEntry kEditors[] = {
-    {"KUtilityPlugin", &KUtilityEditor},
-    {"KCompressorPlugin", &KCompressorEditor},
-    {"KEqualizerPlugin", &KEqualizerEditor},
-    {"KSampleWarmer", &KSampleWarmerEditor},
-    {"KLimiterPlugin", &KLimiterEditor},
-    {"KGatePlugin", &KGateEditor},
-    {"KBitCrusherPlugin", &KBitCrusherEditor},
-    {"KTransientShaperPlugin", &KTransientShaperEditor},
-    {"KMultibandCompressorPlugin", &KMultibandCompressorEditor},
-    {"KDynamicEqualizerPlugin", &KDynamicEqualizerEditor},
-    {"KWaveshaperPlugin", &KWaveshaperEditor},
-    {"KEffectPipeline", &KEffectPipelineEditor},
-    {"KDelayPlugin", &KDelayEditor},
-    {"KReverbPlugin", &KReverbEditor},
-    {"KChorusPlugin", &KChorusEditor},
-    {"KFlangerPlugin", &KFlangerEditor},
-    {"KPhaserPlugin", &KPhaserEditor},
-    {"KTremoloPlugin", &KTremoloEditor},
-    {"KAutoPanPlugin", &KAutoPanEditor},
-    {"KAutoFilterPlugin", &KAutoFilterEditor},
-    {"KConvolutionReverbPlugin", &KConvolutionReverbEditor},
-    {"KLoudnessMeterPlugin", &KLoudnessMeterEditor},
-    {"KSpectrumAnalyserPlugin", &KSpectrumAnalyserEditor},
-    {"KMidSidePlugin", &KMidSideEditor},
-    {"KStereoImagerPlugin", &KStereoImagerEditor},
-    {"KToneGeneratorPlugin", &KToneGeneratorEditor},
-};
-
 // The host layer makes editors through the factory, which sees no plug-in: this maker is it.
 [[maybe_unused]] const bool gRegistered = (KSetEditorMaker(&KMakePluginEditor), true);
 
@@ -71,10 +38,8 @@ KString KPluginEditorHelp(KAudioPlugin& plugin, const KString& key) {
 }
 
 std::unique_ptr<KEditor> KMakePluginEditor(KAudioPlugin& plugin, KEditorHost* host, KStyle style) {
-  KEditorDescription description;
-  const std::string key = plugin.Identifier().ToUtf8();
-  for (const EditorEntry& entry : kEditors)
-    if (key == entry.plugin) description = entry.describe();
+  const KPluginDescription* plugged = KFindDescription(KProductCatalogue(), plugin.Identifier().ToUtf8());
+  KEditorDescription description = plugged && plugged->editor ? plugged->editor() : KEditorDescription{};
   if (!description.help) description.help = &KPluginEditorHelp;
   return std::make_unique<KEditor>(plugin, TitleOf(plugin), description, host, std::move(style));
 }

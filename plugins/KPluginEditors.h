@@ -32,30 +32,3 @@ KEditorDescription::GraphFactory KLFOGraph(KCycleGraph::Axes axes, KLFOMeaning m
 // The axes of a frequency swept by an LFO, as log2 of hertz over the audible range.
 KCycleGraph::Axes KFrequencyCycleAxes();
 
-// Each plug-in's own editor description.
-KEditorDescription KUtilityEditor();
-KEditorDescription KCompressorEditor();
-KEditorDescription KEqualizerEditor();
-KEditorDescription KSampleWarmerEditor();
-KEditorDescription KLimiterEditor();
-KEditorDescription KGateEditor();
-KEditorDescription KBitCrusherEditor();
-KEditorDescription KTransientShaperEditor();
-KEditorDescription KMultibandCompressorEditor();
-KEditorDescription KDynamicEqualizerEditor();
-KEditorDescription KWaveshaperEditor();
-KEditorDescription KEffectPipelineEditor();
-KEditorDescription KDelayEditor();
-KEditorDescription KReverbEditor();
-KEditorDescription KChorusEditor();
-KEditorDescription KFlangerEditor();
-KEditorDescription KPhaserEditor();
-KEditorDescription KTremoloEditor();
-KEditorDescription KAutoPanEditor();
-KEditorDescription KAutoFilterEditor();
-KEditorDescription KConvolutionReverbEditor();
-KEditorDescription KLoudnessMeterEditor();
-KEditorDescription KSpectrumAnalyserEditor();
-KEditorDescription KMidSideEditor();
-KEditorDescription KStereoImagerEditor();
-KEditorDescription KToneGeneratorEditor();

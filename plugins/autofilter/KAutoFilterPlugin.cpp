@@ -26,6 +26,7 @@ constinit const KPluginDescription kAutoFilterDescription{
     .vst2Id = "TvAF",
     .identity = "KAutoFilterPlugin",
     .help = &KAutoFilterHelp,
+    .editor = &KAutoFilterEditor,
     .presets = kPresets,
 };
 

@@ -71,3 +71,4 @@ private:
 
 extern const KPluginDescription kAutoFilterDescription;
 const KPluginHelp& KAutoFilterHelp();
+KEditorDescription KAutoFilterEditor();

@@ -25,6 +25,7 @@ constinit const KPluginDescription kAutoPanDescription{
     .vst2Id = "TvAP",
     .identity = "KAutoPanPlugin",
     .help = &KAutoPanHelp,
+    .editor = &KAutoPanEditor,
     .presets = kPresets,
 };
 

@@ -34,3 +34,4 @@ protected:
 
 extern const KPluginDescription kAutoPanDescription;
 const KPluginHelp& KAutoPanHelp();
+KEditorDescription KAutoPanEditor();

@@ -26,6 +26,7 @@ constinit const KPluginDescription kBitCrusherDescription{
     .vst2Id = "TvBC",
     .identity = "KBitCrusherPlugin",
     .help = &KBitCrusherHelp,
+    .editor = &KBitCrusherEditor,
     .presets = kPresets,
 };
 

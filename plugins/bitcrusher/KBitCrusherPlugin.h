@@ -64,3 +64,4 @@ private:
 
 extern const KPluginDescription kBitCrusherDescription;
 const KPluginHelp& KBitCrusherHelp();
+KEditorDescription KBitCrusherEditor();

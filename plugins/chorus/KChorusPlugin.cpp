@@ -20,5 +20,6 @@ constinit const KPluginDescription kChorusDescription{
     .vst2Id = "TvCh",
     .identity = "KChorusPlugin",
     .help = &KChorusHelp,
+    .editor = &KChorusEditor,
     .presets = kPresets,
 };

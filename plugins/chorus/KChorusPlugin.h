@@ -43,3 +43,4 @@ public:
 
 extern const KPluginDescription kChorusDescription;
 const KPluginHelp& KChorusHelp();
+KEditorDescription KChorusEditor();

@@ -89,6 +89,7 @@ constinit const KPluginDescription kCompressorDescription{
     .vst2Id = "TvCo",
     .identity = "KCompressorPlugin",
     .help = &KCompressorHelp,
+    .editor = &KCompressorEditor,
     .presets = kPresets,
 };
 

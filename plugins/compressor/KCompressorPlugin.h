@@ -133,7 +133,8 @@ private:
   int32_t reading_ = 2;  // audio thread
 };
 
-// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
-// help (beside it in this folder).
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), its help
+// and its editor (beside it in this folder).
 extern const KPluginDescription kCompressorDescription;
 const KPluginHelp& KCompressorHelp();
+KEditorDescription KCompressorEditor();

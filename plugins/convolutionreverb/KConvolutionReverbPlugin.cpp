@@ -74,6 +74,7 @@ constinit const KPluginDescription kConvolutionReverbDescription{
     .vst2Id = "TvCr",
     .identity = "KConvolutionReverbPlugin",
     .help = &KConvolutionReverbHelp,
+    .editor = &KConvolutionReverbEditor,
     .presets = kPresets,
 };
 

@@ -108,3 +108,4 @@ private:
 
 extern const KPluginDescription kConvolutionReverbDescription;
 const KPluginHelp& KConvolutionReverbHelp();
+KEditorDescription KConvolutionReverbEditor();

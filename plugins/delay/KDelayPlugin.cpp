@@ -36,6 +36,7 @@ constinit const KPluginDescription kDelayDescription{
     .vst2Id = "TvDl",
     .identity = "KDelayPlugin",
     .help = &KDelayHelp,
+    .editor = &KDelayEditor,
     .presets = kPresets,
 };
 

@@ -83,3 +83,4 @@ private:
 
 extern const KPluginDescription kDelayDescription;
 const KPluginHelp& KDelayHelp();
+KEditorDescription KDelayEditor();

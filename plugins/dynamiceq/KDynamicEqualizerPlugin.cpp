@@ -35,6 +35,7 @@ constinit const KPluginDescription kDynamicEqualizerDescription{
     .vst2Id = "TvDE",
     .identity = "KDynamicEqualizerPlugin",
     .help = &KDynamicEqualizerHelp,
+    .editor = &KDynamicEqualizerEditor,
     .presets = kPresets,
 };
 

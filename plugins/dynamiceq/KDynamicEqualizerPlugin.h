@@ -118,3 +118,4 @@ static_assert(KParameterRow(KDynamicEqualizerPlugin::kParameters, "band4range") 
 
 extern const KPluginDescription kDynamicEqualizerDescription;
 const KPluginHelp& KDynamicEqualizerHelp();
+KEditorDescription KDynamicEqualizerEditor();

@@ -119,6 +119,7 @@ constinit const KPluginDescription kEqualizerDescription{
     .vst2Id = "TvEq",
     .identity = "KEqualizerPlugin",
     .help = &KEqualizerHelp,
+    .editor = &KEqualizerEditor,
     .presets = kPresets,
 };
 

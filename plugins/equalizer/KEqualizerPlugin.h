@@ -50,7 +50,8 @@ private:
   bool jump_ = true;      // the next update lands at once (first block, reset)
 };
 
-// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
-// help (beside it in this folder).
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), its help
+// and its editor (beside it in this folder).
 extern const KPluginDescription kEqualizerDescription;
 const KPluginHelp& KEqualizerHelp();
+KEditorDescription KEqualizerEditor();

@@ -20,5 +20,6 @@ constinit const KPluginDescription kFlangerDescription{
     .vst2Id = "TvFl",
     .identity = "KFlangerPlugin",
     .help = &KFlangerHelp,
+    .editor = &KFlangerEditor,
     .presets = kPresets,
 };

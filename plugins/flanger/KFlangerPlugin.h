@@ -45,3 +45,4 @@ public:
 
 extern const KPluginDescription kFlangerDescription;
 const KPluginHelp& KFlangerHelp();
+KEditorDescription KFlangerEditor();

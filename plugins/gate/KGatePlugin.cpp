@@ -31,6 +31,7 @@ constinit const KPluginDescription kGateDescription{
     .vst2Id = "TvGa",
     .identity = "KGatePlugin",
     .help = &KGateHelp,
+    .editor = &KGateEditor,
     .presets = kPresets,
 };
 

@@ -92,3 +92,4 @@ private:
 
 extern const KPluginDescription kGateDescription;
 const KPluginHelp& KGateHelp();
+KEditorDescription KGateEditor();

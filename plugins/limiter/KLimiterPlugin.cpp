@@ -30,6 +30,7 @@ constinit const KPluginDescription kLimiterDescription{
     .vst2Id = "TvLi",
     .identity = "KLimiterPlugin",
     .help = &KLimiterHelp,
+    .editor = &KLimiterEditor,
     .presets = kPresets,
 };
 

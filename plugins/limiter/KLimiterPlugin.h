@@ -99,3 +99,4 @@ private:
 
 extern const KPluginDescription kLimiterDescription;
 const KPluginHelp& KLimiterHelp();
+KEditorDescription KLimiterEditor();

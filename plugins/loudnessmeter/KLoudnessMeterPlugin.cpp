@@ -33,6 +33,7 @@ constinit const KPluginDescription kLoudnessMeterDescription{
     .vst2Id = "TvLm",
     .identity = "KLoudnessMeterPlugin",
     .help = &KLoudnessMeterHelp,
+    .editor = &KLoudnessMeterEditor,
     .presets = kPresets,
 };
 

@@ -52,3 +52,4 @@ private:
 
 extern const KPluginDescription kLoudnessMeterDescription;
 const KPluginHelp& KLoudnessMeterHelp();
+KEditorDescription KLoudnessMeterEditor();

@@ -39,6 +39,7 @@ constinit const KPluginDescription kMidSideDescription{
     .vst2Id = "TvMs",
     .identity = "KMidSidePlugin",
     .help = &KMidSideHelp,
+    .editor = &KMidSideEditor,
     .presets = kPresets,
 };
 

@@ -50,3 +50,4 @@ private:
 
 extern const KPluginDescription kMidSideDescription;
 const KPluginHelp& KMidSideHelp();
+KEditorDescription KMidSideEditor();

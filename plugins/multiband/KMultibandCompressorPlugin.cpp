@@ -34,6 +34,7 @@ constinit const KPluginDescription kMultibandCompressorDescription{
     .vst2Id = "TvMC",
     .identity = "KMultibandCompressorPlugin",
     .help = &KMultibandCompressorHelp,
+    .editor = &KMultibandCompressorEditor,
     .presets = kPresets,
 };
 

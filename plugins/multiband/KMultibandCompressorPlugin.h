@@ -92,3 +92,4 @@ private:
 
 extern const KPluginDescription kMultibandCompressorDescription;
 const KPluginHelp& KMultibandCompressorHelp();
+KEditorDescription KMultibandCompressorEditor();

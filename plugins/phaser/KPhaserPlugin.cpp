@@ -28,6 +28,7 @@ constinit const KPluginDescription kPhaserDescription{
     .vst2Id = "TvPh",
     .identity = "KPhaserPlugin",
     .help = &KPhaserHelp,
+    .editor = &KPhaserEditor,
     .presets = kPresets,
 };
 

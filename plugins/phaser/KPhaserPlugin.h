@@ -74,3 +74,4 @@ private:
 
 extern const KPluginDescription kPhaserDescription;
 const KPluginHelp& KPhaserHelp();
+KEditorDescription KPhaserEditor();

@@ -108,6 +108,7 @@ constinit const KPluginDescription kEffectPipelineDescription{
     .vst2Id = "TvEP",
     .identity = "KEffectPipeline",
     .help = &KEffectPipelineHelp,
+    .editor = &KEffectPipelineEditor,
     .presets = kPresets,
 };
 

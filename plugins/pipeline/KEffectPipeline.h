@@ -134,5 +134,6 @@ private:
 
 extern const KPluginDescription kEffectPipelineDescription;
 const KPluginHelp& KEffectPipelineHelp();
+KEditorDescription KEffectPipelineEditor();
 // The help-window mark-up of the editor's chain buttons by help key; empty for other keys.
 KString KEffectPipelineButtonHelp(const KString& key);

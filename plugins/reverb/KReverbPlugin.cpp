@@ -57,6 +57,7 @@ constinit const KPluginDescription kReverbDescription{
     .vst2Id = "TvRv",
     .identity = "KReverbPlugin",
     .help = &KReverbHelp,
+    .editor = &KReverbEditor,
     .presets = kPresets,
 };
 

@@ -84,3 +84,4 @@ private:
 
 extern const KPluginDescription kReverbDescription;
 const KPluginHelp& KReverbHelp();
+KEditorDescription KReverbEditor();

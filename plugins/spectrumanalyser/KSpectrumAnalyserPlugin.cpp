@@ -32,6 +32,7 @@ constinit const KPluginDescription kSpectrumAnalyserDescription{
     .vst2Id = "TvSa",
     .identity = "KSpectrumAnalyserPlugin",
     .help = &KSpectrumAnalyserHelp,
+    .editor = &KSpectrumAnalyserEditor,
     .presets = kPresets,
 };
 

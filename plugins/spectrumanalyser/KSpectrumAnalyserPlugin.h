@@ -53,3 +53,4 @@ private:
 
 extern const KPluginDescription kSpectrumAnalyserDescription;
 const KPluginHelp& KSpectrumAnalyserHelp();
+KEditorDescription KSpectrumAnalyserEditor();

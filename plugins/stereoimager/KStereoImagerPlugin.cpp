@@ -33,6 +33,7 @@ constinit const KPluginDescription kStereoImagerDescription{
     .vst2Id = "TvSi",
     .identity = "KStereoImagerPlugin",
     .help = &KStereoImagerHelp,
+    .editor = &KStereoImagerEditor,
     .presets = kPresets,
 };
 

@@ -49,3 +49,4 @@ private:
 
 extern const KPluginDescription kStereoImagerDescription;
 const KPluginHelp& KStereoImagerHelp();
+KEditorDescription KStereoImagerEditor();

@@ -47,6 +47,7 @@ constinit const KPluginDescription kToneGeneratorDescription{
     .vst2Id = "TvTg",
     .identity = "KToneGeneratorPlugin",
     .help = &KToneGeneratorHelp,
+    .editor = &KToneGeneratorEditor,
     .presets = kPresets,
 };
 

@@ -64,3 +64,4 @@ private:
 
 extern const KPluginDescription kToneGeneratorDescription;
 const KPluginHelp& KToneGeneratorHelp();
+KEditorDescription KToneGeneratorEditor();

@@ -31,6 +31,7 @@ constinit const KPluginDescription kTransientShaperDescription{
     .vst2Id = "TvTS",
     .identity = "KTransientShaperPlugin",
     .help = &KTransientShaperHelp,
+    .editor = &KTransientShaperEditor,
     .presets = kPresets,
 };
 

@@ -68,3 +68,4 @@ private:
 
 extern const KPluginDescription kTransientShaperDescription;
 const KPluginHelp& KTransientShaperHelp();
+KEditorDescription KTransientShaperEditor();

@@ -24,6 +24,7 @@ constinit const KPluginDescription kTremoloDescription{
     .vst2Id = "TvTr",
     .identity = "KTremoloPlugin",
     .help = &KTremoloHelp,
+    .editor = &KTremoloEditor,
     .presets = kPresets,
 };
 

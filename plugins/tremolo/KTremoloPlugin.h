@@ -36,3 +36,4 @@ protected:
 
 extern const KPluginDescription kTremoloDescription;
 const KPluginHelp& KTremoloHelp();
+KEditorDescription KTremoloEditor();

@@ -39,6 +39,7 @@ constinit const KPluginDescription kUtilityDescription{
     .vst2Id = "TvUt",
     .identity = "KUtilityPlugin",
     .help = &KUtilityHelp,
+    .editor = &KUtilityEditor,
     .presets = kPresets,
 };
 

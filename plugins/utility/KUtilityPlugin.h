@@ -60,7 +60,8 @@ private:
   bool jumpToTarget_ = true;
 };
 
-// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
-// help (beside it in this folder).
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), its help
+// and its editor (beside it in this folder).
 extern const KPluginDescription kUtilityDescription;
 const KPluginHelp& KUtilityHelp();
+KEditorDescription KUtilityEditor();

@@ -65,6 +65,7 @@ constinit const KPluginDescription kSampleWarmerDescription{
     .vst2Id = "TvSW",
     .identity = "KSampleWarmer",
     .help = &KSampleWarmerHelp,
+    .editor = &KSampleWarmerEditor,
     .presets = kPresets,
 };
 

@@ -113,7 +113,8 @@ private:
   float wet_[kChannels][kPiece] = {};
 };
 
-// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), and its
-// help (beside it in this folder).
+// What hosts and the catalogue know of the plug-in (listed in plugins/KCatalogue.cpp), its help
+// and its editor (beside it in this folder).
 extern const KPluginDescription kSampleWarmerDescription;
 const KPluginHelp& KSampleWarmerHelp();
+KEditorDescription KSampleWarmerEditor();

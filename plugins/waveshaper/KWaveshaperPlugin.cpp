@@ -58,6 +58,7 @@ constinit const KPluginDescription kWaveshaperDescription{
     .vst2Id = "TvWS",
     .identity = "KWaveshaperPlugin",
     .help = &KWaveshaperHelp,
+    .editor = &KWaveshaperEditor,
     .presets = kPresets,
 };
 

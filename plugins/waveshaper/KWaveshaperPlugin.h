@@ -86,3 +86,4 @@ private:
 
 extern const KPluginDescription kWaveshaperDescription;
 const KPluginHelp& KWaveshaperHelp();
+KEditorDescription KWaveshaperEditor();

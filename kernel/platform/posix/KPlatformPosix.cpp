@@ -18,12 +18,10 @@
 #include "kernel/KFormat.h"
 #include "kernel/KUtf8.h"
 #include "kernel/platform/KPlatform.h"
+#include "kernel/platform/KPlatformShared.h"
 
 namespace {
 std::atomic<int> gTraceDescriptor{-1};
-
-std::atomic<int> gInjectedWriteFailures{0};
-std::atomic<uint32_t> gTemporaryCounter{0};
 
 // The file an interrupt removes: a fixed buffer, since the handler may only read memory.
 char gInterruptPath[4096];
@@ -56,20 +54,11 @@ int WriteWhole(int fd, std::string_view contents) noexcept {
 // Diagnostics have nowhere to report their own failure.
 void WriteAll(int fd, const char* data, size_t length) noexcept { WriteWhole(fd, std::string_view(data, length)); }
 
-bool ConsumeInjectedFailure() noexcept {
-  int left = gInjectedWriteFailures.load();
-  while (left > 0 && !gInjectedWriteFailures.compare_exchange_weak(left, left - 1)) {
-  }
-  return left > 0;
-}
-
-// A hidden sibling of `path` that no other writer uses: ".<name>.<pid>-<counter>.tmp". Created
-// exclusively, so a name left by a crashed process is skipped rather than reused.
+// A hidden sibling of `path` that no other writer uses, created exclusively, so that a name left
+// by a crashed process is skipped rather than reused.
 int OpenTemporarySibling(const std::string& path, std::string& temporary) {
-  const size_t start = KPlatform::FileNameStart(path);
   for (int attempt = 0; attempt < 100; ++attempt) {
-    temporary = path.substr(0, start) + "." + path.substr(start) + "." + std::to_string(::getpid()) + "-" +
-                std::to_string(gTemporaryCounter.fetch_add(1)) + ".tmp";
+    temporary = KPlatformShared::TemporarySiblingName(path, ::getpid());
     const int fd = ::open(temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
     if (fd >= 0 || errno != EEXIST) return fd;
   }
@@ -182,7 +171,7 @@ void KPlatform::WriteFileAtomically(const std::string& path, std::string_view co
   const int fd = OpenTemporarySibling(path, temporary);
   if (fd < 0) FailOnPath("Could not write the file '{0}' ({1}).", path, errno);
   int error = WriteWhole(fd, contents);
-  if (!error && ConsumeInjectedFailure()) error = ENOSPC;
+  if (!error && KPlatformShared::ConsumeInjectedFailure()) error = ENOSPC;
   if (!error && ::fsync(fd) != 0) error = errno;
   if (::close(fd) != 0 && !error) error = errno;
   if (!error && ::rename(temporary.c_str(), path.c_str()) != 0) error = errno;
@@ -192,8 +181,6 @@ void KPlatform::WriteFileAtomically(const std::string& path, std::string_view co
   }
   SyncFolderOf(path);
 }
-
-void KPlatform::InjectAtomicWriteFailures(int count) noexcept { gInjectedWriteFailures.store(count); }
 
 void KPlatform::RenameFile(const std::string& from, const std::string& to) {
   if (::rename(from.c_str(), to.c_str()) == 0) return;

@@ -15,13 +15,11 @@
 #include "kernel/KFormat.h"
 #include "kernel/KUtf8.h"
 #include "kernel/platform/KPlatform.h"
+#include "kernel/platform/KPlatformShared.h"
 #include "kernel/platform/windows/KWideText.h"
 
 namespace {
 std::atomic<HANDLE> gTraceHandle{INVALID_HANDLE_VALUE};
-
-std::atomic<int> gInjectedWriteFailures{0};
-std::atomic<uint32_t> gTemporaryCounter{0};
 
 // The file a console interrupt removes: a fixed buffer, set before the handler may read it.
 wchar_t gInterruptPath[4096];
@@ -58,21 +56,12 @@ DWORD WriteWhole(HANDLE file, std::string_view contents) noexcept {
   return 0;
 }
 
-bool ConsumeInjectedFailure() noexcept {
-  int left = gInjectedWriteFailures.load();
-  while (left > 0 && !gInjectedWriteFailures.compare_exchange_weak(left, left - 1)) {
-  }
-  return left > 0;
-}
-
-// A sibling of `path` that no other writer uses: ".<name>.<pid>-<counter>.tmp", created
-// exclusively, so a name left by a crashed process is skipped rather than reused. Answers the
-// open handle, or INVALID_HANDLE_VALUE with the system's error set.
+// A hidden sibling of `path` that no other writer uses, created exclusively, so that a name left
+// by a crashed process is skipped rather than reused. Answers the open handle, or
+// INVALID_HANDLE_VALUE with the system's error set.
 HANDLE OpenTemporarySibling(const std::string& path, std::string& temporary) {
-  const size_t start = KPlatform::FileNameStart(path);
   for (int attempt = 0; attempt < 100; ++attempt) {
-    temporary = path.substr(0, start) + "." + path.substr(start) + "." + std::to_string(::GetCurrentProcessId()) + "-" +
-                std::to_string(gTemporaryCounter.fetch_add(1)) + ".tmp";
+    temporary = KPlatformShared::TemporarySiblingName(path, ::GetCurrentProcessId());
     HANDLE file = ::CreateFileW(KPlatform::Wide(temporary).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW,
                                 FILE_ATTRIBUTE_NORMAL, nullptr);
     if (file != INVALID_HANDLE_VALUE || ::GetLastError() != ERROR_FILE_EXISTS) return file;
@@ -224,7 +213,7 @@ void KPlatform::WriteFileAtomically(const std::string& path, std::string_view co
   HANDLE file = OpenTemporarySibling(path, temporary);
   if (file == INVALID_HANDLE_VALUE) FailOnPath("Could not write the file '{0}' ({1}).", path, ::GetLastError());
   DWORD error = WriteWhole(file, contents);
-  if (!error && ConsumeInjectedFailure()) error = ERROR_DISK_FULL;
+  if (!error && KPlatformShared::ConsumeInjectedFailure()) error = ERROR_DISK_FULL;
   if (!error && !::FlushFileBuffers(file)) error = ::GetLastError();
   if (!::CloseHandle(file) && !error) error = ::GetLastError();
   if (!error && !Replace(temporary, path)) error = ::GetLastError();
@@ -233,8 +222,6 @@ void KPlatform::WriteFileAtomically(const std::string& path, std::string_view co
     FailOnPath("Could not write the file '{0}' ({1}).", path, error);
   }
 }
-
-void KPlatform::InjectAtomicWriteFailures(int count) noexcept { gInjectedWriteFailures.store(count); }
 
 void KPlatform::RenameFile(const std::string& from, const std::string& to) {
   if (Replace(from, to)) return;
@@ -327,7 +314,7 @@ std::string KPlatform::CreateTemporaryFolder() {
   const std::string folder = Narrow(base, static_cast<int>(length));
   for (int attempt = 0; attempt < 100; ++attempt) {
     const std::string path = folder + "torvane-" + std::to_string(::GetCurrentProcessId()) + "-" +
-                             std::to_string(::GetTickCount64() % 1000000) + "-" + std::to_string(gTemporaryCounter.fetch_add(1));
+                             std::to_string(::GetTickCount64() % 1000000) + "-" + std::to_string(KPlatformShared::NextTemporaryNumber());
     if (::CreateDirectoryW(Wide(path).c_str(), nullptr)) return path + "\\";
     if (::GetLastError() != ERROR_ALREADY_EXISTS) break;
   }

@@ -43,6 +43,10 @@ public:
   // Accepts what ToText writes and what a user would type (with or without the unit).
   // False when the text is not a value of this kind; `working` is then unchanged.
   virtual bool FromText(const KString& text, double& working) const = 0;
+  // The name a control shows for a parameter of this kind when it follows what the parameter
+  // stands for at the moment (a pipeline slot shows its module's parameter); false keeps the
+  // table's name. User-interface thread.
+  virtual bool CurrentName(KString& /*name*/) const { return false; }
 
 protected:
   double Clamp(double working) const noexcept;

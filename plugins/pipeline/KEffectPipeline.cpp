@@ -56,6 +56,13 @@ KString KSlotKind::ToText(double working) const {
   return unit.IsEmpty() ? text : text + KString::Static(" ") + unit;
 }
 
+bool KSlotKind::CurrentName(KString& name) const {
+  const std::shared_ptr<const KModuleChain> chain = view_.Load();
+  const KAudioPluginBase::Parameter* carried = Carried(*chain);
+  name = carried ? carried->Name() : KString();
+  return true;
+}
+
 bool KSlotKind::FromText(const KString& text, double& working) const {
   const std::shared_ptr<const KModuleChain> chain = view_.Load();
   const KAudioPluginBase::Parameter* carried = Carried(*chain);

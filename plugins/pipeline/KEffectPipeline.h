@@ -11,15 +11,17 @@
 #include "plugins/pipeline/KModuleChain.h"
 
 // A parameter of a slot: its value is the normalised value of the module parameter it carries,
-// and its text is that parameter's text, so hosts show "4.0 : 1" rather than 0.43. A slot
-// parameter without a module parameter behind it reads "-". Hosts ask from threads of their
-// own, so it reads the chain through the shared view, never the hand-over.
+// and its text is that parameter's text, so hosts show "4.0 : 1" rather than 0.43; its control
+// in the editor is labelled with that parameter's name. A slot parameter without a module
+// parameter behind it reads "-" and has no label. Hosts ask from threads of their own, so it
+// reads the chain through the shared view, never the hand-over.
 class KSlotKind final : public KValueKind {
 public:
   KSlotKind(const KChainView& view, int32_t slot, int32_t parameter)
       : KValueKind(0.0, 1.0, "", KValueCurve::kLinear), view_(view), slot_(slot), parameter_(parameter) {}
   KString ToText(double working) const override;
   bool FromText(const KString& text, double& working) const override;
+  bool CurrentName(KString& name) const override;
 
 private:
   // The module parameter behind this one in `chain`, or null.

@@ -18,6 +18,7 @@
 #include "tests/ui/EditorTestSupport.h"
 #include "ui/KHelpTexts.h"
 #include "ui/controls/KButtons.h"
+#include "ui/controls/KParameterControl.h"
 #include "ui/controls/KPopups.h"
 #include "ui/editor/KHelpPanel.h"
 
@@ -178,6 +179,32 @@ TEST_F(PipelineEditor, ClicksAddMoveBypassAndRemoveModules) {
   EXPECT_EQ(pipeline_->GetParameter(P::BypassIndex(1)).Normalized(), 1.0);
   EXPECT_EQ(Button(Panel::kBypassKey, 2)->Caption().ToUtf8(), "Bypassed");
   EXPECT_EQ(AllocationsWhileProcessing(), 0);
+}
+
+// A slot's controls are labelled with the names of the module parameters they carry, and follow
+// the chain: a module added, moved or removed relabels them at the next tick; a control that
+// carries nothing has no label.
+TEST_F(PipelineEditor, SlotControlsAreLabelledWithTheirModulesParameters) {
+  const auto label = [&](int32_t slot, int32_t parameter) {
+    const KString key = pipeline_->GetParameter(P::ParameterIndex(slot, parameter)).Key();
+    KParameterControl* control = KFindControl<KParameterControl>(Tree().Root(), [&](KParameterControl& c) { return c.HelpKey() == key; });
+    return control ? control->Label().ToUtf8() : std::string("(no control)");
+  };
+  Tree().Tick();
+  EXPECT_EQ(label(0, 0), "");
+  AddThroughMenu(RecordOf("SampleWarmer"));
+  AddThroughMenu(RecordOf("Utility"));
+  const KAudioPlugin& warmer = *pipeline_->ModuleInSlot(0);
+  const KAudioPlugin& utility = *pipeline_->ModuleInSlot(1);
+  for (int32_t p = 0; p < warmer.ParameterCount(); ++p) EXPECT_EQ(label(0, p), warmer.GetParameter(p).Name().ToUtf8()) << p;
+  EXPECT_EQ(label(0, warmer.ParameterCount()), "");
+  EXPECT_EQ(label(1, 0), utility.GetParameter(0).Name().ToUtf8());
+  // Moving changes the order, not the slots: the labels stay; removing clears them.
+  ClickButton(Panel::kUpKey, 1);
+  EXPECT_EQ(label(1, 0), utility.GetParameter(0).Name().ToUtf8());
+  ClickButton(Panel::kRemoveKey, 1);
+  EXPECT_EQ(label(0, 0), "");
+  EXPECT_EQ(label(1, 0), utility.GetParameter(0).Name().ToUtf8());
 }
 
 // With six modules the add button rests and opens nothing; every button of the list has its

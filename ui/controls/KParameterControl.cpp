@@ -14,5 +14,7 @@ KString KParameterControl::ValueText() const {
 }
 
 void KParameterControl::OnTimer() {
+  KString name;
+  if (link_.Parameter().Kind().CurrentName(name)) SetLabel(name);
   if (link_.TakeOutsideChange()) Invalidate();
 }

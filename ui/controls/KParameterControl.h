@@ -4,7 +4,8 @@
 #include "ui/controls/KParameterLink.h"
 
 // A control bound to one parameter: its link, the label it shows (the parameter's name unless
-// the editor gives a shorter one), its help key, and following the value on the tree's tick.
+// the editor gives a shorter one, or the name its kind gives at the moment), its help key, and
+// following the value and that name on the tree's tick.
 class KParameterControl : public KControl {
 public:
   KParameterControl(const KRect& bounds, KParameterLink link) : KControl(bounds), link_(link), label_(link.Parameter().Name()) {}

@@ -92,18 +92,30 @@ void KPipelineChainPanel::OpenAddMenu() {
   KRegistries& registries = KRegistries::Instance();
   registries.EnsureBuilt();
   const KPluginRegistry& modules = registries.Modules();
-  std::vector<KString> items;
-  std::vector<KString> keys;
-  for (int32_t i = 0; i < modules.Count(); ++i) {
-    const KPluginRecord& record = modules.Record(i);
-    items.push_back(KFormat("{0}: {1}").Arg(record.category).Arg(record.key).Text());
-    keys.push_back(record.key);
+  // The modules under a heading for each category, in the registries' order of categories; an
+  // item's key is its module's, a heading's empty.
+  std::vector<KString> items, keys;
+  std::vector<int32_t> headings;
+  for (const char* category : KRegistries::kCategories) {
+    const KString name = KString::Static(category);
+    for (int32_t i = 0; i < modules.Count(); ++i) {
+      const KPluginRecord& record = modules.Record(i);
+      if (record.category != name) continue;
+      if (headings.empty() || items[static_cast<size_t>(headings.back())] != name) {
+        headings.push_back(static_cast<int32_t>(items.size()));
+        items.push_back(name);
+        keys.emplace_back();
+      }
+      items.push_back(record.key);
+      keys.push_back(record.key);
+    }
   }
-  KControl& menu = tree->Root().Add(std::make_unique<KPopupMenu>(tree->Root().Bounds(), add_->Bounds(), std::move(items), -1,
-                                                                 [this, keys](int32_t chosen) {
-                                                                   const KString key = keys[static_cast<size_t>(chosen)];
-                                                                   Edit([this, key] { pipeline_.AddModule(key); });
-                                                                 }));
+  auto& menu = dynamic_cast<KPopupMenu&>(tree->Root().Add(std::make_unique<KPopupMenu>(
+      tree->Root().Bounds(), add_->Bounds(), std::move(items), -1, [this, keys](int32_t chosen) {
+        const KString key = keys[static_cast<size_t>(chosen)];
+        Edit([this, key] { pipeline_.AddModule(key); });
+      })));
+  for (int32_t heading : headings) menu.MarkHeading(heading);
   tree->SetFocus(&menu);
 }
 

@@ -3,6 +3,7 @@
 // takes each new chain, allocates nothing across them.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <memory>
 #include <string>
 #include <vector>
@@ -74,23 +75,26 @@ protected:
     ASSERT_NE(button, nullptr) << key << " " << position;
     Click(KCentreOf(*button));
   }
-  // Adds the module of registry record `index` through the add button's menu.
-  void AddThroughMenu(int32_t index) {
+  // Adds the module of `key` (effect-module registry) through the add button's menu, which lists
+  // every module under a heading of its category.
+  void AddThroughMenu(const KString& key) {
     ClickButton(Panel::kAddKey);
     auto* menu = dynamic_cast<KPopupMenu*>(Tree().Focused());
     ASSERT_NE(menu, nullptr);
-    ASSERT_EQ(menu->ItemCount(), Modules().Count());
+    int32_t item = -1, headings = 0;
+    for (int32_t i = 0; i < menu->ItemCount(); ++i) {
+      headings += menu->IsHeading(i) ? 1 : 0;
+      if (!menu->IsHeading(i) && menu->Item(i) == key) item = i;
+    }
+    ASSERT_EQ(menu->ItemCount(), Modules().Count() + headings);
+    ASSERT_GE(item, 0) << key.ToUtf8();
     const KRect& list = menu->ListArea();
-    Click({(list.left + list.right) / 2, list.top + 3 + index * KPopupMenu::kItemHeight + KPopupMenu::kItemHeight / 2});
+    Click({(list.left + list.right) / 2, list.top + 3 + item * KPopupMenu::kItemHeight + KPopupMenu::kItemHeight / 2});
   }
+  void AddThroughMenu(const char* key) { AddThroughMenu(KString::Static(key)); }
   static const KPluginRegistry& Modules() {
     KRegistries::Instance().EnsureBuilt();
     return KRegistries::Instance().Modules();
-  }
-  static int32_t RecordOf(const char* key) {
-    for (int32_t i = 0; i < Modules().Count(); ++i)
-      if (Modules().Record(i).key == KString::Static(key)) return i;
-    return -1;
   }
   std::vector<std::string> Keys() const {
     std::vector<std::string> keys;
@@ -121,12 +125,11 @@ protected:
 // state, and the audio thread takes each new chain without allocating.
 TEST_F(PipelineEditor, ClicksAddMoveBypassAndRemoveModules) {
   EXPECT_EQ(AllocationsWhileProcessing(), 0);
-  const int32_t first = 0, warmer = RecordOf("SampleWarmer"), last = Modules().Count() - 1;
-  ASSERT_GT(warmer, 0);
+  const KString first = Modules().Record(0).key, last = Modules().Record(Modules().Count() - 1).key;
   AddThroughMenu(first);
-  AddThroughMenu(warmer);
+  AddThroughMenu("SampleWarmer");
   AddThroughMenu(last);
-  const std::string firstKey = Modules().Record(first).key.ToUtf8(), lastKey = Modules().Record(last).key.ToUtf8();
+  const std::string firstKey = first.ToUtf8(), lastKey = last.ToUtf8();
   EXPECT_EQ(Keys(), (std::vector<std::string>{firstKey, "SampleWarmer", lastKey}));
   EXPECT_EQ(pipeline_->SlotAt(2), 2);
   EXPECT_EQ(names_.renamed, 3);
@@ -192,8 +195,8 @@ TEST_F(PipelineEditor, SlotControlsAreLabelledWithTheirModulesParameters) {
   };
   Tree().Tick();
   EXPECT_EQ(label(0, 0), "");
-  AddThroughMenu(RecordOf("SampleWarmer"));
-  AddThroughMenu(RecordOf("Utility"));
+  AddThroughMenu("SampleWarmer");
+  AddThroughMenu("Utility");
   const KAudioPlugin& warmer = *pipeline_->ModuleInSlot(0);
   const KAudioPlugin& utility = *pipeline_->ModuleInSlot(1);
   for (int32_t p = 0; p < warmer.ParameterCount(); ++p) EXPECT_EQ(label(0, p), warmer.GetParameter(p).Name().ToUtf8()) << p;
@@ -207,10 +210,40 @@ TEST_F(PipelineEditor, SlotControlsAreLabelledWithTheirModulesParameters) {
   EXPECT_EQ(label(1, 0), utility.GetParameter(0).Name().ToUtf8());
 }
 
+// The add menu lists every module once, under the heading of its category, the headings in the
+// registries' order of categories; a heading cannot be chosen.
+TEST_F(PipelineEditor, AddMenuGroupsModulesUnderTheirCategories) {
+  ClickButton(Panel::kAddKey);
+  auto* menu = dynamic_cast<KPopupMenu*>(Tree().Focused());
+  ASSERT_NE(menu, nullptr);
+  std::vector<std::string> headings, listed;
+  std::string category;
+  for (int32_t i = 0; i < menu->ItemCount(); ++i) {
+    const KString item = menu->Item(i);
+    if (menu->IsHeading(i)) {
+      headings.push_back(category = item.ToUtf8());
+      continue;
+    }
+    ASSERT_FALSE(category.empty()) << item.ToUtf8();
+    const KPluginRecord* record = Modules().Find(item);
+    ASSERT_NE(record, nullptr) << item.ToUtf8();
+    EXPECT_EQ(record->category.ToUtf8(), category) << item.ToUtf8();
+    listed.push_back(item.ToUtf8());
+  }
+  EXPECT_EQ(static_cast<int32_t>(listed.size()), Modules().Count());
+  std::vector<std::string> ordered;
+  for (const char* name : KRegistries::kCategories)
+    if (std::find(headings.begin(), headings.end(), name) != headings.end()) ordered.push_back(name);
+  EXPECT_EQ(headings, ordered);
+  const KRect& list = menu->ListArea();
+  Click({(list.left + list.right) / 2, list.top + 3 + KPopupMenu::kItemHeight / 2});  // the first heading
+  EXPECT_EQ(pipeline_->ModuleCount(), 0);
+}
+
 // With six modules the add button rests and opens nothing; every button of the list has its
 // own help on F1.
 TEST_F(PipelineEditor, FullChainAndHelpOfTheButtons) {
-  for (int32_t i = 0; i < P::kSlots; ++i) AddThroughMenu(RecordOf("Utility"));
+  for (int32_t i = 0; i < P::kSlots; ++i) AddThroughMenu("Utility");
   ASSERT_EQ(pipeline_->ModuleCount(), P::kSlots);
   EXPECT_FALSE(Button(Panel::kAddKey)->IsEnabled());
   ClickButton(Panel::kAddKey);

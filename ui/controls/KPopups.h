@@ -38,6 +38,7 @@ public:
   KPopupMenu(const KRect& window, const KRect& anchor, std::vector<KString> items, int32_t current, Choose choose);
   const KRect& ListArea() const noexcept { return list_; }
   int32_t ItemCount() const noexcept { return static_cast<int32_t>(items_.size()); }
+  const KString& Item(int32_t index) const noexcept { return items_[static_cast<size_t>(index)]; }
   void MarkHeading(int32_t index);
   bool IsHeading(int32_t index) const noexcept;
   int32_t Highlighted() const noexcept { return highlighted_; }

@@ -374,11 +374,14 @@ void KAudioPluginVST3Adapter::ReportLatency(int32_t) { host_.Restart(kLatencyCha
 
 void KAudioPluginVST3Adapter::UpdateParameterNames() { host_.Restart(kParamTitlesChanged); }
 
-// A preset loaded, or the list changed: the program follows, and the list is read again. A new
-// count changes the program's step count, which hosts read with the parameters' titles.
+// A preset loaded, or the list changed: the program follows, and a changed list is announced to
+// the host's unit handler. A new count changes the program's step count, which hosts read with
+// the parameters' titles.
 void KAudioPluginVST3Adapter::NotifyPresetChanged() {
-  const bool resized = table_.SetPrograms(PresetNames());
-  host_.Restart(kParamValuesChanged | (resized ? kParamTitlesChanged : 0));
+  using Change = KParameterTable::ProgramChange;
+  const Change change = table_.SetPrograms(PresetNames());
+  host_.Restart(kParamValuesChanged | (change == Change::kCount ? kParamTitlesChanged : 0));
+  if (change != Change::kNone) host_.ProgramListChanged(KParameterTable::kPresetList);
 }
 
 void KAudioPluginVST3Adapter::Idle() {

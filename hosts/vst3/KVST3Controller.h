@@ -140,6 +140,20 @@ protected:
   ~IUnitInfo() = default;
 };
 
+// The host's side of units and program lists, asked of the component handler: a plug-in whose
+// program list changed says so here, so that the host reads the list again.
+class IUnitHandler : public FUnknown {
+public:
+  static constexpr KUID kIID = KUID::FromWords(0x4B5147F8, 0x4654486B, 0x8DAB30BA, 0x163A3C56);
+  // Program index of a notice that the whole list changed.
+  static constexpr int32_t kAllProgramInvalid = -1;
+  virtual TResult NotifyUnitSelection(int32_t unitId) = 0;
+  virtual TResult NotifyProgramListChange(int32_t listId, int32_t programIndex) = 0;
+
+protected:
+  ~IUnitHandler() = default;
+};
+
 // ---- the channel the plug-in sits on, as the host tells it
 namespace ChannelContext {
 inline constexpr const char* kChannelNameKey = "channel name";

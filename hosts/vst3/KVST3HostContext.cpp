@@ -24,9 +24,13 @@ void KHostContext::StopTimer() noexcept {
 void KHostContext::Detach() noexcept {
   StopTimer();
   handler_.Reset();
+  unitHandler_.Reset();
 }
 
-void KHostContext::SetComponentHandler(IComponentHandler* handler) noexcept { handler_.Reset(handler); }
+void KHostContext::SetComponentHandler(IComponentHandler* handler) noexcept {
+  handler_.Reset(handler);
+  unitHandler_.Query(handler);
+}
 
 bool KHostContext::BeginEdit(ParamID id) noexcept { return handler_ && handler_->BeginEdit(id) == kResultOk; }
 
@@ -37,6 +41,10 @@ bool KHostContext::PerformEdit(ParamID id, double normalized) noexcept {
 bool KHostContext::EndEdit(ParamID id) noexcept { return handler_ && handler_->EndEdit(id) == kResultOk; }
 
 bool KHostContext::Restart(int32_t flags) noexcept { return handler_ && handler_->RestartComponent(flags) == kResultOk; }
+
+bool KHostContext::ProgramListChanged(int32_t listId) noexcept {
+  return unitHandler_ && unitHandler_->NotifyProgramListChange(listId, IUnitHandler::kAllProgramInvalid) == kResultOk;
+}
 
 TResult KHostContext::KIdleTimer::QueryInterface(const char* iid, void** object) {
   if (!object) return kInvalidArgument;

@@ -37,6 +37,8 @@ public:
   bool PerformEdit(ParamID id, double normalized) noexcept;
   bool EndEdit(ParamID id) noexcept;
   bool Restart(int32_t flags) noexcept;
+  // The whole of program list `listId` changed; false when the host has no unit handler.
+  bool ProgramListChanged(int32_t listId) noexcept;
 
 private:
   // Lives inside the context; the run loop's references are not counted.
@@ -56,6 +58,7 @@ private:
 
   KString hostName_;
   KShared<IComponentHandler> handler_;
+  KShared<IUnitHandler> unitHandler_;  // the handler's, when it has one
   KShared<IRunLoop> runLoop_;
   KIdleTimer timer_;
   bool timerRegistered_ = false;

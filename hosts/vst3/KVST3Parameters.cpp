@@ -183,11 +183,13 @@ void KParameterTable::SelectProgram(int32_t index) {
   if (index < programCount_.load(std::memory_order_relaxed) && index != plugin_.GlobalSettings().presetIndex) plugin_.SelectPreset(index);
 }
 
-bool KParameterTable::SetPrograms(KStringList names) {
-  const bool changed = names.Count() != programs_.Count();
+KParameterTable::ProgramChange KParameterTable::SetPrograms(KStringList names) {
+  ProgramChange change = names.Count() != programs_.Count() ? ProgramChange::kCount : ProgramChange::kNone;
+  for (int32_t i = 0; change == ProgramChange::kNone && i < names.Count(); ++i)
+    if (!(names[i] == programs_[i])) change = ProgramChange::kNames;
   programs_ = std::move(names);
   programCount_.store(programs_.Count(), std::memory_order_relaxed);
-  return changed;
+  return change;
 }
 
 // One step per preset after the first; a list of one or none still steps, so that the program

@@ -70,9 +70,10 @@ public:
   void SelectPendingProgram();
 
   // ---- the program list (user-interface thread)
-  // The presets' names as the host is to see them; answers whether their count changed, and
-  // with it the program parameter's step count.
-  bool SetPrograms(KStringList names);
+  // The presets' names as the host is to see them; answers what changed: nothing, only names,
+  // or their count (and with it the program parameter's step count).
+  enum class ProgramChange { kNone, kNames, kCount };
+  ProgramChange SetPrograms(KStringList names);
   const KStringList& Programs() const noexcept { return programs_; }
   int32_t ProgramSteps() const noexcept;
   // The preset a normalised program value stands for, within the list.

@@ -64,8 +64,9 @@ struct KEvents final : KHostObject<IEventList> {
   TResult AddEvent(Event& event) override { return list.push_back(event), kResultOk; }
 };
 
-struct KHost final : KHostObject<IHostApplication, IComponentHandler> {  // keeps edits and restart requests
+struct KHost final : KHostObject<IHostApplication, IComponentHandler, IUnitHandler> {  // keeps edits, restart requests, list notices
   std::vector<int32_t> restarts;
+  std::vector<std::pair<int32_t, int32_t>> programListChanges;  // list id, program index
   std::vector<std::tuple<char, ParamID, double>> edits;  // 'b'egin, 'p'erform with its value, 'e'nd
   TResult GetName(String128 name) override { return std::copy_n(u"Test host", 10, name), kResultOk; }
   TResult CreateInstance(char*, char*, void**) override { return kNotImplemented; }
@@ -73,6 +74,8 @@ struct KHost final : KHostObject<IHostApplication, IComponentHandler> {  // keep
   TResult PerformEdit(ParamID id, double value) override { return edits.emplace_back('p', id, value), kResultOk; }
   TResult EndEdit(ParamID id) override { return edits.emplace_back('e', id, 0.0), kResultOk; }
   TResult RestartComponent(int32_t flags) override { return restarts.push_back(flags), kResultOk; }
+  TResult NotifyUnitSelection(int32_t) override { return kResultOk; }
+  TResult NotifyProgramListChange(int32_t list, int32_t program) override { return programListChanges.emplace_back(list, program), kResultOk; }
 };
 
 struct KAttributes final : KHostObject<IAttributeList> {  // texts and integers; a text must fit whole

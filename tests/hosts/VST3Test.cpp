@@ -221,7 +221,8 @@ TEST(VST3Adapter, TheProgramListAndParameterChooseTheFactoryPresets) {
 }
 
 // A preset the user saves joins the list after the factory's: the list, the program's step count
-// and its texts grow together, and the host is told to read the parameters again.
+// and its texts grow together, and the host is told to read the parameters and the list again.
+// A renamed preset changes the list's names only: the list is announced, the titles are not.
 TEST(VST3Adapter, ASavedPresetJoinsTheProgramListAfterTheFactoryPresets) {
   const KUserDataFolder data;  // the user's presets go to a fresh folder
   {
@@ -242,6 +243,13 @@ TEST(VST3Adapter, ASavedPresetJoinsTheProgramListAfterTheFactoryPresets) {
     ProgramListInfo list{};
     ASSERT_EQ(units->GetProgramListInfo(0, list), kResultOk);
     EXPECT_EQ(list.programCount, factory + 1);
+    const std::pair<int32_t, int32_t> wholeList{list.id, IUnitHandler::kAllProgramInvalid};
+    EXPECT_EQ(host.programListChanges, (std::vector{wholeList}));
+    host.restarts.clear();
+    plugin->RenamePreset("Mine", "Ours");
+    EXPECT_EQ(host.programListChanges, (std::vector{wholeList, wholeList}));
+    EXPECT_EQ(host.restarts, (std::vector<int32_t>{kParamValuesChanged}));
+    EXPECT_EQ(instance.Text(32766, 1.0), u"Ours");
     units->Release();
     instance.Stop();
   }

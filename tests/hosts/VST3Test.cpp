@@ -250,6 +250,12 @@ TEST(VST3Adapter, ASavedPresetJoinsTheProgramListAfterTheFactoryPresets) {
     EXPECT_EQ(host.programListChanges, (std::vector{wholeList, wholeList}));
     EXPECT_EQ(host.restarts, (std::vector<int32_t>{kParamValuesChanged}));
     EXPECT_EQ(instance.Text(32766, 1.0), u"Ours");
+    // Deleting it shrinks the list again, and leaves the user's presets as the test found them
+    // (the Windows run shares them between test programs).
+    plugin->DeletePreset("Ours");
+    EXPECT_EQ(host.programListChanges.size(), 3u);
+    ASSERT_EQ(units->GetProgramListInfo(0, list), kResultOk);
+    EXPECT_EQ(list.programCount, factory);
     units->Release();
     instance.Stop();
   }

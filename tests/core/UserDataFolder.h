@@ -6,26 +6,32 @@
 
 #include "kernel/platform/KPlatform.h"
 
+// The variable that names where the user's data lives, and its setting.
+namespace KUserDataVariable {
 #ifdef _WIN32
-// Windows finds the user's data through the shell, which no variable redirects; the Windows tests
-// run in a Wine prefix of their own, whose user data the test script clears before every run.
-class KUserDataFolder {
-public:
-  KUserDataFolder() {}  // user-provided: a guard that is named but never read is no unused variable
-};
+inline constexpr const char* kName = "APPDATA";
+inline void Set(const char* value) { _putenv_s(kName, value); }
+inline void Unset() { _putenv_s(kName, ""); }  // an empty value removes it
 #else
-// While it lives, the user's data (presets among it) goes to a fresh folder of its own
-// (XDG_DATA_HOME), which it removes, with the setting it replaced restored, when it goes.
+inline constexpr const char* kName = "XDG_DATA_HOME";
+inline void Set(const char* value) { setenv(kName, value, 1); }
+inline void Unset() { unsetenv(kName); }
+#endif
+}  // namespace KUserDataVariable
+
+// While it lives, the user's data (presets among it) goes to a fresh folder of its own, which it
+// removes, with the setting it replaced restored, when it goes: test programs that run side by
+// side never share presets.
 class KUserDataFolder {
 public:
   KUserDataFolder() {
-    if (const char* old = std::getenv("XDG_DATA_HOME")) saved_ = old;
-    setenv("XDG_DATA_HOME", folder_.c_str(), 1);
+    if (const char* old = std::getenv(KUserDataVariable::kName)) saved_ = old;
+    KUserDataVariable::Set(folder_.c_str());
   }
   KUserDataFolder(const KUserDataFolder&) = delete;
   KUserDataFolder& operator=(const KUserDataFolder&) = delete;
   ~KUserDataFolder() {
-    saved_ ? setenv("XDG_DATA_HOME", saved_->c_str(), 1) : unsetenv("XDG_DATA_HOME");
+    saved_ ? KUserDataVariable::Set(saved_->c_str()) : KUserDataVariable::Unset();
     KPlatform::RemoveFolderTree(folder_);
   }
 
@@ -33,4 +39,3 @@ private:
   const std::string folder_ = KPlatform::CreateTemporaryFolder();
   std::optional<std::string> saved_;
 };
-#endif

@@ -5,6 +5,7 @@
 #include <io.h>
 
 #include <chrono>
+#include <cstdlib>
 #include <string>
 #include <thread>
 #include <vector>
@@ -73,6 +74,25 @@ TEST(KWindowsPlatformFolders, TheRoamingDataFolderAndTheKernelsFolderAreAbsolute
   EXPECT_EQ(kernel.back(), '\\') << kernel;
   // The fonts are copied beside the kernel (the test links it statically): found from there.
   EXPECT_TRUE(KPlatform::ReadFile(kernel + "DejaVuSans.ttf").has_value()) << kernel;
+}
+
+// %APPDATA% moves the user's data when it is absolute (a drive's path or a share's); anything
+// else leaves the shell's folder.
+TEST(KWindowsPlatformFolders, AnAbsoluteAppDataMovesTheUsersData) {
+  const char* old = std::getenv("APPDATA");
+  const std::string saved = old ? old : "";
+  _putenv_s("APPDATA", "");
+  const std::string shell = KPlatform::UserDataHome();
+  for (const char* ignored : {"relative\\data", "\\single", "C:"}) {
+    _putenv_s("APPDATA", ignored);
+    EXPECT_EQ(KPlatform::UserDataHome(), shell) << ignored;
+  }
+  for (const auto& [set, home] : {std::pair{"D:\\Moved\\Data\\", "D:\\Moved\\Data\\"}, {"E:/data", "E:/data\\"},
+                                  {"\\\\server\\share", "\\\\server\\share\\"}}) {
+    _putenv_s("APPDATA", set);
+    EXPECT_EQ(KPlatform::UserDataHome(), home) << set;
+  }
+  _putenv_s("APPDATA", saved.c_str());
 }
 
 TEST(KWindowsPlatformClock, TheMillisecondClockAdvancesWithTheWallClock) {

@@ -167,8 +167,13 @@ std::string KnownFolder(REFKNOWNFOLDERID id) {
 }
 }  // namespace
 
+// %APPDATA% when it holds an absolute path (a drive's or a share's), as programs that move a
+// user's data set it; else the shell's roaming application data folder, which it normally names.
 std::string KPlatform::UserDataHome() {
-  std::string home = KnownFolder(FOLDERID_RoamingAppData);
+  const wchar_t* variable = ::_wgetenv(L"APPDATA");
+  const std::string set = variable ? Narrow(variable, static_cast<int>(std::wcslen(variable))) : std::string();
+  const bool absolute = (set.size() >= 3 && set[1] == ':' && (set[2] == '\\' || set[2] == '/')) || set.rfind("\\\\", 0) == 0;
+  std::string home = absolute ? set : KnownFolder(FOLDERID_RoamingAppData);
   if (home.empty()) throw KException("Could not find the user's data folder: the roaming application data folder is unknown.");
   while (home.size() > 3 && (home.back() == '\\' || home.back() == '/')) home.pop_back();
   return home.back() == '\\' ? home : home + "\\";
